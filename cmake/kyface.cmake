@@ -1,0 +1,26 @@
+# Compile and link options shared by the project's targets.
+
+# What every target of the project is compiled with.
+add_library(kyface_warnings INTERFACE)
+target_compile_options(kyface_warnings INTERFACE -Wall -Wextra -Wpedantic -Wshadow -Wcast-qual -Wvla -Werror)
+
+# The instruction set that the kernels and their tests need. On x86-64 the NEON intrinsics compile through SIMDe, and
+# FMA keeps their fused multiply-adds fused. Contraction is off so that only the written fused multiply-adds fuse.
+add_library(kyface_simd INTERFACE)
+target_compile_options(kyface_simd INTERFACE -ffp-contract=off -fno-math-errno)
+if(CMAKE_SYSTEM_PROCESSOR MATCHES "x86_64|AMD64")
+  target_compile_options(kyface_simd INTERFACE -mavx2 -mfma)
+endif()
+
+# What the shipped library is compiled with.
+add_library(kyface_options INTERFACE)
+target_compile_options(kyface_options INTERFACE $<$<COMPILE_LANGUAGE:CXX>:-fno-exceptions -fno-rtti
+                                                -fvisibility-inlines-hidden> -fvisibility=hidden)
+target_link_libraries(kyface_options INTERFACE kyface_warnings kyface_simd)
+
+# Hardening of a shared library: read-only relocations, everything bound at load, nothing left undefined.
+add_library(kyface_link INTERFACE)
+target_link_options(kyface_link INTERFACE -Wl,-z,relro -Wl,-z,now -Wl,-z,defs)
+if(CMAKE_SYSTEM_PROCESSOR MATCHES "aarch64|arm64|ARM64")
+  target_link_options(kyface_link INTERFACE -Wl,-z,max-page-size=16384)
+endif()

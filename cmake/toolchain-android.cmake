@@ -1,0 +1,10 @@
+# The NDK's own toolchain, found through ANDROID_NDK_HOME or ANDROID_NDK.
+if(DEFINED ENV{ANDROID_NDK_HOME})
+  set(kyface_ndk "$ENV{ANDROID_NDK_HOME}")
+elseif(DEFINED ENV{ANDROID_NDK})
+  set(kyface_ndk "$ENV{ANDROID_NDK}")
+endif()
+if(NOT kyface_ndk OR NOT EXISTS "${kyface_ndk}/build/cmake/android.toolchain.cmake")
+  message(FATAL_ERROR "Set ANDROID_NDK_HOME (or ANDROID_NDK) to the folder of an Android NDK.")
+endif()
+include("${kyface_ndk}/build/cmake/android.toolchain.cmake")
