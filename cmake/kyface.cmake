@@ -24,3 +24,12 @@ target_link_options(kyface_link INTERFACE -Wl,-z,relro -Wl,-z,now -Wl,-z,defs)
 if(CMAKE_SYSTEM_PROCESSOR MATCHES "aarch64|arm64|ARM64")
   target_link_options(kyface_link INTERFACE -Wl,-z,max-page-size=16384)
 endif()
+
+# The JNI headers. They hold nothing of an architecture, so a cross build takes them from this machine's JDK.
+if(kyface_desktop)
+  file(GLOB kyface_jdks /usr/lib/jvm/*)
+  find_path(KYFACE_JNI_INCLUDE jni.h HINTS ENV JAVA_HOME PATHS /usr/lib/jvm/default-java ${kyface_jdks}
+            PATH_SUFFIXES include NO_CMAKE_FIND_ROOT_PATH REQUIRED)
+  add_library(kyface_jni INTERFACE)
+  target_include_directories(kyface_jni SYSTEM INTERFACE ${KYFACE_JNI_INCLUDE} ${KYFACE_JNI_INCLUDE}/linux)
+endif()
