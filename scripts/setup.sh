@@ -1,0 +1,128 @@
+#!/usr/bin/env bash
+# Installs what building and testing need: the one place of the project that does.
+#
+#   scripts/setup.sh [group...]
+#
+# Groups are `host` and `aarch64`, named after the build presets that need them; both without an argument. Packages
+# that are there already are left alone, and nothing is asked when all are. Packages of this machine are installed
+# with apt-get (through sudo when not root). Packages of 64-bit Arm are unpacked into .deps/arm64: installing them
+# would pull this system's own packages along.
+source "$(dirname "${BASH_SOURCE[0]}")/common.sh"
+
+packages_host=(
+  cmake ninja-build g++        # the build
+  libsimde-dev                 # NEON intrinsics on x86-64
+  libdlib-dev                  # the open engine
+  googletest                   # sources; the tests are built from them for both presets
+  openjdk-17-jdk-headless      # javac, JNI headers and the virtual machine
+  junit4                       # the tests in the virtual machine
+)
+packages_aarch64=(
+  "${packages_host[@]}"
+  clang-19 lld-19 llvm-19      # the compiler family of Android's NDK
+  g++-aarch64-linux-gnu        # the C and C++ libraries that it compiles and links against
+  qemu-user                    # runs the result
+)
+
+# Unpacked for 64-bit Arm: a root folder that qemu-aarch64 takes with -L.
+arm64_aarch64=(
+  libdlib-dev                                 # the open engine's static library
+  openjdk-17-jre-headless                     # the virtual machine,
+  libc6 libgcc-s1 libstdc++6 zlib1g           # what it is linked with,
+  liblcms2-2 libjpeg62-turbo                  # and what it reads pictures with
+)
+
+as_root() {
+  if [ "$(id -u)" -eq 0 ]; then
+    env DEBIAN_FRONTEND=noninteractive "$@"
+  elif command -v sudo >/dev/null; then
+    sudo env DEBIAN_FRONTEND=noninteractive "$@"
+  else
+    fail "installing packages needs root: run this as root, or install sudo"
+  fi
+}
+
+# install_packages NAME...: installs those that are missing.
+install_packages() {
+  local installed missing=() name
+  installed=" $(dpkg-query -W -f '${db:Status-Abbrev}${binary:Package}\n' 2>/dev/null |
+    sed -n 's/^ii *\([^:]*\).*/\1/p' | tr '\n' ' ') "
+  for name in "$@"; do
+    case $installed in
+      *" $name "*) ;;
+      *) missing+=("$name") ;;
+    esac
+  done
+  [ ${#missing[@]} -gt 0 ] || return 0
+
+  say "installing ${missing[*]}"
+  # Package lists may be absent or out of date: fetch them when a first attempt fails, not before.
+  local install=(apt-get install -y -q --no-install-recommends "${missing[@]}")
+  if ! as_root "${install[@]}" >&2; then
+    say "trying again with fresh package lists"
+    as_root apt-get update -q >&2
+    as_root "${install[@]}" >&2 || fail "could not install ${missing[*]}"
+  fi
+}
+
+# relink FOLDER: makes symbolic links from one file of an unpacked system to another relative, since absolute ones
+# would lead into this machine's own system.
+relink() {
+  local link target
+  while IFS= read -r -d '' link; do
+    target=$1$(readlink "$link")
+    [ ! -e "$target" ] || ln -sfn "$(realpath -s --relative-to="$(dirname "$link")" "$target")" "$link"
+  done < <(find "$1" -type l -lname '/*' -print0)
+}
+
+# unpack_arm64 NAME...: unpacks those that are missing into .deps/arm64. apt-get is given the other architecture,
+# an empty list of installed packages and folders of its own on the command line, so that this system's
+# configuration stays as it is and no root is needed.
+unpack_arm64() {
+  local record=$deps/arm64.packages missing=() name work
+  mkdir -p "$arm64_root"
+  exec 9>"$deps/lock"
+  flock 9 # another script may be at it
+  touch "$record"
+  for name in "$@"; do
+    grep -qx "$name" "$record" || missing+=("$name")
+  done
+  if [ ${#missing[@]} -eq 0 ]; then
+    exec 9>&-
+    return 0
+  fi
+
+  say "unpacking ${missing[*]} for arm64 into .deps/arm64"
+  work=$deps/apt
+  rm -rf "$work"
+  mkdir -p "$work"/lists/partial "$work"/cache/archives/partial "$work"/packages
+  : >"$work/status"
+  local apt=(apt-get -q -o APT::Architecture=arm64 -o APT::Architectures=arm64
+    -o Dir::State="$work" -o Dir::State::Lists="$work/lists" -o Dir::State::status="$work/status"
+    -o Dir::Cache="$work/cache" -o Acquire::Languages=none -o APT::Sandbox::User=root)
+  # A source without arm64 packages is no obstacle as long as another has what is needed.
+  "${apt[@]}" update >&2 || say "not every package source could be read"
+  (cd "$work/packages" && "${apt[@]}" download "${missing[@]}" >&2) ||
+    fail "could not download ${missing[*]} for arm64 from this system's package sources"
+  for name in "$work"/packages/*.deb; do
+    dpkg-deb -x "$name" "$arm64_root"
+  done
+  relink "$arm64_root"
+  printf '%s\n' "${missing[@]}" >>"$record"
+  rm -rf "$work"
+  exec 9>&-
+}
+
+command -v apt-get >/dev/null || fail "this needs a Debian system (Debian 12 or later): there is no apt-get"
+[ $# -gt 0 ] || set -- host aarch64
+packages=() arm64=()
+for group in "$@"; do
+  case $group in
+    host) packages+=("${packages_host[@]}") ;;
+    aarch64) packages+=("${packages_aarch64[@]}") arm64+=("${arm64_aarch64[@]}") ;;
+    *) fail "there is no group \"$group\"; the groups are host and aarch64" ;;
+  esac
+done
+readarray -t packages < <(printf '%s\n' "${packages[@]}" | awk '!seen[$0]++')
+install_packages "${packages[@]}"
+[ ${#arm64[@]} -eq 0 ] || unpack_arm64 "${arm64[@]}"
