@@ -1,0 +1,39 @@
+# Java sources to jars. Class files are of Java 8, the level that every Android project takes; what a later JDK says
+# about the age of that level is no finding.
+find_package(Java 11 REQUIRED COMPONENTS Development)
+
+# kyface_jar(NAME sources... [DOCUMENTED] [JARS jar...]): target NAME_jar, which makes
+# ${CMAKE_BINARY_DIR}/jar/NAME.jar. JARS are names given to this function before, or paths of other jars.
+# With DOCUMENTED whatever is public must carry complete documentation.
+function(kyface_jar name)
+  cmake_parse_arguments(PARSE_ARGV 1 arg "DOCUMENTED" "" "JARS")
+  set(jar ${CMAKE_BINARY_DIR}/jar/${name}.jar)
+  set(classes ${CMAKE_CURRENT_BINARY_DIR}/${name}.classes)
+  set(class_path)
+  set(needed)
+  foreach(other IN LISTS arg_JARS)
+    if(TARGET ${other}_jar)
+      set(file ${CMAKE_BINARY_DIR}/jar/${other}.jar)
+      list(APPEND needed ${other}_jar ${file})
+    else()
+      set(file ${other})
+    endif()
+    list(APPEND class_path ${file})
+  endforeach()
+  set(doclint)
+  if(arg_DOCUMENTED)
+    set(doclint -Xdoclint:all/protected)
+  endif()
+  list(JOIN class_path ":" class_path)
+  add_custom_command(
+    OUTPUT ${jar}
+    COMMAND ${CMAKE_COMMAND} -E rm -rf ${classes}
+    COMMAND ${CMAKE_COMMAND} -E make_directory ${classes} ${CMAKE_BINARY_DIR}/jar
+    COMMAND ${Java_JAVAC_EXECUTABLE} --release 8 -Xlint:all,-options -Werror -encoding UTF-8 -implicit:none ${doclint}
+            -cp "${class_path}" -d ${classes} ${arg_UNPARSED_ARGUMENTS}
+    COMMAND ${Java_JAR_EXECUTABLE} --create --file ${jar} -C ${classes} .
+    DEPENDS ${arg_UNPARSED_ARGUMENTS} ${needed}
+    COMMENT "Building ${name}.jar"
+    VERBATIM)
+  add_custom_target(${name}_jar ALL DEPENDS ${jar})
+endfunction()
