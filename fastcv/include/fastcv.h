@@ -1,0 +1,263 @@
+/// HPC::fastcv: image kernels for camera frames, vectorised for 64-bit Arm.
+///
+/// Callers wrap their pixel buffers in matrices (`Mat`) and call a front-end: `cvtColor`, `crop`, `rotate` or
+/// `rotate_YUV420`. A front-end checks both matrices, returns an `HPCStatus_t`, and on success runs one
+/// kernel over the whole image. It allocates nothing, logs nothing, keeps no state, and leaves the
+/// destination as it was whenever it returns anything but `HPC_SUCCESS`. Threads may call it on distinct
+/// destinations.
+///
+/// The checks are those of each front-end's comment and no more. The data pointers in particular are the
+/// caller's word (except in `rotate`), and so is that a buffer really holds what `width`, `height` and `step`
+/// say.
+#pragma once
+
+#include <malloc.h>
+
+#include <cstddef>
+#include <cstdint>
+#include <cstdlib>
+#include <utility>
+
+// Everything declared here is part of the shared library's interface.
+#pragma GCC visibility push(default)
+
+namespace HPC::fastcv {
+
+/// Result of a front-end.
+enum HPCStatus_t : int32_t {
+  HPC_SUCCESS = 0,
+  HPC_POINTER_NULL = 4,  ///< `rotate`: a `data` pointer is null; `rotate_YUV420`: the destination is null
+  HPC_INVALID_ARGS = 5,  ///< sizes, parity, strides, rectangle or angle; `cvtColor`: the destination is null
+  HPC_MAT_EMPTY = 12,    ///< a matrix has `dims` 0
+};
+
+/// Execution environment whose kernels a front-end calls; the last template argument of everything here.
+enum EcoEnv_t {
+  ECO_ENV_ARM = 2,  ///< the NEON kernels
+};
+
+/// Colour conversions. "BGR" and "RGB" images may have a fourth channel, alpha: a conversion ignores it
+/// unless it only moves channels; where it creates one, that is opaque (255, or 1.0f for float).
+enum ColorCvtType {
+  CVT_BGR2NV21 = 0,
+  CVT_NV212BGR = 1,
+  CVT_NV212RGB = 2,
+  CVT_RGB2NV21 = 3,
+  CVT_BGR2NV12 = 4,
+  CVT_NV122BGR = 5,
+  CVT_YCrCb2BGR = 6,
+  CVT_BGR2YCrCb = 7,
+  CVT_BGR2HSV = 8,
+  CVT_HSV2BGR = 9,
+  CVT_BGR2GRAY = 10,
+  CVT_GRAY2BGR = 11,
+  CVT_BGR2BGRA = 12,
+  CVT_BGRA2BGR = 13,
+  CVT_BGR2RGB = 14,  ///< swaps red and blue, with or without alpha on either side; its own inverse
+  CVT_BGR2LAB = 15,
+  CVT_LAB2BGR = 16,
+  CVT_BGR2I420 = 17,
+  CVT_I4202BGR = 18,
+  CVT_YUV2GRAY = 19,  ///< the luma plane of any 4:2:0 buffer
+  CVT_RGB2NV12 = 20,
+  CVT_NV122RGB = 21,
+};
+
+/// Layouts of a YUV 4:2:0 frame: a luma plane, then the chroma.
+enum YUV420Type {
+  YUV420_NV21 = 0,  ///< one half-height plane of V,U pairs
+  YUV420_NV12 = 1,  ///< one half-height plane of U,V pairs
+  YUV420_I420 = 2,  ///< a U plane, then a V plane, each a quarter of the luma plane
+};
+
+/// A point, or the top-left corner of a rectangle.
+template <typename T>
+struct Point2_ {
+  T x;  ///< column
+  T y;  ///< row
+};
+
+/// An image of `nc` (1, 3 or 4) interleaved channels of `T` (`unsigned char` or `float`).
+///
+/// A matrix is a view over its caller's pixels unless `ownsData` says otherwise; the fields may be set
+/// freely. A YUV 4:2:0 frame is held as a one-channel matrix whose `height` is 3/2 of the picture's: luma
+/// rows, then chroma rows, all `step` bytes apart.
+template <typename T, int nc, EcoEnv_t env>
+struct Mat {
+  int32_t dims = 0;       ///< 2 once set up, 0 for an empty matrix
+  int32_t width = 0;      ///< columns, in pixels
+  int32_t height = 0;     ///< rows
+  int64_t step = 0;       ///< distance between the starts of two rows, in bytes
+  int64_t total = 0;      ///< `width * height`
+  int64_t byteSize = 0;   ///< `step * height`
+  T* data = nullptr;      ///< first element of row 0
+  bool ownsData = false;  ///< whether the destructor releases `data` with `free`
+
+  /// An empty matrix.
+  Mat() = default;
+
+  /// A view of `viewHeight` rows of `viewWidth` pixels at `pixels`, with nothing between the rows.
+  Mat(int viewWidth, int viewHeight, T* pixels)
+      : dims(2),
+        width(viewWidth),
+        height(viewHeight),
+        step(static_cast<int64_t>(viewWidth) * nc * static_cast<int64_t>(sizeof(T))),
+        total(static_cast<int64_t>(viewWidth) * viewHeight),
+        byteSize(step * viewHeight),
+        data(pixels) {}
+
+  /// A matrix that owns packed, uninitialised pixels, 64-byte aligned. `data` is null when there is no memory
+  /// for them.
+  static Mat allocate(int width, int height) {
+    constexpr size_t kAlignment = 64;
+    Mat mat(width, height, nullptr);
+    const size_t size = (static_cast<size_t>(mat.byteSize) + kAlignment - 1) / kAlignment * kAlignment;
+    mat.data = static_cast<T*>(memalign(kAlignment, size));
+    mat.ownsData = true;
+    return mat;
+  }
+
+  Mat(const Mat&) = delete;
+  Mat& operator=(const Mat&) = delete;
+
+  Mat(Mat&& other) noexcept { swap(other); }
+
+  Mat& operator=(Mat&& other) noexcept {
+    swap(other);
+    return *this;
+  }
+
+  ~Mat() {
+    if (data != nullptr && ownsData) {
+      free(data);
+    }
+  }
+
+ private:
+  void swap(Mat& other) noexcept {
+    std::swap(dims, other.dims);
+    std::swap(width, other.width);
+    std::swap(height, other.height);
+    std::swap(step, other.step);
+    std::swap(total, other.total);
+    std::swap(byteSize, other.byteSize);
+    std::swap(data, other.data);
+    std::swap(ownsData, other.ownsData);
+  }
+};
+
+namespace detail {
+/// Always false, but only known to be so once its template is instantiated: the condition of the front-ends'
+/// `static_assert`.
+template <auto... values>
+inline constexpr bool kNever = false;
+}  // namespace detail
+
+/// Converts `src` into `*dst`, which the caller has set up with its size and data.
+///
+/// Only the instances of FASTCV_CVT_COLOR_INSTANCES exist; any other does not compile. The checks, in this
+/// order, with S a matrix's step in elements, W and H its width and height, in signed 32-bit arithmetic, X /
+/// 3 truncating:
+/// - `dst` null: HPC_INVALID_ARGS; `src`, then `*dst` empty: HPC_MAT_EMPTY;
+/// - by family, HPC_INVALID_ARGS unless
+///   - packed (values 6 to 16): where both S hold a row, W and H are equal; otherwise W and H of `src` are
+///   even, W is
+///     equal, and H(src) == H(dst) / 3 * 2;
+///   - to 4:2:0 (0, 3, 4, 17, 20): W and H of `src` are even, W is equal, and H(src) == H(dst) / 3 * 2;
+///   - from 4:2:0 (1, 2, 5, 18, 19, 21): where both S hold a row, W and H of `*dst` are even, W is equal, and
+///     H(dst) == H(src) / 3 * 2; otherwise the rule "to 4:2:0".
+///
+/// The second rules of the packed and the "from 4:2:0" families can describe no valid image. They decide
+/// which malformed calls still reach a kernel, and are kept for callers that rely on it.
+template <ColorCvtType type, typename Tsrc, int ncSrc, typename Tdst, int ncDst, EcoEnv_t env>
+HPCStatus_t cvtColor(const Mat<Tsrc, ncSrc, env>& /*src*/, Mat<Tdst, ncDst, env>* /*dst*/) {
+  static_assert(
+      detail::kNever<type, ncSrc, ncDst, env>,
+      "HPC::fastcv::cvtColor has no such instance: FASTCV_CVT_COLOR_INSTANCES lists the conversions, "
+      "element types and channel counts that exist");
+  return HPC_INVALID_ARGS;
+}
+
+/// Copies the rectangle of `dst->width` by `dst->height` pixels at `p` out of `src` into `*dst`, every sample
+/// (alpha too) multiplied by `ratio`; a `ratio` of 1 is a plain copy. 8-bit results are rounded, halves
+/// upward, and saturated.
+///
+/// Checks, in order: `src`, then `*dst` empty: HPC_MAT_EMPTY; the rectangle not wholly inside `src` (touching
+/// the right and bottom edges is inside): HPC_INVALID_ARGS.
+template <typename T, int ncSrc, typename TDst, int ncDst, int nc, EcoEnv_t env>
+HPCStatus_t crop(const Mat<T, ncSrc, env>& /*src*/, Point2_<int> /*p*/, TDst /*ratio*/,
+                 Mat<TDst, ncDst, env>* /*dst*/) {
+  static_assert(detail::kNever<ncSrc, ncDst, nc, env>,
+                "HPC::fastcv::crop has no such instance: FASTCV_PACKED_INSTANCES lists those that exist");
+  return HPC_INVALID_ARGS;
+}
+
+/// Rotates `src` clockwise by `degree`, exactly 90, 180 or 270, into `*dst`. The images must not overlap.
+///
+/// Checks, in order: `src.data`, then `dst->data` null: HPC_POINTER_NULL; `src`, then `*dst` empty:
+/// HPC_MAT_EMPTY; any other angle, or a destination whose size is not that of the rotated source:
+/// HPC_INVALID_ARGS. A size or source step of 0 that passes them ends the process by assertion.
+template <typename T, int ncSrc, int ncDst, int nc, EcoEnv_t env>
+HPCStatus_t rotate(const Mat<T, ncSrc, env>& /*src*/, Mat<T, ncDst, env>* /*dst*/, float /*degree*/) {
+  static_assert(detail::kNever<ncSrc, ncDst, nc, env>,
+                "HPC::fastcv::rotate has no such instance: FASTCV_PACKED_INSTANCES lists those that exist");
+  return HPC_INVALID_ARGS;
+}
+
+/// Rotates a whole YUV 4:2:0 frame clockwise by `degree`, exactly 90, 180 or 270, into `*dst`. The frames
+/// must not overlap. Width and luma height (height * 2 / 3) are expected to be even: an odd last chroma
+/// column or row is lost.
+///
+/// Checks, in order: `dst` null: HPC_POINTER_NULL; `src`, then `*dst` empty: HPC_MAT_EMPTY; any other angle,
+/// or a destination whose width and luma height are not those of the rotated source: HPC_INVALID_ARGS.
+template <YUV420Type type, typename T, EcoEnv_t env>
+HPCStatus_t rotate_YUV420(const Mat<unsigned char, 1, env>& /*src*/, Mat<unsigned char, 1, env>* /*dst*/,
+                          float /*degree*/) {
+  static_assert(detail::kNever<type, env>,
+                "HPC::fastcv::rotate_YUV420 has no such instance: unsigned char is its only element type");
+  return HPC_INVALID_ARGS;
+}
+
+// The instances that exist. X is given (conversion, element type of both sides, source channels, destination
+// channels).
+#define FASTCV_CVT_BOTH_TYPES(X, type, ncSrc, ncDst) \
+  X(type, unsigned char, ncSrc, ncDst)               \
+  X(type, float, ncSrc, ncDst)
+
+#define FASTCV_CVT_COLOR_INSTANCES(X)  \
+  X(CVT_BGR2NV21, unsigned char, 3, 1) \
+  X(CVT_BGR2NV21, unsigned char, 4, 1) \
+  X(CVT_NV212BGR, unsigned char, 1, 3) \
+  X(CVT_NV212BGR, unsigned char, 1, 4) \
+  X(CVT_NV212RGB, unsigned char, 1, 3) \
+  X(CVT_NV212RGB, unsigned char, 1, 4) \
+  X(CVT_RGB2NV21, unsigned char, 3, 1) \
+  X(CVT_RGB2NV21, unsigned char, 4, 1) \
+  X(CVT_BGR2NV12, unsigned char, 3, 1) \
+  X(CVT_BGR2NV12, unsigned char, 4, 1) \
+  X(CVT_NV122BGR, unsigned char, 1, 3) \
+  X(CVT_NV122BGR, unsigned char, 1, 4) \
+  X(CVT_RGB2NV12, unsigned char, 3, 1) \
+  X(CVT_RGB2NV12, unsigned char, 4, 1) \
+  X(CVT_NV122RGB, unsigned char, 1, 3) \
+  X(CVT_NV122RGB, unsigned char, 1, 4)
+
+// X is given (element type, channels): the instances of `crop` and `rotate`.
+#define FASTCV_PACKED_INSTANCES(X) \
+  X(unsigned char, 1)              \
+  X(unsigned char, 3)              \
+  X(unsigned char, 4)              \
+  X(float, 1)                      \
+  X(float, 3)                      \
+  X(float, 4)
+
+#define FASTCV_DECLARE_CVT_COLOR(type, T, ncSrc, ncDst)                                          \
+  template <>                                                                                    \
+  HPCStatus_t cvtColor<type, T, ncSrc, T, ncDst, ECO_ENV_ARM>(const Mat<T, ncSrc, ECO_ENV_ARM>&, \
+                                                              Mat<T, ncDst, ECO_ENV_ARM>*);
+FASTCV_CVT_COLOR_INSTANCES(FASTCV_DECLARE_CVT_COLOR)
+#undef FASTCV_DECLARE_CVT_COLOR
+
+}  // namespace HPC::fastcv
+
+#pragma GCC visibility pop

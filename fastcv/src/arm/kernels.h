@@ -1,0 +1,112 @@
+/// The kernels of HPC::fastcv: one entry point for each operation, called by the front-ends once their checks
+/// have passed.
+///
+/// Kernels return nothing and trust their arguments, except those that say that they assert. They write only
+/// inside the destination's rows (`armLAB2BGRImage` of `unsigned char` excepted), and nothing at all where a
+/// size is below what they can work on. All offsets are formed in 64 bits.
+///
+/// Every colour kernel takes, in this order:
+/// - `height`, `width`: size of the picture in pixels; for 4:2:0 buffers `height` is the luma height;
+/// - `inWidthStride`, `inData`: source row pitch in elements of `Tsrc` (bytes, or floats), and source pixels;
+/// - `outWidthStride`, `outData`: the same of the destination.
+/// An alpha channel that a kernel creates is 255, or 1.0f for `float`.
+#pragma once
+
+#pragma GCC visibility push(default)
+
+namespace HPC::fastcv {
+
+#define FASTCV_COLOR_KERNEL(name)                               \
+  template <typename Tsrc, int ncSrc, typename Tdst, int ncDst> \
+  void name(int height, int width, int inWidthStride, const Tsrc* inData, int outWidthStride, Tdst* outData)
+
+// ---- semi-planar 4:2:0, full range (NV_arm)
+// ------------------------------------------------------------------- NV21 has V,U pairs, NV12 U,V pairs; the
+// chroma rows start at height * stride and have the same stride. Only whole 2 x 2 blocks are converted: a
+// last odd row or column is left as it was, and a picture of one row writes nothing.
+
+FASTCV_COLOR_KERNEL(armBGR2NV21Image);
+FASTCV_COLOR_KERNEL(armNV212BGRImage);
+FASTCV_COLOR_KERNEL(armRGB2NV21Image);
+FASTCV_COLOR_KERNEL(armNV212RGBImage);
+FASTCV_COLOR_KERNEL(armBGR2NV12Image);
+FASTCV_COLOR_KERNEL(armNV122BGRImage);
+FASTCV_COLOR_KERNEL(armRGB2NV12Image);
+FASTCV_COLOR_KERNEL(armNV122RGBImage);
+
+// ---- planar 4:2:0, limited range (BGR_I420_arm), and its luma (YUV_GRAY_arm)
+// ----------------------------------- These assert: non-null pointers, sizes and strides other than 0, and
+// for the colour kernels even sizes. Chroma rows are packed two to a stride row, U plane first; see
+// BGR_I420_arm.cpp.
+
+FASTCV_COLOR_KERNEL(armBGR2I420Image);
+FASTCV_COLOR_KERNEL(armI4202BGRImage);
+/// Copies the luma rows of any Y-first 4:2:0 buffer; all sizes.
+FASTCV_COLOR_KERNEL(armYUV2GRAYImage);
+
+// ---- packed images
+// -------------------------------------------------------------------------------------------- All sizes. The
+// channel reorderings of equal channel counts also work in place.
+
+FASTCV_COLOR_KERNEL(armBGR2BGRAImage);
+FASTCV_COLOR_KERNEL(armBGRA2BGRImage);
+FASTCV_COLOR_KERNEL(armBGR2RGBImage);
+FASTCV_COLOR_KERNEL(armBGR2GRAYImage);
+FASTCV_COLOR_KERNEL(armGRAY2BGRImage);
+FASTCV_COLOR_KERNEL(armBGR2YCrCbImage);
+FASTCV_COLOR_KERNEL(armYCrCb2BGRImage);
+FASTCV_COLOR_KERNEL(armBGR2HSVImage);
+FASTCV_COLOR_KERNEL(armHSV2BGRImage);
+FASTCV_COLOR_KERNEL(armBGR2LABImage);
+/// With `unsigned char`, rows are worked on in groups of 8 pixels while the group's first pixel is below
+/// `width` - 3: the last group may read and write up to 4 pixels past the row's end. The next row rewrites
+/// what was overwritten; after the last row both buffers must have room for those 4 pixels.
+FASTCV_COLOR_KERNEL(armLAB2BGRImage);
+
+#undef FASTCV_COLOR_KERNEL
+
+// ---- geometry
+// -------------------------------------------------------------------------------------------------
+
+/// Copies the rectangle of `outHeight` by `outWidth` pixels at row `top`, column `left`, each sample
+/// multiplied by `ratio` (a plain copy when it is exactly 1). Strides in elements; nothing is checked.
+template <typename T, int ncSrc, typename TDst, int ncDst, int nc>
+void armImageCrop(int top, int left, int inWidthStride, const T* inData, int outHeight, int outWidth,
+                  int outWidthStride, TDst* outData, float ratio);
+
+/// Rotates an image of `nc`-channel pixels clockwise by `degree`, 90, 180 or 270; 1 to 4 channels. Asserts
+/// its pointers, its sizes and source stride (not the destination stride) and the angle. Strides in elements;
+/// the images do not overlap.
+template <typename T, int ncSrc, int ncDst, int nc>
+void armRotateNx90degree(int inHeight, int inWidth, int inWidthStride, const T* inData, int outHeight,
+                         int outWidth, int outWidthStride, T* outData, int degree);
+
+/// The workers of `armRotateNx90degree`: they fill `outHeight` by `outWidth` pixels, each written once; the
+/// source sizes enter only the mapping of indices. `blockHeight` and `blockWidth` are the cache blocks, 64
+/// by 64.
+template <typename T, int nc, int blockHeight, int blockWidth>
+void imgRotate90degree(int inHeight, int inWidth, int inWidthStride, const T* inData, int outHeight,
+                       int outWidth, int outWidthStride, T* outData);
+template <typename T, int nc, int blockHeight, int blockWidth>
+void imgRotate180degree(int inHeight, int inWidth, int inWidthStride, const T* inData, int outHeight,
+                        int outWidth, int outWidthStride, T* outData);
+template <typename T, int nc, int blockHeight, int blockWidth>
+void imgRotate270degree(int inHeight, int inWidth, int inWidthStride, const T* inData, int outHeight,
+                        int outWidth, int outWidthStride, T* outData);
+
+/// Rotates a whole 4:2:0 frame. Heights are those of the whole buffers (3/2 of the luma height), strides in
+/// bytes. `yuv420_type` is 0 for the semi-planar layouts and 1 for I420; anything else fails an assertion. An
+/// angle other than 90, 180 and 270 writes nothing.
+template <typename T>
+void armRotateNx90degree_YUV420(int inHeight, int inWidth, int inWidthStride, const T* inData, int outHeight,
+                                int outWidth, int outWidthStride, T* outData, int degree, int yuv420_type);
+
+/// The I420 worker of `armRotateNx90degree_YUV420`. Takes two scratch chroma planes from the heap; when there
+/// is no memory for them, nothing is written.
+template <typename T>
+void imgRotate_I420(int inHeight, int inWidth, int inWidthStride, const T* inData, int outHeight,
+                    int outWidth, int outWidthStride, T* outData, int degree);
+
+}  // namespace HPC::fastcv
+
+#pragma GCC visibility pop
