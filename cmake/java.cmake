@@ -1,6 +1,24 @@
-# Java sources to jars. Class files are of Java 8, the level that every Android project takes; what a later JDK says
-# about the age of that level is no finding.
-find_package(Java 11 REQUIRED COMPONENTS Development)
+# Java: sources to jars, and the virtual machine that runs them.
+#
+# Class files are of Java 8, the level that every Android project takes; what a later JDK says about the age of that
+# level is no finding.
+find_package(Java 11 REQUIRED COMPONENTS Development Runtime)
+
+# ${KYFACE_JAVA} runs Java for the architecture of this build, with this build's libraries. A cross build runs the
+# virtual machine of the unpacked arm64 packages under emulation, where the simple compiler and collector pay.
+set(KYFACE_JAVA ${CMAKE_BINARY_DIR}/bin/java)
+if(CMAKE_CROSSCOMPILING)
+  set(arm64_root ${PROJECT_SOURCE_DIR}/.deps/arm64)
+  set(java_program ${arm64_root}/usr/lib/jvm/java-17-openjdk-arm64/bin/java)
+  if(NOT EXISTS ${java_program})
+    message(FATAL_ERROR "There is no Java for arm64 in .deps. Run scripts/setup.sh, which unpacks it.")
+  endif()
+  set(java_command "qemu-aarch64 -cpu cortex-a76 -L '${arm64_root}' '${java_program}' -XX:+UseSerialGC \
+-XX:TieredStopAtLevel=1")
+else()
+  set(java_command "'${Java_JAVA_EXECUTABLE}'")
+endif()
+configure_file(${CMAKE_CURRENT_LIST_DIR}/java.sh.in ${KYFACE_JAVA} @ONLY USE_SOURCE_PERMISSIONS)
 
 # kyface_jar(NAME sources... [DOCUMENTED] [JARS jar...]): target NAME_jar, which makes
 # ${CMAKE_BINARY_DIR}/jar/NAME.jar. JARS are names given to this function before, or paths of other jars.

@@ -1,9 +1,9 @@
+# shellcheck shell=bash disable=SC2034
 # Shared by the scripts of this folder; sourced, never run. Leaves the caller in the project's root, which is $root.
 set -euo pipefail
 
+started_in=$PWD
 root=$(cd "$(dirname "${BASH_SOURCE[0]}")/.." && pwd)
-deps=$root/.deps
-arm64_root=$deps/arm64
 program=$(basename "$0")
 cd "$root"
 
@@ -12,4 +12,13 @@ say() { printf '%s: %s\n' "$program" "$*" >&2; }
 fail() {
   say "$@"
   exit 1
+}
+
+# build PRESET [TARGET...]: configures and builds; without a target, everything.
+build() {
+  local preset=$1
+  shift
+  say "building for $preset"
+  cmake --preset "$preset" -Wno-dev --log-level=WARNING >&2 || return 1
+  cmake --build --preset "$preset" ${1:+--target "$@"} >&2
 }

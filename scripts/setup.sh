@@ -32,6 +32,9 @@ arm64_aarch64=(
   liblcms2-2 libjpeg62-turbo                  # and what it reads pictures with
 )
 
+deps=$root/.deps
+arm64_root=$deps/arm64
+
 as_root() {
   if [ "$(id -u)" -eq 0 ]; then
     env DEBIAN_FRONTEND=noninteractive "$@"

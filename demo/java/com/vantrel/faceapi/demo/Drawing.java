@@ -1,0 +1,57 @@
+package com.vantrel.faceapi.demo;
+
+import android.graphics.PointF;
+import com.vantrel.faceapi.model.FaceInfo;
+import java.awt.BasicStroke;
+import java.awt.Color;
+import java.awt.Graphics2D;
+import java.awt.RenderingHints;
+import java.awt.geom.Ellipse2D;
+import java.awt.image.BufferedImage;
+import java.io.File;
+import java.io.IOException;
+import javax.imageio.ImageIO;
+
+/** Draws what was found into pictures and writes them. */
+final class Drawing {
+    private Drawing() {}
+
+    /** A picture of packed RGBA pixels; alpha is taken as opaque. */
+    static BufferedImage fromRgba(byte[] rgba, int width, int height) {
+        BufferedImage image = new BufferedImage(width, height, BufferedImage.TYPE_INT_RGB);
+        int[] row = new int[width];
+        for (int y = 0, at = 0; y < height; y++) {
+            for (int x = 0; x < width; x++, at += 4) {
+                row[x] = (rgba[at] & 0xFF) << 16 | (rgba[at + 1] & 0xFF) << 8 | (rgba[at + 2] & 0xFF);
+            }
+            image.setRGB(0, y, width, 1, row, 0, width);
+        }
+        return image;
+    }
+
+    /** Draws the rectangle and the landmarks of each face. */
+    static void faces(BufferedImage image, FaceInfo[] faces) {
+        Graphics2D g = image.createGraphics();
+        g.setRenderingHint(RenderingHints.KEY_ANTIALIASING, RenderingHints.VALUE_ANTIALIAS_ON);
+        for (FaceInfo face : faces) {
+            outline(g, face, new Color(0, 0, 0, 160), 5);
+            outline(g, face, new Color(80, 255, 120), 2.5f);
+            for (PointF point : face.facePoints) {
+                g.fill(new Ellipse2D.Float(point.x - 2, point.y - 2, 4, 4));
+            }
+        }
+        g.dispose();
+    }
+
+    private static void outline(Graphics2D g, FaceInfo face, Color color, float thickness) {
+        g.setColor(color);
+        g.setStroke(new BasicStroke(thickness, BasicStroke.CAP_ROUND, BasicStroke.JOIN_ROUND));
+        g.drawRect(face.faceRect.left, face.faceRect.top, face.faceRect.width(), face.faceRect.height());
+    }
+
+    static void writePng(BufferedImage image, File file) throws IOException {
+        if (!ImageIO.write(image, "png", file)) {
+            throw new IOException("this Java has no PNG writer");
+        }
+    }
+}

@@ -1,0 +1,88 @@
+package com.vantrel.faceapi;
+
+/**
+ * The open engine's pixel formats, orientations, configurations and result codes. {@link FaceLibrary} hands them
+ * through as they are; an app that brings another engine uses that engine's values.
+ */
+public final class EngineValues {
+    /** Gray, one byte a pixel. */
+    public static final int PIXEL_GRAY = 0;
+    /** Three bytes a pixel, blue first. */
+    public static final int PIXEL_BGR = 1;
+    /** Three bytes a pixel, red first. */
+    public static final int PIXEL_RGB = 2;
+    /** Four bytes a pixel, blue first; alpha is ignored. As a little-endian {@code int}: 0xAARRGGBB. */
+    public static final int PIXEL_BGRA = 3;
+    /** Four bytes a pixel, red first; alpha is ignored. As a little-endian {@code int}: 0xAABBGGRR. */
+    public static final int PIXEL_RGBA = 4;
+    /** {@code height} rows of luma, then {@code height / 2} rows of V, U pairs; width and height are even. */
+    public static final int PIXEL_NV21 = 5;
+    /** {@code height} rows of luma, then {@code height / 2} rows of U, V pairs; width and height are even. */
+    public static final int PIXEL_NV12 = 6;
+
+    /** Faces are upright in the frame as it is. */
+    public static final int ORIENTATION_0 = 0;
+    /** Faces are upright once the frame is turned clockwise by 90 degrees, as on most phones held upright. */
+    public static final int ORIENTATION_90 = 90;
+    /** Faces are upright once the frame is turned by 180 degrees. */
+    public static final int ORIENTATION_180 = 180;
+    /** Faces are upright once the frame is turned clockwise by 270 degrees. */
+    public static final int ORIENTATION_270 = 270;
+
+    /** Looks for faces of 80 pixels and more, in frames of up to {@link #SMALL_FRAME_PIXELS} for those of 40 too. */
+    public static final int CONFIG_DEFAULT = 0;
+    /** Looks for faces of 80 pixels and more. */
+    public static final int CONFIG_LARGE_FACES = 1;
+    /** Looks for faces of 40 pixels and more, for four times the work. */
+    public static final int CONFIG_SMALL_FACES = 2;
+
+    /** The largest frame, in pixels, that {@link #CONFIG_DEFAULT} enlarges to find small faces. */
+    public static final int SMALL_FRAME_PIXELS = 76800;
+    /** The longest side of a frame, in pixels. */
+    public static final int MAX_FRAME_SIDE = 8192;
+
+    /** The detection threshold of a new detector; a face counts when its score, 0 to 1, exceeds the threshold. */
+    public static final float DEFAULT_THRESHOLD = 0.6f;
+    /** The lowest detection threshold. */
+    public static final float MIN_THRESHOLD = 0.01f;
+    /** The highest detection threshold; nothing passes it. */
+    public static final float MAX_THRESHOLD = 1.0f;
+
+    /** What follows the name of a model file in the name of the landmark model beside it. */
+    public static final String LANDMARKS_SUFFIX = ".landmarks";
+
+    /** The call succeeded. */
+    public static final int SUCCESS = 0;
+    /** A pointer that must not be null is. */
+    public static final int ERROR_NULL_POINTER = -1;
+    /** The handle is 0, destroyed, or of another kind. */
+    public static final int ERROR_HANDLE = -2;
+    /** The pixel format is none of those above. */
+    public static final int ERROR_PIXEL_FORMAT = -3;
+    /** A side is below 1 or above {@link #MAX_FRAME_SIDE}, or odd in a 4:2:0 format. */
+    public static final int ERROR_SIZE = -4;
+    /** The stride is shorter than a row. */
+    public static final int ERROR_STRIDE = -5;
+    /** The orientation is none of those above. */
+    public static final int ERROR_ORIENTATION = -6;
+    /** The configuration is none of those above. */
+    public static final int ERROR_CONFIG = -7;
+    /** A setting is outside its range. */
+    public static final int ERROR_RANGE = -8;
+    /** The model file cannot be opened. */
+    public static final int ERROR_MODEL_FILE = -9;
+    /** The model file holds no model that fits. */
+    public static final int ERROR_MODEL = -10;
+    /** The file beside the model holds no landmark model that fits. */
+    public static final int ERROR_LANDMARK_MODEL = -11;
+    /** The face cannot belong to the frame. */
+    public static final int ERROR_FACE = -12;
+    /** The feature is null, released, or no feature. */
+    public static final int ERROR_FEATURE = -13;
+    /** There is not enough memory. */
+    public static final int ERROR_MEMORY = -14;
+    /** Anything else. */
+    public static final int ERROR_INTERNAL = -15;
+
+    private EngineValues() {}
+}
