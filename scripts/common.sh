@@ -5,6 +5,7 @@ set -euo pipefail
 started_in=$PWD
 root=$(cd "$(dirname "${BASH_SOURCE[0]}")/.." && pwd)
 program=$(basename "$0")
+self=$root/scripts/$program
 cd "$root"
 
 # Progress goes to standard error, so that standard output holds results alone.
@@ -12,6 +13,12 @@ say() { printf '%s: %s\n' "$program" "$*" >&2; }
 fail() {
   say "$@"
   exit 1
+}
+
+# usage: prints the comment at the top of the script, from its second line on, and leaves.
+usage() {
+  sed -n '2,${/^# shellcheck/q;/^#/!q;s/^# \{0,1\}//;p}' "$self"
+  exit 0
 }
 
 # build PRESET [TARGET...]: configures and builds; without a target, everything.

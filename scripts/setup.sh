@@ -7,6 +7,7 @@
 # that are there already are left alone, and nothing is asked when all are. Packages of this machine are installed
 # with apt-get (through sudo when not root). Packages of 64-bit Arm are unpacked into .deps/arm64: installing them
 # would pull this system's own packages along.
+# shellcheck source=scripts/common.sh
 source "$(dirname "${BASH_SOURCE[0]}")/common.sh"
 
 packages_host=(
