@@ -1,0 +1,99 @@
+// Native methods of FaceLibrary over the engine's still-image detector.
+#include <jni.h>
+
+#include "bridge_log.h"
+#include "engine_values.h"
+#include "face_analysis.h"
+#include "kyface_api.h"
+#include "pinned.h"
+
+namespace {
+
+struct Detector {
+  static constexpr auto kAnalyse = ky_face_detect;
+  static constexpr auto kRelease = ky_face_release_detector_result;
+  static constexpr char kHandleIsNull[] = "kyFaceDetect detect handle is null";
+  static constexpr char kImageIsNull[] = "detect input image is null";
+};
+
+jobjectArray kyFaceDetect(JNIEnv* env, long long handle, const unsigned char* image, int pixelFormat,
+                          int width, int height, int stride, int orientation, jintArray status) {
+  return kyface::analyse_faces<Detector>(env, handle, image, pixelFormat, width, height, stride, orientation,
+                                         status);
+}
+
+}  // namespace
+
+extern "C" {
+
+JNIEXPORT jlong JNICALL Java_com_vantrel_faceapi_FaceLibrary_kyFaceCreateDetector(JNIEnv* env,
+                                                                                  jobject /*thiz*/,
+                                                                                  jstring modelPath,
+                                                                                  jint config) {
+  kyface::StringChars path(env, modelPath);
+  if (path.refused()) {
+    return 0;
+  }
+  ky_handle_t handle = nullptr;
+  const int result = ky_face_create_detector(&handle, path.get(), config);
+  if (result != 0) {
+    // The path's characters are deliberately not released on this path.
+    FACE_LOG(ANDROID_LOG_ERROR, "FaceCreateDetector create handle fail : %d", result);
+    return 0;
+  }
+  path.release();
+  return kyface::to_java(handle);
+}
+
+JNIEXPORT void JNICALL Java_com_vantrel_faceapi_FaceLibrary_kyFaceDestroyDetector(JNIEnv* /*env*/,
+                                                                                  jobject /*thiz*/,
+                                                                                  jlong handle) {
+  if (handle == 0) {
+    FACE_LOG(ANDROID_LOG_ERROR, "kyFaceDestroyDetector destroy detect handle is null");
+    return;
+  }
+  ky_face_destroy_detector(kyface::to_handle(handle));
+  FACE_LOG(ANDROID_LOG_DEBUG, "ky_face_destroy_detector");
+}
+
+JNIEXPORT jfloat JNICALL Java_com_vantrel_faceapi_FaceLibrary_getDetectThreshold(JNIEnv* env,
+                                                                                 jobject /*thiz*/,
+                                                                                 jlong handle,
+                                                                                 jintArray status) {
+  float threshold = 0.0F;
+  const int result = ky_face_detect_get_threshold(kyface::to_handle(handle), &threshold);
+  FACE_LOG(ANDROID_LOG_DEBUG, "ky_face_detect_get_threshold threshold: %f", static_cast<double>(threshold));
+  return kyface::write_status(env, status, result) ? threshold : 0.0F;
+}
+
+JNIEXPORT void JNICALL Java_com_vantrel_faceapi_FaceLibrary_setDetectThreshold(JNIEnv* env, jobject /*thiz*/,
+                                                                               jlong handle, jfloat threshold,
+                                                                               jintArray status) {
+  if (threshold <= 0.0F) {  // a NaN goes on to the engine
+    return;
+  }
+  const int result = ky_face_detect_set_threshold(kyface::to_handle(handle), threshold);
+  FACE_LOG(ANDROID_LOG_DEBUG, "ky_face_detect_set_threshold threshold: %f", static_cast<double>(threshold));
+  kyface::write_status(env, status, result);
+}
+
+JNIEXPORT jobjectArray JNICALL Java_com_vantrel_faceapi_FaceLibrary_kyFaceDetectBytes(
+    JNIEnv* env, jobject /*thiz*/, jlong handle, jbyteArray image, jint pixelFormat, jint width, jint height,
+    jint stride, jint orientation, jintArray status) {
+  return kyface::analyse_array<Detector>(kyFaceDetect, env, handle, image, pixelFormat, width, height, stride,
+                                         orientation, status);
+}
+
+JNIEXPORT jobjectArray JNICALL Java_com_vantrel_faceapi_FaceLibrary_kyFaceDetectInts(
+    JNIEnv* env, jobject /*thiz*/, jlong handle, jintArray image, jint pixelFormat, jint width, jint height,
+    jint stride, jint orientation, jintArray status) {
+  return kyface::analyse_array<Detector>(kyFaceDetect, env, handle, image, pixelFormat, width, height, stride,
+                                         orientation, status);
+}
+
+JNIEXPORT jint JNICALL Java_com_vantrel_faceapi_FaceLibrary_kyFaceShowInsideModel(JNIEnv* /*env*/,
+                                                                                  jobject /*thiz*/) {
+  return ky_face_algorithm_info();
+}
+
+}  // extern "C"

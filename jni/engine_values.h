@@ -1,0 +1,30 @@
+/// How the engine's values cross into Java.
+#pragma once
+
+#include <jni.h>
+
+#include "kyface_api.h"
+#include "pinned.h"
+
+namespace kyface {
+
+/// An engine handle as Java carries it.
+inline ky_handle_t to_handle(long long handle) {
+  return reinterpret_cast<ky_handle_t>(handle);  // NOLINT(performance-no-int-to-ptr): what Java's long is for
+}
+
+/// Java's value of an engine handle or feature.
+inline jlong to_java(void* handle) { return reinterpret_cast<jlong>(handle); }
+
+/// Puts the engine's result code, whatever it is, into the first element of a status array. Returns false
+/// when the virtual machine refuses the array.
+inline bool write_status(JNIEnv* env, jintArray status, int result) {
+  PinnedArray pinned(env, status);
+  if (!pinned) {
+    return false;
+  }
+  pinned[0] = result;
+  return true;
+}
+
+}  // namespace kyface
