@@ -1,0 +1,80 @@
+/// What the tests of the native methods share: a virtual machine that has loaded the library, a fresh engine,
+/// and an empty journal.
+#pragma once
+
+#include <gmock/gmock.h>
+#include <gtest/gtest.h>
+
+#include <algorithm>
+#include <string>
+#include <vector>
+
+#include "face_library.h"
+#include "fake_engine.h"
+#include "fake_platform.h"
+#include "fake_vm.h"
+#include "journal.h"
+
+/// Calls a native method in the fixture's virtual machine.
+#define CALL(method, ...) \
+  Java_com_vantrel_faceapi_FaceLibrary_##method(vm.env(), nullptr __VA_OPT__(, ) __VA_ARGS__)
+
+constexpr char kFaceInfoClass[] = "com/vantrel/faceapi/model/FaceInfo";
+constexpr char kRectClass[] = "android/graphics/Rect";
+constexpr char kPointFClass[] = "android/graphics/PointF";
+
+class BridgeTest : public testing::Test {
+ protected:
+  BridgeTest() {
+    fake::engine() = {};
+    fake::engine().vm = &vm;
+    fake::bitmap() = {};
+    EXPECT_EQ(JNI_OnLoad(vm.java_vm(), nullptr), JNI_VERSION_1_6);
+    CALL(setDebug, JNI_TRUE);
+    begin();
+  }
+
+  /// Whatever a test does, what was borrowed is given back, except for what it expects to stay.
+  ~BridgeTest() override {
+    EXPECT_EQ(vm.pinned(), stays_pinned);
+    EXPECT_EQ(fake::bitmap().locks, 0);
+    EXPECT_EQ(vm.globals(), 3);
+  }
+
+  /// Starts the next call with an empty journal.
+  void begin() {
+    fake::journal().clear();
+    vm.begin_call();
+  }
+
+  using Lines = std::vector<std::string>;
+
+  /// Compares the whole journal since `begin`, then empties it.
+  void expect_journal(const Lines& lines) {
+    EXPECT_EQ(fake::journal(), lines);
+    begin();
+  }
+
+  /// Arrays and strings that are pinned at the end of the test, sorted by name.
+  Lines stays_pinned;
+
+  fake::Vm vm;
+  fake::Engine& engine = fake::engine();
+};
+
+/// A record with every field distinct; its points are (seed + i, -i).
+inline ky_face_t make_face(int seed, int points_count) {
+  ky_face_t face = {};
+  face.rect = {seed + 1, seed + 2, seed + 3, seed + 4};
+  face.score = static_cast<float>(seed) + 0.5F;
+  face.points_count = points_count;
+  face.yaw = static_cast<float>(seed) + 0.25F;
+  face.pitch = static_cast<float>(seed) - 0.25F;
+  face.roll = static_cast<float>(seed) - 0.5F;
+  face.eye_dist = static_cast<float>(seed) + 0.75F;
+  face.id = seed + 9;
+  for (int i = 0; i < KY_FACE_MAX_POINTS; ++i) {
+    face.points_array[i] = {static_cast<float>(seed + i), static_cast<float>(-i)};
+  }
+  return face;
+}
