@@ -17,6 +17,7 @@ packages_host=(
   googletest                   # sources; the tests are built from them for both presets
   openjdk-17-jdk-headless      # javac, JNI headers and the virtual machine
   junit4                       # the tests in the virtual machine
+  libjetbrains-annotations-java # nullability annotations, for the compiler only
 )
 packages_aarch64=(
   "${packages_host[@]}"

@@ -1,5 +1,6 @@
 package android.graphics;
 
+import java.nio.Buffer;
 import java.nio.ByteBuffer;
 import java.nio.ByteOrder;
 
@@ -104,6 +105,22 @@ public final class Bitmap {
         }
         return (pixels.get(at + 3) & 0xFF) << 24 | (pixels.get(at) & 0xFF) << 16 | (pixels.get(at + 1) & 0xFF) << 8
                 | (pixels.get(at + 2) & 0xFF);
+    }
+
+    /** Copies all rows, as they lie in memory, to the buffer's position and moves that behind them. */
+    public void copyPixelsToBuffer(Buffer dst) {
+        if (pixels == null) {
+            throw new IllegalStateException("the bitmap is recycled");
+        }
+        if (!(dst instanceof ByteBuffer)) {
+            throw new RuntimeException("the stand-in copies to byte buffers only");
+        }
+        if (dst.remaining() < pixels.capacity()) {
+            throw new RuntimeException("the buffer is not large enough for the pixels");
+        }
+        ByteBuffer all = pixels.duplicate();
+        all.clear();
+        ((ByteBuffer) dst).put(all);
     }
 
     /** Gives the pixels up; the bitmap cannot be used afterwards. */

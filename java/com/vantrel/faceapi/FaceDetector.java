@@ -1,0 +1,142 @@
+package com.vantrel.faceapi;
+
+import com.vantrel.faceapi.model.FaceInfo;
+import java.util.List;
+import org.jetbrains.annotations.NotNull;
+import org.jetbrains.annotations.Nullable;
+
+/**
+ * Finds faces in single images.
+ *
+ * <pre>{@code
+ * try (FaceDetector detector = new FaceDetector()) {
+ *     for (FaceInfo face : detector.detect(frame)) {
+ *         System.out.println(face.faceRect + " " + face.score);
+ *     }
+ * }
+ * }</pre>
+ *
+ * <p>One object may be used from several threads: its calls wait for one another, and closing waits for the call in
+ * progress. Every call on a closed object throws {@link IllegalStateException}. An object that is forgotten without
+ * being closed is reclaimed some time after the garbage collector noticed.
+ */
+public final class FaceDetector extends FaceFinder {
+    /**
+     * Creates a detector with the engine's built-in model.
+     *
+     * @throws FaceEngineException when the engine cannot create it
+     */
+    public FaceDetector() {
+        this(null, 0);
+    }
+
+    /**
+     * Creates a detector.
+     *
+     * @param modelPath the model file; null for the engine's built-in model
+     * @param config engine flags, 0 for the engine's defaults
+     * @throws FaceEngineException when the engine cannot create it
+     */
+    public FaceDetector(@Nullable String modelPath, int config) {
+        super("face detector", "face detection", FaceLibrary.kyFaceCreateDetector(modelPath, config),
+                FaceLibrary::kyFaceDestroyDetector);
+    }
+
+    /**
+     * Finds the faces of a camera frame.
+     *
+     * @param frame the frame; its rotation says how it is turned
+     * @return the faces, in the frame's own coordinates; empty when there is none; not modifiable
+     * @throws FaceEngineException when the engine fails
+     * @throws IllegalStateException when this detector is closed or the frame was never filled
+     */
+    public @NotNull List<FaceInfo> detect(@NotNull CameraFrame frame) {
+        return find(frame);
+    }
+
+    /**
+     * Finds the faces of an image.
+     *
+     * @param image the pixels
+     * @param format their layout
+     * @param width image width in pixels
+     * @param height image height in pixels
+     * @param stride bytes from one row to the next
+     * @param rotationDegrees by how much the image must be turned clockwise to be upright: 0, 90, 180 or 270
+     * @return the faces, in the image's own coordinates; empty when there is none; not modifiable
+     * @throws IllegalArgumentException when a size, the stride, the rotation or the array's length does not fit
+     * @throws FaceEngineException when the engine fails
+     * @throws IllegalStateException when this detector is closed
+     */
+    public @NotNull List<FaceInfo> detect(
+            byte @NotNull [] image, @NotNull PixelFormat format, int width, int height, int stride,
+            int rotationDegrees) {
+        return find(image, format, width, height, stride, rotationDegrees);
+    }
+
+    /**
+     * Finds the faces of an image whose bytes are held in ints, such as {@code Bitmap.getPixels} gives: on a
+     * little-endian machine those are {@link PixelFormat#BGRA}.
+     *
+     * @param image the pixels
+     * @param format their layout as bytes
+     * @param width image width in pixels
+     * @param height image height in pixels
+     * @param stride bytes from one row to the next
+     * @param rotationDegrees by how much the image must be turned clockwise to be upright: 0, 90, 180 or 270
+     * @return the faces, in the image's own coordinates; empty when there is none; not modifiable
+     * @throws IllegalArgumentException when a size, the stride, the rotation or the array's length does not fit
+     * @throws FaceEngineException when the engine fails
+     * @throws IllegalStateException when this detector is closed
+     */
+    public @NotNull List<FaceInfo> detect(
+            int @NotNull [] image, @NotNull PixelFormat format, int width, int height, int stride,
+            int rotationDegrees) {
+        return find(image, format, width, height, stride, rotationDegrees);
+    }
+
+    /**
+     * Returns the detection threshold.
+     *
+     * @return the score that a face must reach
+     * @throws FaceEngineException when the engine fails
+     * @throws IllegalStateException when this detector is closed
+     */
+    public float threshold() {
+        synchronized (handle) {
+            float threshold = FaceLibrary.getDetectThreshold(handle.value(), status);
+            checkStatus("reading the threshold");
+            return threshold;
+        }
+    }
+
+    /**
+     * Sets the detection threshold.
+     *
+     * @param threshold the score that a face must reach, above 0
+     * @throws IllegalArgumentException when the threshold is 0, negative or not a number
+     * @throws FaceEngineException when the engine refuses it
+     * @throws IllegalStateException when this detector is closed
+     */
+    public void setThreshold(float threshold) {
+        if (!(threshold > 0)) {
+            throw new IllegalArgumentException("threshold must be above 0, not " + threshold);
+        }
+        synchronized (handle) {
+            FaceLibrary.setDetectThreshold(handle.value(), threshold, status);
+            checkStatus("setting the threshold");
+        }
+    }
+
+    @Override
+    FaceInfo[] findInBytes(long engineHandle, byte[] image, int format, int width, int height, int stride,
+            int orientation) {
+        return FaceLibrary.kyFaceDetectBytes(engineHandle, image, format, width, height, stride, orientation, status);
+    }
+
+    @Override
+    FaceInfo[] findInInts(long engineHandle, int[] image, int format, int width, int height, int stride,
+            int orientation) {
+        return FaceLibrary.kyFaceDetectInts(engineHandle, image, format, width, height, stride, orientation, status);
+    }
+}

@@ -1,0 +1,27 @@
+package com.vantrel.faceapi;
+
+import org.jetbrains.annotations.NotNull;
+
+/** The face engine refused a call or failed. */
+public final class FaceEngineException extends RuntimeException {
+    /** The code of a failure for which the engine's own code is not known, such as that of creating an object. */
+    public static final int UNKNOWN_CODE = Integer.MIN_VALUE;
+
+    private static final long serialVersionUID = 1;
+
+    private final int code;
+
+    FaceEngineException(@NotNull String call, int code) {
+        super(code == UNKNOWN_CODE ? call + " failed" : call + " failed with code " + code);
+        this.code = code;
+    }
+
+    /**
+     * Returns the engine's result code.
+     *
+     * @return the code, never 0; {@link #UNKNOWN_CODE} when it is not known
+     */
+    public int code() {
+        return code;
+    }
+}
