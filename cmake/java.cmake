@@ -5,7 +5,8 @@
 find_package(Java 11 REQUIRED COMPONENTS Development Runtime)
 
 # ${KYFACE_JAVA} runs Java for the architecture of this build, with this build's libraries. A cross build runs the
-# virtual machine of the unpacked arm64 packages under emulation, where the simple compiler and collector pay.
+# virtual machine of the unpacked arm64 packages under emulation, where the simple compiler and collector pay, and
+# where a program is started without the JDK's helper program, which this machine could not execute.
 set(KYFACE_JAVA ${CMAKE_BINARY_DIR}/bin/java)
 if(CMAKE_CROSSCOMPILING)
   set(arm64_root ${PROJECT_SOURCE_DIR}/.deps/arm64)
@@ -14,7 +15,7 @@ if(CMAKE_CROSSCOMPILING)
     message(FATAL_ERROR "There is no Java for arm64 in .deps. Run scripts/setup.sh, which unpacks it.")
   endif()
   set(java_command "qemu-aarch64 -cpu cortex-a76 -L '${arm64_root}' '${java_program}' -XX:+UseSerialGC \
--XX:TieredStopAtLevel=1")
+-XX:TieredStopAtLevel=1 -Djdk.lang.Process.launchMechanism=VFORK")
 else()
   set(java_command "'${Java_JAVA_EXECUTABLE}'")
 endif()
