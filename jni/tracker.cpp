@@ -1,0 +1,109 @@
+// Native methods of FaceLibrary over the engine's video tracker.
+#include <jni.h>
+
+#include "bridge_log.h"
+#include "engine_values.h"
+#include "face_analysis.h"
+#include "kyface_api.h"
+#include "pinned.h"
+
+namespace {
+
+struct Tracker {
+  static constexpr auto kAnalyse = ky_face_track;
+  static constexpr auto kRelease = ky_face_release_tracker_result;
+  static constexpr char kHandleIsNull[] = "kyFaceTrack handle is null";
+  static constexpr char kImageIsNull[] = "track input image is null";
+};
+
+jobjectArray kyFaceTrack(JNIEnv* env, long long handle, const unsigned char* image, int pixelFormat,
+                         int width, int height, int stride, int orientation, jintArray status) {
+  return kyface::analyse_faces<Tracker>(env, handle, image, pixelFormat, width, height, stride, orientation,
+                                        status);
+}
+
+/// Calls one of the engine's setters. What it reports through its third argument is of no use to Java.
+template <typename Setter>
+jint set_tracker_value(Setter* setter, jlong handle, jint value) {
+  int previous = 0;
+  return setter(kyface::to_handle(handle), value, &previous);
+}
+
+}  // namespace
+
+extern "C" {
+
+JNIEXPORT jlong JNICALL Java_com_vantrel_faceapi_FaceLibrary_kyFaceCreateTracker(
+    JNIEnv* env, jobject /*thiz*/, jstring modelPath, jint /*reserved*/, jint config) {
+  kyface::StringChars path(env, modelPath);
+  if (path.refused()) {
+    return 0;
+  }
+  FACE_LOG(ANDROID_LOG_DEBUG, "ky_face_create_tracker config : %d", config);
+  ky_handle_t handle = nullptr;
+  int result = ky_face_create_tracker(&handle, path.get(), config);
+  if (result != 0) {
+    // The path's characters are deliberately not released on this path.
+    FACE_LOG(ANDROID_LOG_ERROR, "kyFaceCreateTracker create handle fail result code : %d", result);
+    return 0;
+  }
+  // Deliberately once more: the second tracker takes the place of the first, which is never destroyed.
+  result = ky_face_create_tracker(&handle, path.get(), config);
+  path.release();
+  return result == 0 ? kyface::to_java(handle) : 0;
+}
+
+JNIEXPORT void JNICALL Java_com_vantrel_faceapi_FaceLibrary_kyFaceDestroyTracker(JNIEnv* /*env*/,
+                                                                                 jobject /*thiz*/,
+                                                                                 jlong handle) {
+  if (handle == 0) {
+    FACE_LOG(ANDROID_LOG_ERROR, "kyFaceDestroyTracker destroy handle is null");
+    return;
+  }
+  ky_face_destroy_tracker(kyface::to_handle(handle));
+  FACE_LOG(ANDROID_LOG_VERBOSE, "ky_face_destroy_tracker");
+}
+
+JNIEXPORT jobjectArray JNICALL Java_com_vantrel_faceapi_FaceLibrary_kyFaceTrackBytes(
+    JNIEnv* env, jobject /*thiz*/, jlong handle, jbyteArray image, jint pixelFormat, jint width, jint height,
+    jint stride, jint orientation, jintArray status) {
+  return kyface::analyse_array<Tracker>(kyFaceTrack, env, handle, image, pixelFormat, width, height, stride,
+                                        orientation, status);
+}
+
+JNIEXPORT jobjectArray JNICALL Java_com_vantrel_faceapi_FaceLibrary_kyFaceTrackInts(
+    JNIEnv* env, jobject /*thiz*/, jlong handle, jintArray image, jint pixelFormat, jint width, jint height,
+    jint stride, jint orientation, jintArray status) {
+  return kyface::analyse_array<Tracker>(kyFaceTrack, env, handle, image, pixelFormat, width, height, stride,
+                                        orientation, status);
+}
+
+JNIEXPORT void JNICALL Java_com_vantrel_faceapi_FaceLibrary_kyFaceResetTracker(JNIEnv* /*env*/,
+                                                                               jobject /*thiz*/,
+                                                                               jlong handle) {
+  ky_face_reset_tracker(kyface::to_handle(handle));
+  FACE_LOG(ANDROID_LOG_VERBOSE, "ky_face_reset_tracker");
+}
+
+JNIEXPORT jint JNICALL Java_com_vantrel_faceapi_FaceLibrary_kyFaceTrackSetDetectFaceCntLimit(JNIEnv* /*env*/,
+                                                                                             jobject /*thiz*/,
+                                                                                             jlong handle,
+                                                                                             jint limit) {
+  return set_tracker_value(ky_face_track_set_detect_face_cnt_limit, handle, limit);
+}
+
+JNIEXPORT jint JNICALL Java_com_vantrel_faceapi_FaceLibrary_kyFaceTrackSetDetectInterval(JNIEnv* /*env*/,
+                                                                                         jobject /*thiz*/,
+                                                                                         jlong handle,
+                                                                                         jint interval) {
+  return set_tracker_value(ky_face_track_set_detect_interval, handle, interval);
+}
+
+JNIEXPORT jint JNICALL Java_com_vantrel_faceapi_FaceLibrary_kyFaceTrackSetAlignmentThreshold(JNIEnv* /*env*/,
+                                                                                             jobject /*thiz*/,
+                                                                                             jlong handle,
+                                                                                             jint threshold) {
+  return set_tracker_value(ky_face_track_set_alignment_threshold, handle, threshold);
+}
+
+}  // extern "C"

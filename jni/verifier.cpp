@@ -1,0 +1,176 @@
+// Native methods of FaceLibrary over the engine's verifier.
+#include <jni.h>
+
+#include <cstdint>
+
+#include "bridge_log.h"
+#include "engine_values.h"
+#include "java_model.h"
+#include "kyface_api.h"
+#include "pinned.h"
+
+namespace {
+
+/// Bytes of the text of a feature of `length` bytes: base64 and a terminating zero, in unsigned 32-bit
+/// arithmetic whatever the engine says the length is.
+jsize serialized_size(int length) {
+  return static_cast<jsize>((static_cast<std::uint32_t>(length) + 2) / 3 * 4 + 1);
+}
+
+/// Extracts the feature of a face and returns its text. The engine's 0 goes into `status[0]`; every failure
+/// returns null, and one before or inside the engine leaves `status` untouched.
+jbyteArray kyFaceVerify(JNIEnv* env, jobject /*thiz*/, long long handle, const unsigned char* image,
+                        int pixelFormat, int width, int height, int stride, jobject face, jintArray status) {
+  if (status == nullptr || face == nullptr || image == nullptr) {
+    FACE_LOG(ANDROID_LOG_ERROR, "kyFaceVerify image or status or kyface is null");
+    return nullptr;
+  }
+  if (handle == 0) {
+    FACE_LOG(ANDROID_LOG_ERROR, "kyFaceVerify ky_verify_get_feature handle is NULL!!");
+    return nullptr;
+  }
+  const ky_face_t record = java_face_to_ky_face_t(env, face);
+  ky_feature_t feature = nullptr;
+  int length = 0;
+  const int result = ky_verify_get_feature(kyface::to_handle(handle), image, pixelFormat, width, height,
+                                           stride, &record, &feature, &length);
+  if (result != 0) {
+    FACE_LOG(ANDROID_LOG_ERROR, "kyFaceVerify get feature fail result : %d", result);
+    return nullptr;
+  }
+  if (feature == nullptr) {
+    FACE_LOG(ANDROID_LOG_ERROR, "kyFaceVerify ky_verify_get_feature is null");
+    return nullptr;
+  }
+  kyface::PinnedArray pinned_status(env, status);
+  if (!pinned_status) {
+    ky_verify_release_feature(feature);
+    return nullptr;
+  }
+  pinned_status[0] = result;
+  jbyteArray text = env->NewByteArray(serialized_size(length));
+  if (text == nullptr) {
+    // The feature is deliberately not released on this path.
+    FACE_LOG(ANDROID_LOG_ERROR, "kyFaceVerify new Feature Failed !! maybe out of memory!!");
+    return nullptr;
+  }
+  kyface::PinnedArray pinned_text(env, text);
+  if (!pinned_text) {
+    ky_verify_release_feature(feature);
+    return nullptr;
+  }
+  ky_verify_serialize_feature(feature, pinned_text.chars());
+  ky_verify_release_feature(feature);
+  pinned_status.release();
+  pinned_text.release();
+  return text;
+}
+
+/// Extracts a feature from an image that is held in a Java array, of bytes or of 32-bit pixels alike.
+template <typename Array>
+jbyteArray get_feature(JNIEnv* env, jobject thiz, jlong handle, Array image, jint pixelFormat, jint width,
+                       jint height, jint stride, jobject face, jintArray status) {
+  if (image == nullptr) {  // refused below, like a null face: a virtual machine need not survive pinning it
+    return kyFaceVerify(env, thiz, handle, nullptr, pixelFormat, width, height, stride, face, status);
+  }
+  const kyface::PinnedArray pinned_image(env, image);
+  return kyFaceVerify(env, thiz, handle, pinned_image.bytes(), pixelFormat, width, height, stride, face,
+                      status);
+}
+
+}  // namespace
+
+extern "C" {
+
+JNIEXPORT jlong JNICALL Java_com_vantrel_faceapi_FaceLibrary_kyFaceCreateVerify(JNIEnv* env, jobject /*thiz*/,
+                                                                                jstring modelPath) {
+  kyface::StringChars path(env, modelPath);
+  if (path.refused()) {
+    return 0;
+  }
+  if (path.get() != nullptr) {
+    FACE_LOG(ANDROID_LOG_DEBUG, "FaceCreateVerify verify model_path: %s", path.get());
+  }
+  ky_handle_t handle = nullptr;
+  const int result = ky_verify_create_handle(&handle, path.get());
+  if (result != 0) {
+    // The path's characters are deliberately not released on this path.
+    FACE_LOG(ANDROID_LOG_ERROR, "FaceCreateVerify create handle fail : %d", result);
+    return 0;
+  }
+  path.release();
+  return kyface::to_java(handle);
+}
+
+JNIEXPORT jint JNICALL Java_com_vantrel_faceapi_FaceLibrary_kyFaceGetVerifyVersion(JNIEnv* /*env*/,
+                                                                                   jobject /*thiz*/,
+                                                                                   jlong handle) {
+  return ky_verify_get_version(kyface::to_handle(handle));
+}
+
+JNIEXPORT jint JNICALL Java_com_vantrel_faceapi_FaceLibrary_kyFaceGetVerifyLength(JNIEnv* /*env*/,
+                                                                                  jobject /*thiz*/,
+                                                                                  jlong handle) {
+  return ky_verify_get_feature_length(kyface::to_handle(handle));
+}
+
+JNIEXPORT jbyteArray JNICALL Java_com_vantrel_faceapi_FaceLibrary_kyFaceGetFeatureBytes(
+    JNIEnv* env, jobject thiz, jlong handle, jbyteArray image, jint pixelFormat, jint width, jint height,
+    jint stride, jobject face, jintArray status) {
+  return get_feature(env, thiz, handle, image, pixelFormat, width, height, stride, face, status);
+}
+
+JNIEXPORT jbyteArray JNICALL Java_com_vantrel_faceapi_FaceLibrary_kyFaceGetFeatureInts(
+    JNIEnv* env, jobject thiz, jlong handle, jintArray image, jint pixelFormat, jint width, jint height,
+    jint stride, jobject face, jintArray status) {
+  return get_feature(env, thiz, handle, image, pixelFormat, width, height, stride, face, status);
+}
+
+JNIEXPORT jfloat JNICALL Java_com_vantrel_faceapi_FaceLibrary_kyFaceCompareFeature(
+    JNIEnv* env, jobject /*thiz*/, jlong handle, jbyteArray feature1, jbyteArray feature2, jintArray status) {
+  if (feature1 == nullptr || feature2 == nullptr) {
+    FACE_LOG(ANDROID_LOG_ERROR, "ky_faceapi_KyFaceLibrary_kyFacCompareFeature feature is null");
+    return 0.0F;
+  }
+  kyface::PinnedArray text1(env, feature1);
+  kyface::PinnedArray text2(env, feature2);
+  if (!text1 || !text2) {
+    // Where one of the two is pinned it deliberately stays so.
+    text1.leave_pinned();
+    text2.leave_pinned();
+    FACE_LOG(ANDROID_LOG_ERROR, "ky_faceapi_KyFaceLibrary_kyFacCompareFeature feature is null");
+    return 0.0F;
+  }
+  ky_feature_t engine_feature1 = ky_verify_deserialize_feature(text1.chars());
+  ky_feature_t engine_feature2 = ky_verify_deserialize_feature(text2.chars());
+  float score;  // deliberately the engine's alone: after a failure it means nothing, and the status says so
+  const int result =
+      ky_verify_compare_feature(kyface::to_handle(handle), engine_feature1, engine_feature2, &score);
+  text1.release();
+  text2.release();
+  ky_verify_release_feature(engine_feature1);
+  ky_verify_release_feature(engine_feature2);
+  return kyface::write_status(env, status, result) ? score : 0.0F;
+}
+
+JNIEXPORT jlong JNICALL Java_com_vantrel_faceapi_FaceLibrary_kyFaceDeserialize(JNIEnv* env, jobject /*thiz*/,
+                                                                               jbyteArray feature) {
+  const kyface::PinnedArray text(env, feature);
+  if (!text) {
+    return 0;
+  }
+  return kyface::to_java(ky_verify_deserialize_feature(text.chars()));
+}
+
+JNIEXPORT void JNICALL Java_com_vantrel_faceapi_FaceLibrary_kyFaceDestroyVerify(JNIEnv* /*env*/,
+                                                                                jobject /*thiz*/,
+                                                                                jlong handle) {
+  if (handle == 0) {
+    FACE_LOG(ANDROID_LOG_ERROR, "kyFaceVerify DestroyVerify handle is NULL!!");
+    return;
+  }
+  ky_verify_destroy_handle(kyface::to_handle(handle));
+  FACE_LOG(ANDROID_LOG_DEBUG, "ky_verify_destroy_handle");
+}
+
+}  // extern "C"
