@@ -3,10 +3,10 @@
 #
 #   scripts/setup.sh [group...]
 #
-# Groups are `host` and `aarch64`, named after the build presets that need them; both without an argument. Packages
-# that are there already are left alone, and nothing is asked when all are. Packages of this machine are installed
-# with apt-get (through sudo when not root). Packages of 64-bit Arm are unpacked into .deps/arm64: installing them
-# would pull this system's own packages along.
+# Groups are `host` and `aarch64`, named after the build presets that need them, both without an argument; and `bench`,
+# which adds what scripts/bench needs. Packages that are there already are left alone, and nothing is asked when all
+# are. Packages of this machine are installed with apt-get (through sudo when not root). Packages of 64-bit Arm are
+# unpacked into .deps/arm64: installing them would pull this system's own packages along.
 # shellcheck source=scripts/common.sh
 source "$(dirname "${BASH_SOURCE[0]}")/common.sh"
 
@@ -24,6 +24,12 @@ packages_aarch64=(
   clang-19 lld-19 llvm-19      # the compiler family of Android's NDK
   g++-aarch64-linux-gnu        # the C and C++ libraries that it compiles and links against
   qemu-user                    # runs the result
+  python3                      # scripts/bench, which checks the instruction counts
+)
+packages_bench=(
+  "${packages_aarch64[@]}"
+  libbenchmark-dev                  # times on this machine
+  libyuv-dev libopencv-imgproc-dev  # the peers
 )
 
 # Unpacked for 64-bit Arm: a root folder that qemu-aarch64 takes with -L.
@@ -32,6 +38,14 @@ arm64_aarch64=(
   openjdk-17-jre-headless                     # the virtual machine,
   libc6 libgcc-s1 libstdc++6 zlib1g           # what it is linked with,
   liblcms2-2 libjpeg62-turbo                  # and what it reads pictures with
+)
+arm64_bench=(
+  "${arm64_aarch64[@]}"
+  libyuv-dev libyuv0                                                # the peers,
+  libopencv-core-dev libopencv-imgproc-dev
+  libopencv-core406 libopencv-imgproc406 libtbb12                   # and what they are linked with
+  libblas3 liblapack3 libgfortran5
+  libglx0 libglvnd0 libx11-6 libxcb1 libxau6 libxdmcp6 libbsd0 libmd0
 )
 
 deps=$root/.deps
@@ -125,7 +139,8 @@ for group in "$@"; do
   case $group in
     host) packages+=("${packages_host[@]}") ;;
     aarch64) packages+=("${packages_aarch64[@]}") arm64+=("${arm64_aarch64[@]}") ;;
-    *) fail "there is no group \"$group\"; the groups are host and aarch64" ;;
+    bench) packages+=("${packages_bench[@]}") arm64+=("${arm64_bench[@]}") ;;
+    *) fail "there is no group \"$group\"; the groups are host, aarch64 and bench" ;;
   esac
 done
 readarray -t packages < <(printf '%s\n' "${packages[@]}" | awk '!seen[$0]++')

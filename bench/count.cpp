@@ -1,0 +1,56 @@
+// The program that is run under the counting plugin:
+//
+//   bench_count own|all REPEATS PATTERN SIZE...
+//
+// Every operation that matches is called once to warm up, and then, between markers, REPEATS times and three
+// times as often. What is prepared once or decided at the first call cancels out of the difference. Prints a
+// line for each, in the order of their laps: name, library, size, traffic, and the pixels of the calls in the
+// difference.
+
+#include <cstdio>
+#include <cstdlib>
+#include <cstring>
+#include <string>
+
+#include "operation.h"
+
+namespace {
+
+void mark() {
+#if defined(__aarch64__)
+  asm volatile("hint #112" : : : "memory");
+#endif
+}
+
+void repeat(const std::function<void()>& call, int times) {
+  for (int i = 0; i < times; ++i) {
+    call();
+  }
+}
+
+}  // namespace
+
+int main(int argc, char** argv) {
+  if (argc < 5) {
+    std::fprintf(stderr, "usage: %s own|all REPEATS PATTERN SIZE...\n", argv[0]);
+    return 2;
+  }
+  const bool own = std::strcmp(argv[1], "own") == 0;
+  const int repeats = std::atoi(argv[2]);
+  const std::vector<bench::Operation> operations = bench::operationsMatching(argv[3], own);
+  for (int i = 4; i < argc; ++i) {
+    const bench::Size size = bench::sizeOf(argv[i]);
+    for (const bench::Operation& operation : operations) {
+      const std::function<void()> call = operation.prepare(size);
+      call();
+      mark();
+      repeat(call, repeats);
+      mark();
+      repeat(call, 3 * repeats);
+      mark();
+      std::printf("%s\t%s\t%s\t%g\t%zu\n", operation.name.c_str(), operation.library.c_str(), argv[i],
+                  operation.traffic, 2 * static_cast<size_t>(repeats) * size.pixels());
+    }
+  }
+  return 0;
+}

@@ -1,0 +1,57 @@
+#include "operation.h"
+
+#include <algorithm>
+#include <cstdio>
+#include <cstring>
+#include <regex>
+#include <set>
+
+namespace bench {
+
+void addFloor(std::vector<Operation>& operations) {
+  std::set<double> traffics;
+  for (const Operation& operation : operations) {
+    traffics.insert(operation.traffic);
+  }
+  for (const double traffic : traffics) {
+    operations.push_back(
+        {"floor" + std::to_string(traffic), "memcpy", traffic, [traffic](Size size) {
+           const size_t bytes = static_cast<size_t>(static_cast<double>(size.pixels()) * traffic / 2);
+           return [bytes, in = samples<unsigned char>(bytes), out = samples<unsigned char>(bytes)] {
+             std::memcpy(out.get(), in.get(), bytes);
+             // The copy is not to be found useless.
+             asm volatile("" : : "r"(out.get()) : "memory");
+           };
+         }});
+  }
+}
+
+std::vector<Operation> operationsMatching(const std::string& pattern, [[maybe_unused]] bool own) {
+  std::vector<Operation> operations;
+  addFastcv(operations);
+#ifdef BENCH_PEERS
+  if (!own) {
+    addLibyuv(operations);
+    addOpencv(operations);
+  }
+#endif
+  const std::regex regex(pattern, std::regex::icase);
+  std::erase_if(operations,
+                [&](const Operation& operation) { return !std::regex_search(operation.name, regex); });
+  if (!own) {
+    addFloor(operations);
+  }
+  return operations;
+}
+
+Size sizeOf(const std::string& text) {
+  Size size{};
+  if (std::sscanf(text.c_str(), "%dx%d", &size.width, &size.height) != 2 || size.width < 1 ||
+      size.height < 1) {
+    std::fprintf(stderr, "a size is written as 1280x720, not as \"%s\"\n", text.c_str());
+    std::exit(2);
+  }
+  return size;
+}
+
+}  // namespace bench

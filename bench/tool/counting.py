@@ -1,0 +1,99 @@
+"""Instructions of the arm64 build, exact: bench_count under the emulator's counting plugin."""
+
+import collections
+import dataclasses
+import subprocess
+import sys
+import tempfile
+from pathlib import Path
+
+# Where the peers' own libraries are that Debian keeps in folders of their own.
+EXTRA_LIBRARY_PATH = "/usr/lib/aarch64-linux-gnu/blas:/usr/lib/aarch64-linux-gnu/lapack"
+
+
+@dataclasses.dataclass(frozen=True)
+class Key:
+    """What was measured."""
+
+    operation: str
+    library: str
+    size: str
+
+
+@dataclasses.dataclass
+class Count:
+    """What an operation needs: the difference of a long and a short run."""
+
+    traffic: float  # bytes per pixel
+    pixels: int
+    instructions: int
+    blocks: dict  # executions by block id
+
+    @property
+    def per_pixel(self):
+        return self.instructions / self.pixels
+
+
+@dataclasses.dataclass
+class Time:
+    """How long a call takes on this machine."""
+
+    traffic: float  # bytes per pixel
+    milliseconds: float
+
+
+@dataclasses.dataclass(frozen=True)
+class Block:
+    """A stretch of code that the emulator ran as a whole."""
+
+    address: int
+    words: tuple  # the instructions, as the plugin wrote them
+
+
+@dataclasses.dataclass
+class Counts:
+    counts: dict  # Count by Key
+    blocks: dict  # Block by id
+
+
+def count(build, root, own, pattern, sizes, repeats=1):
+    """Runs bench_count of the folder `build` and returns the Counts of the operations matching `pattern`."""
+    with tempfile.NamedTemporaryFile(suffix=".laps") as laps_file:
+        command = ["qemu-aarch64", "-cpu", "cortex-a76", "-L", str(root)]
+        command += ["-E", f"LD_LIBRARY_PATH={EXTRA_LIBRARY_PATH}"]
+        command += ["-plugin", f"{build}/lib/libcount.so,out={laps_file.name}"]
+        command += [f"{build}/bin/bench_count", "own" if own else "all", str(repeats), pattern, *sizes]
+        run = subprocess.run(command, stdout=subprocess.PIPE, text=True, check=False)
+        if run.returncode != 0:
+            sys.exit(f"bench: bench_count failed with status {run.returncode}")
+        laps, blocks = _read_laps(Path(laps_file.name))
+
+    counts = {}
+    for index, line in enumerate(run.stdout.splitlines()):
+        operation, library, size, traffic, pixels = line.split("\t")
+        # Three laps each: what went before, the short run, the long one.
+        short, long = laps[3 * index + 1], laps[3 * index + 2]
+        executions = collections.Counter(long[1])
+        executions.subtract(short[1])
+        counts[Key(operation, library, size)] = Count(
+            traffic=float(traffic),
+            pixels=int(pixels),
+            instructions=long[0] - short[0],
+            blocks={block: number for block, number in executions.items() if number > 0},
+        )
+    return Counts(counts, blocks)
+
+
+def _read_laps(path):
+    laps = []
+    blocks = {}
+    with path.open() as lines:
+        for line in lines:
+            kind, *rest = line.split()
+            if kind == "lap":
+                laps.append((int(rest[0]), {}))
+            elif kind == "block":
+                laps[-1][1][int(rest[0])] = int(rest[1])
+            else:
+                blocks[int(rest[0])] = Block(int(rest[1], 16), tuple(rest[2:]))
+    return laps, blocks
