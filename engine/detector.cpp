@@ -1,0 +1,107 @@
+/// Detectors: the C interface over `FaceFinder`.
+#include <dlib/revision.h>
+
+#include <cstdio>
+#include <memory>
+#include <mutex>
+#include <vector>
+
+#include "face_finder.h"
+#include "guard.h"
+#include "handles.h"
+
+namespace kyengine {
+namespace {
+
+class Detector {
+ public:
+  Detector(const char* model_path, int config) : finder_(model_path, config) {}
+
+  float threshold() const {
+    const std::lock_guard lock(mutex_);
+    return threshold_;
+  }
+
+  void set_threshold(float threshold) {
+    // Refuses NaN, too.
+    Require(threshold >= KY_MIN_THRESHOLD && threshold <= KY_MAX_THRESHOLD, KY_ERROR_RANGE);
+    const std::lock_guard lock(mutex_);
+    threshold_ = threshold;
+  }
+
+  std::vector<ky_face_t> Detect(const Frame& frame) {
+    const std::lock_guard lock(mutex_);
+    frame.ToUprightGray(gray_);
+    std::vector<ky_face_t> records;
+    for (const FoundFace& face : finder_.Find(gray_, threshold_)) {
+      records.push_back(finder_.Record(gray_, face, frame));
+    }
+    return records;
+  }
+
+ private:
+  mutable std::mutex mutex_;
+  FaceFinder finder_;
+  float threshold_ = KY_DEFAULT_THRESHOLD;
+  GrayImage gray_;
+};
+
+using Detectors = HandleTable<Detector>;
+
+}  // namespace
+}  // namespace kyengine
+
+using kyengine::Detector;
+using kyengine::Detectors;
+using kyengine::Frame;
+using kyengine::Guarded;
+using kyengine::Require;
+
+int ky_face_create_detector(ky_handle_t* handle, const char* model_path, int config) {
+  return Guarded([&] {
+    Require(handle != nullptr, KY_ERROR_NULL_POINTER);
+    *handle = nullptr;
+    *handle = Detectors::Get().Add(std::make_shared<Detector>(model_path, config));
+  });
+}
+
+void ky_face_destroy_detector(ky_handle_t handle) {
+  Guarded([&] { Detectors::Get().Remove(handle); });
+}
+
+int ky_face_detect_get_threshold(ky_handle_t handle, float* threshold) {
+  return Guarded([&] {
+    const auto detector = Detectors::Get().Find(handle, KY_ERROR_HANDLE);
+    Require(threshold != nullptr, KY_ERROR_NULL_POINTER);
+    *threshold = detector->threshold();
+  });
+}
+
+int ky_face_detect_set_threshold(ky_handle_t handle, float threshold) {
+  return Guarded([&] { Detectors::Get().Find(handle, KY_ERROR_HANDLE)->set_threshold(threshold); });
+}
+
+int ky_face_detect(ky_handle_t handle, const unsigned char* image, int pixel_format, int width, int height,
+                   int stride, int orientation, ky_face_t** faces, int* count) {
+  return Guarded([&] {
+    Require(faces != nullptr && count != nullptr, KY_ERROR_NULL_POINTER);
+    *faces = nullptr;
+    *count = 0;
+    const auto detector = Detectors::Get().Find(handle, KY_ERROR_HANDLE);
+    const Frame frame(image, pixel_format, width, height, stride, orientation);
+    kyengine::HandOver(detector->Detect(frame), faces, count);
+  });
+}
+
+void ky_face_release_detector_result(ky_face_t* faces, int /*count*/) { kyengine::ReleaseFaces(faces); }
+
+int ky_face_algorithm_info() {
+  return Guarded([] {
+    const int written = std::printf(
+        "kyface open engine %s, dlib %d.%d.%d\n"
+        "  detector: frontal faces by histograms of oriented gradients; built in\n"
+        "  landmarks: from a model file of the caller's\n",
+        KY_ENGINE_VERSION, DLIB_MAJOR_VERSION, DLIB_MINOR_VERSION, DLIB_PATCH_VERSION);
+    Require(written > 0 && std::fflush(stdout) == 0, KY_ERROR_INTERNAL);
+  });
+}

@@ -1,0 +1,41 @@
+/// The search for faces in an upright picture, which detector and tracker share.
+#pragma once
+
+#include <vector>
+
+#include "model.h"
+
+namespace kyengine {
+
+/// A face that was found. Where it lies may reach beyond the picture's border.
+struct FoundFace {
+  dlib::drectangle box;  ///< in the upright picture
+  float score;           ///< as `ky_engine.h` defines it
+};
+
+/// A model and the way it is applied. Not for several threads at once: the search works in buffers of its
+/// own.
+class FaceFinder {
+ public:
+  /// Throws Failure when `model_path` or `config` is not one that `ky_engine.h` lists.
+  FaceFinder(const char* model_path, int config);
+
+  /// Finds faces with a score of at least `threshold`, the best first.
+  std::vector<FoundFace> Find(const GrayImage& upright, float threshold);
+
+  /// Whether a picture of this size has room for a face at all. Finding none in one that has not costs
+  /// nothing.
+  bool HasRoom(int width, int height) const;
+
+  /// The record of a face, with its landmarks and without an identity.
+  ky_face_t Record(const GrayImage& upright, const FoundFace& face, const Frame& frame) const;
+
+ private:
+  bool Enlarges(int width, int height) const;
+
+  int config_;
+  Model model_;
+  GrayImage enlarged_;
+};
+
+}  // namespace kyengine

@@ -1,0 +1,53 @@
+/// A frame of the caller's as the C interface receives it, and its upright gray picture.
+#pragma once
+
+// clang-format off
+#include "dlib_config.h"
+// clang-format on
+
+#include <dlib/array2d.h>
+#include <dlib/geometry.h>
+
+#include "c_interface.h"
+
+namespace kyengine {
+
+using GrayImage = dlib::array2d<unsigned char>;
+
+/// A checked view of the caller's pixels. It maps coordinates of the upright picture, which the engine works
+/// in, to those of the frame, which the caller sees.
+class Frame {
+ public:
+  /// Throws Failure when an argument is out of its range; reads no pixels.
+  Frame(const unsigned char* image, int pixel_format, int width, int height, int stride, int orientation);
+
+  /// Writes the luma of the frame, turned upright, into `gray`. The 4:2:0 formats carry it; of colours it is
+  /// 0.299 R + 0.587 G + 0.114 B.
+  void ToUprightGray(GrayImage& gray) const;
+
+  /// Size of the upright picture.
+  int upright_width() const { return quarter_turned() ? height_ : width_; }
+  int upright_height() const { return quarter_turned() ? width_ : height_; }
+
+  /// The frame's rectangle that covers the pixels of `upright`, cut to the frame. A rectangle outside the
+  /// frame comes back empty, on its border.
+  ky_rect_t ToFrame(const dlib::drectangle& upright) const;
+
+  /// The frame's point that shows `upright`.
+  ky_pointf_t ToFrame(const dlib::dpoint& upright) const;
+
+ private:
+  bool quarter_turned() const { return orientation_ == 90 || orientation_ == 270; }
+
+  template <typename Luma>
+  void Turn(int bytes_per_pixel, Luma luma, GrayImage& gray) const;
+
+  const unsigned char* image_;
+  int format_;
+  int width_;
+  int height_;
+  int stride_;
+  int orientation_;
+};
+
+}  // namespace kyengine

@@ -1,0 +1,98 @@
+/// The values that the open face engine gives to the arguments and results of the C interface in
+/// `kyface_api.h`.
+///
+/// The engine finds and tracks faces with dlib and needs no model file. Every function may be called from any
+/// thread: calls on one handle wait for one another, calls on different handles run side by side. No function
+/// throws, and none keeps a pointer to the caller's memory.
+///
+/// Rectangles are in pixels of the frame as it was handed over, `right` and `bottom` being the first column
+/// and row outside, and lie within the frame.
+#pragma once
+
+#ifdef __cplusplus
+extern "C" {
+#endif
+
+/// How the pixels of a frame are laid out. `stride` is the distance between two rows in bytes; interleaved
+/// formats need at least `width` times their bytes per pixel, gray and the 4:2:0 formats at least `width`.
+typedef enum ky_pixel_format_t {
+  KY_PIXEL_GRAY = 0,  ///< one byte per pixel
+  KY_PIXEL_BGR = 1,   ///< three bytes per pixel, blue first
+  KY_PIXEL_RGB = 2,   ///< three bytes per pixel, red first
+  KY_PIXEL_BGRA = 3,  ///< four bytes per pixel, blue first; alpha is ignored
+  KY_PIXEL_RGBA = 4,  ///< four bytes per pixel, red first; alpha is ignored
+  KY_PIXEL_NV21 = 5,  ///< `height` rows of luma, then `height / 2` rows of V, U pairs; even width and height
+  KY_PIXEL_NV12 = 6   ///< `height` rows of luma, then `height / 2` rows of U, V pairs; even width and height
+} ky_pixel_format_t;
+
+/// By how many degrees a frame must be turned clockwise to show its faces upright: for the frames of a phone
+/// held upright, what Android calls the sensor's orientation. Only the search turns the frame; what it finds
+/// comes back in the coordinates of the frame as it was handed over.
+typedef enum ky_orientation_t {
+  KY_ORIENTATION_0 = 0,
+  KY_ORIENTATION_90 = 90,
+  KY_ORIENTATION_180 = 180,
+  KY_ORIENTATION_270 = 270
+} ky_orientation_t;
+
+/// Configuration of a detector or tracker: which faces are worth the time. The detector sees faces from the
+/// size of its window on, 80 pixels for the built-in one. In a frame enlarged to twice its size it sees those
+/// of half that size, for four times the work.
+typedef enum ky_config_t {
+  KY_CONFIG_DEFAULT = 0,      ///< enlarges frames of up to KY_SMALL_FRAME_PIXELS
+  KY_CONFIG_LARGE_FACES = 1,  ///< never enlarges
+  KY_CONFIG_SMALL_FACES = 2   ///< always enlarges
+} ky_config_t;
+
+/// Frames of at most this many pixels (320 x 240) are enlarged by default, unless they are too narrow to hold
+/// a face of the detector's full window.
+#define KY_SMALL_FRAME_PIXELS 76800
+
+/// Longest side of a frame, in pixels.
+#define KY_MAX_FRAME_SIDE 8192
+
+/// A face's score is the detector's confidence m (its distance from the border between face and no face) as
+/// 1 / (1 + exp(-m)): 0.5 at the border, towards 1 for what is certainly a face. A detection counts when its
+/// score reaches the threshold; 1 lets nothing pass.
+#define KY_DEFAULT_THRESHOLD 0.6f
+#define KY_MIN_THRESHOLD 0.01f
+#define KY_MAX_THRESHOLD 1.0f
+
+/// Result codes: one for each kind of failure. A function that fails writes nothing but null pointers and
+/// zero counts.
+typedef enum ky_result_t {
+  KY_SUCCESS = 0,
+  KY_ERROR_NULL_POINTER = -1,     ///< a pointer that must not be null is
+  KY_ERROR_HANDLE = -2,           ///< the handle is null, destroyed, or of another kind
+  KY_ERROR_PIXEL_FORMAT = -3,     ///< no ky_pixel_format_t
+  KY_ERROR_SIZE = -4,             ///< a side is outside 1 to KY_MAX_FRAME_SIDE, or odd in a 4:2:0 format
+  KY_ERROR_STRIDE = -5,           ///< the stride is shorter than a row
+  KY_ERROR_ORIENTATION = -6,      ///< no ky_orientation_t
+  KY_ERROR_CONFIG = -7,           ///< no ky_config_t
+  KY_ERROR_RANGE = -8,            ///< a setting is outside its range
+  KY_ERROR_MODEL_FILE = -9,       ///< the model file cannot be opened
+  KY_ERROR_MODEL = -10,           ///< the model file holds no model that fits
+  KY_ERROR_LANDMARK_MODEL = -11,  ///< the file beside the model holds no landmark model that fits
+  KY_ERROR_FACE = -12,            ///< the face record cannot belong to the frame
+  KY_ERROR_FEATURE = -13,         ///< the feature is null, released, or no feature
+  KY_ERROR_MEMORY = -14,          ///< not enough memory
+  KY_ERROR_INTERNAL = -15         ///< anything else
+} ky_result_t;
+
+// Detectors and trackers take as their model path
+// - NULL: the built-in frontal face detector, without landmarks;
+// - a detector serialized by dlib (`dlib::frontal_face_detector`); when there is a file of the same name with
+//   KY_LANDMARKS_SUFFIX behind it, that is a landmark model serialized by dlib (`dlib::shape_predictor`);
+// - a landmark model alone, which then goes with the built-in detector.
+//
+// Without a landmark model a face has no points, and its angles and eye distance are 0. With one it has the
+// model's points (at most KY_FACE_MAX_POINTS); a model of 68 points in the usual order, or of 5 (two corners
+// of each eye, and the nose), also gives the eye distance in pixels and the roll, and one of 68 points yaw
+// and pitch. Angles are in degrees and describe the face in the upright frame, as the viewer sees it: yaw is
+// positive when the nose points to the viewer's right, pitch when it points down, roll when the head leans
+// clockwise.
+#define KY_LANDMARKS_SUFFIX ".landmarks"
+
+#ifdef __cplusplus
+}
+#endif

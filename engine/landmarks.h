@@ -1,0 +1,57 @@
+/// Landmark points of a face, and what they say about its pose.
+#pragma once
+
+#include "frame.h"
+// The configuration above comes first.
+#include <dlib/image_processing/shape_predictor.h>
+
+#include <istream>
+#include <memory>
+#include <vector>
+
+namespace kyengine {
+
+/// The centres of the two eyes, the one on the viewer's left first.
+struct Eyes {
+  dlib::dpoint left;
+  dlib::dpoint right;
+};
+
+/// Where a head looks, in degrees; the signs are those of `ky_engine.h`.
+struct Pose {
+  double yaw;
+  double pitch;
+};
+
+/// Finds the eyes among the `count` points of a model of 68 or of 5 points; false for any other count, and
+/// when both eyes are in one place.
+bool FindEyes(const std::vector<dlib::dpoint>& points, Eyes* eyes);
+
+/// The roll of the line through the eyes, in degrees.
+double RollOf(const Eyes& eyes);
+
+/// Estimates the pose from 68 points: the turn that brings a generic head's eye corners, mouth corners, nose
+/// tip and chin closest to where they are seen, at a distance that makes perspective negligible. False for
+/// any other count and for points that no head shows.
+bool EstimatePose(const std::vector<dlib::dpoint>& points, Pose* pose);
+
+/// A landmark model; immutable and shared by the handles that were created from one file.
+class LandmarkModel {
+ public:
+  /// Reads a model serialized by dlib; throws when there is none, or one of more than KY_FACE_MAX_POINTS
+  /// points. dlib checks the form of a model but not whether its parts agree: files of models are trusted.
+  explicit LandmarkModel(std::istream& in);
+
+  /// The points of the face in `box` of the upright picture.
+  std::vector<dlib::dpoint> Locate(const GrayImage& upright, const dlib::drectangle& box) const;
+
+ private:
+  dlib::shape_predictor predictor_;
+};
+
+/// Fills the landmark points of `face` and its pose, both 0 as far as the model (which may be null) cannot
+/// tell.
+void Describe(const LandmarkModel* model, const GrayImage& upright, const dlib::drectangle& box,
+              const Frame& frame, ky_face_t* face);
+
+}  // namespace kyengine

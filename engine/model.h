@@ -1,0 +1,23 @@
+/// Loading of the models that a detector or tracker works with.
+#pragma once
+
+#include "landmarks.h"
+// The configuration comes first.
+#include <dlib/image_processing/frontal_face_detector.h>
+
+#include <memory>
+
+namespace kyengine {
+
+struct Model {
+  dlib::frontal_face_detector detector;
+  std::shared_ptr<const LandmarkModel> landmarks;  ///< null when there is none
+};
+
+/// Loads what `path` names, as `ky_engine.h` describes; throws Failure.
+Model LoadModel(const char* path);
+
+/// Loads a landmark model; throws Failure. Handles created from one file share it: such models are large.
+std::shared_ptr<const LandmarkModel> LoadLandmarks(const char* path);
+
+}  // namespace kyengine
