@@ -1,0 +1,98 @@
+package com.vantrel.faceapi;
+
+import static org.junit.Assert.assertEquals;
+import static org.junit.Assert.assertFalse;
+
+import java.io.IOException;
+import java.util.ArrayList;
+import java.util.Arrays;
+import java.util.List;
+import org.junit.Test;
+
+/** What is written to the log, with the debug switch on, off, and as it is at first. */
+public class LoggingTest {
+    private static final List<String> DETECTOR = Arrays.asList(
+            "E/FaceAPI: FaceCreateDetector create handle fail : " + EngineValues.ERROR_MODEL_FILE,
+            "D/FaceAPI: ky_face_detect_get_threshold threshold: 0.600000",
+            "D/FaceAPI: ky_face_detect_set_threshold threshold: 0.750000",
+            "D/FaceAPI: detect input image is null",
+            "D/FaceAPI: detect input image is null",
+            "D/FaceAPI: ky_face_destroy_detector",
+            "E/FaceAPI: kyFaceDetect detect handle is null",
+            "E/FaceAPI: kyFaceDestroyDetector destroy detect handle is null");
+
+    /** The switch does not reach these. */
+    private static final List<String> CONVERSIONS = Arrays.asList(
+            "I/FaceAPI: nv2BGR start",
+            "I/FaceAPI: nv2BGR end",
+            "I/FaceAPI: nv2RGB ",
+            "I/FaceAPI: RGB2nv ",
+            "I/FaceAPI: nv2BGR start",
+            "I/FaceAPI: nv2BGR end",
+            "I/FaceAPI: RGB2nv ",
+            "I/FaceAPI: nv212BGR start",
+            "I/FaceAPI: nv212BGR end");
+
+    private static List<String> all(List<List<String>> parts) {
+        List<String> lines = new ArrayList<>();
+        for (List<String> part : parts) {
+            lines.addAll(part);
+        }
+        return lines;
+    }
+
+    private static void assertLogs(String debug, List<List<String>> expected)
+            throws IOException, InterruptedException {
+        Child child = Child.run(Calls.class, debug);
+        assertEquals(child.output, 0, child.exitStatus);
+        assertFalse(child.output, child.output.contains("in native method"));
+        assertEquals(all(expected), child.errors);
+    }
+
+    @Test
+    public void everythingAtFirst() throws IOException, InterruptedException {
+        assertLogs("untouched", Arrays.asList(DETECTOR, CONVERSIONS));
+    }
+
+    @Test
+    public void everythingWhenOn() throws IOException, InterruptedException {
+        assertLogs("on", Arrays.asList(DETECTOR, CONVERSIONS));
+    }
+
+    @Test
+    public void conversionsAloneWhenOff() throws IOException, InterruptedException {
+        assertLogs("off", Arrays.asList(CONVERSIONS));
+    }
+
+    /** Makes the calls whose messages are expected above. */
+    static final class Calls {
+        public static void main(String[] args) {
+            if (args[0].equals("on")) {
+                FaceLibrary.setDebug(false);
+                FaceLibrary.setDebug(true);
+            } else if (args[0].equals("off")) {
+                FaceLibrary.setDebug(false);
+            }
+            detector();
+            byte[] bytes = new byte[16 * 16 * 4];
+            for (int code : new int[] {1, 2, 3, 5, 20, 1001}) {
+                FaceLibrary.convertColorSpace(bytes, 16, 16, new byte[bytes.length], code);
+            }
+        }
+
+        private static void detector() {
+            int[] status = new int[1];
+            FaceLibrary.kyFaceCreateDetector("/nowhere/at/all.dat", 0);
+            long detector = FaceLibrary.kyFaceCreateDetector(null, 0);
+            FaceLibrary.getDetectThreshold(detector, status);
+            FaceLibrary.setDetectThreshold(detector, 0.75f, status);
+            FaceLibrary.setDetectThreshold(detector, 0, status); // says nothing
+            FaceLibrary.kyFaceDetectBytes(detector, null, 0, 4, 4, 4, 0, status);
+            FaceLibrary.kyFaceDetectInts(detector, null, 0, 4, 4, 4, 0, status);
+            FaceLibrary.kyFaceDetectBytes(detector, new byte[16], 0, 4, 4, 4, 0, null); // says nothing
+            FaceLibrary.kyFaceDestroyDetector(detector);
+            FaceLibrary.kyFaceDetectBytes(0, new byte[16], 0, 4, 4, 4, 0, status);
+            FaceLibrary.kyFaceDestroyDetector(0);
+        }
+    }
+}
