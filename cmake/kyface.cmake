@@ -1,5 +1,12 @@
 # Compile and link options shared by the project's targets.
 
+# Checks built into everything, tests included: what -fsanitize takes.
+set(KYFACE_SANITIZE "" CACHE STRING "Sanitizers to build with")
+if(KYFACE_SANITIZE)
+  add_compile_options(-fsanitize=${KYFACE_SANITIZE} -fno-sanitize-recover=all -fno-omit-frame-pointer -g1)
+  add_link_options(-fsanitize=${KYFACE_SANITIZE})
+endif()
+
 # What every target of the project is compiled with.
 add_library(kyface_warnings INTERFACE)
 target_compile_options(kyface_warnings INTERFACE -Wall -Wextra -Wpedantic -Wshadow -Wcast-qual -Wvla -Werror)
@@ -10,6 +17,13 @@ add_library(kyface_simd INTERFACE)
 target_compile_options(kyface_simd INTERFACE -ffp-contract=off -fno-math-errno)
 if(CMAKE_SYSTEM_PROCESSOR MATCHES "x86_64|AMD64")
   target_compile_options(kyface_simd INTERFACE -mavx2 -mfma)
+  if(ANDROID)
+    # SIMDe is headers alone and knows Android; only its own folder must be seen of this machine's headers.
+    find_path(KYFACE_SIMDE simde/arm/neon.h NO_CMAKE_FIND_ROOT_PATH REQUIRED)
+    file(MAKE_DIRECTORY ${CMAKE_BINARY_DIR}/simde)
+    file(CREATE_LINK ${KYFACE_SIMDE}/simde ${CMAKE_BINARY_DIR}/simde/simde SYMBOLIC)
+    target_include_directories(kyface_simd SYSTEM INTERFACE ${CMAKE_BINARY_DIR}/simde)
+  endif()
 endif()
 
 # What the shipped library is compiled with.
@@ -20,7 +34,7 @@ target_link_libraries(kyface_options INTERFACE kyface_warnings kyface_simd)
 
 # Hardening of a shared library: read-only relocations, everything bound at load, nothing left undefined.
 add_library(kyface_link INTERFACE)
-target_link_options(kyface_link INTERFACE -Wl,-z,relro -Wl,-z,now -Wl,-z,defs)
+target_link_options(kyface_link INTERFACE -Wl,-z,relro -Wl,-z,now -Wl,-z,defs -Wl,--build-id=sha1)
 if(CMAKE_SYSTEM_PROCESSOR MATCHES "aarch64|arm64|ARM64")
   target_link_options(kyface_link INTERFACE -Wl,-z,max-page-size=16384)
 endif()

@@ -4,9 +4,9 @@
 #   scripts/setup.sh [group...]
 #
 # Groups are `host` and `aarch64`, named after the build presets that need them, both without an argument; and `bench`,
-# which adds what scripts/bench needs. Packages that are there already are left alone, and nothing is asked when all
-# are. Packages of this machine are installed with apt-get (through sudo when not root). Packages of 64-bit Arm are
-# unpacked into .deps/arm64: installing them would pull this system's own packages along.
+# `lint` and `fuzz`, which add what the scripts of these names need. Packages that are there already are left alone,
+# and nothing is asked when all are. Packages of this machine are installed with apt-get (through sudo when not root).
+# Packages of 64-bit Arm are unpacked into .deps/arm64: installing them would pull this system's own packages along.
 # shellcheck source=scripts/common.sh
 source "$(dirname "${BASH_SOURCE[0]}")/common.sh"
 
@@ -25,6 +25,15 @@ packages_aarch64=(
   g++-aarch64-linux-gnu        # the C and C++ libraries that it compiles and links against
   qemu-user                    # runs the result
   python3                      # scripts/bench, which checks the instruction counts
+)
+packages_lint=(
+  "${packages_aarch64[@]}"
+  clang-format-19 clang-tidy-19
+)
+packages_fuzz=(
+  "${packages_host[@]}"
+  clang-19 lld-19 llvm-19
+  libclang-rt-19-dev           # libFuzzer and the sanitizers
 )
 packages_bench=(
   "${packages_aarch64[@]}"
@@ -139,8 +148,10 @@ for group in "$@"; do
   case $group in
     host) packages+=("${packages_host[@]}") ;;
     aarch64) packages+=("${packages_aarch64[@]}") arm64+=("${arm64_aarch64[@]}") ;;
+    lint) packages+=("${packages_lint[@]}") arm64+=("${arm64_aarch64[@]}") ;;
+    fuzz) packages+=("${packages_fuzz[@]}") ;;
     bench) packages+=("${packages_bench[@]}") arm64+=("${arm64_bench[@]}") ;;
-    *) fail "there is no group \"$group\"; the groups are host, aarch64 and bench" ;;
+    *) fail "there is no group \"$group\"; the groups are host, aarch64, bench, lint and fuzz" ;;
   esac
 done
 readarray -t packages < <(printf '%s\n' "${packages[@]}" | awk '!seen[$0]++')
