@@ -6,12 +6,16 @@
 ///   accepted and ignored.
 /// - `rectX`, `rectY`, `rectW`, `rectH`: the rectangle in pixels; it is clipped to the image.
 ///
-/// The result is the rounded mean over every pixel of the clipped rectangle, (sum + n / 2) / n in 32-bit arithmetic,
-/// as its low 8 bits; 0 when the clipped rectangle has an area of 0. A null `data`, a `widthStride` below 1 or a
-/// rectangle whose `rectW * rectH` is 0 prints "wrong enter\r" to standard output and returns 255.
+/// The result is the rounded mean over the n pixels of the clipped rectangle, (sum + n / 2) / n, as its low 8
+/// bits; 0 when n is 0. A null `data`, a `widthStride` below 1 or a rectangle whose `rectW * rectH` is 0
+/// prints "wrong enter\r" and a newline to standard output and returns 255.
 ///
-/// The sum is an unsigned 32-bit sum and the mean a signed division: it holds up to 2^31 - 1, which is reached at
-/// the earliest by 8 421 505 pixels of 255 (about 2900 x 2900); a larger bright region gives a meaningless mean.
+/// All of this is 32-bit arithmetic that wraps, whatever the arguments: an unsigned sum, signed sizes and a
+/// signed division. Any region up to 8 405 024 pixels (2899 x 2899) is safe. From there on a region that is
+/// white throughout makes sum + n / 2 exceed 2^31 - 1, from 16 843 010 pixels on the sum itself wraps, and
+/// the mean means nothing; a darker region may be larger in proportion.
+///
+/// The functions may be called from several threads at once.
 #pragma once
 
 #ifndef KYFACE_EXPORT
@@ -30,10 +34,14 @@ KYFACE_EXPORT unsigned char calcGray_BGRA(const unsigned char* data, int width, 
 KYFACE_EXPORT unsigned char calcGray_RGBA(const unsigned char* data, int width, int widthStride, int height,
                                           int heightStride, int rectX, int rectY, int rectW, int rectH);
 
-/// Mean CIE lightness (L* scaled to 0..255) of B,G,R,A pixels.
-KYFACE_EXPORT unsigned char calcLuminance_BGRA(const unsigned char* data, int width, int widthStride, int height,
-                                               int heightStride, int rectX, int rectY, int rectW, int rectH);
+/// Mean CIE lightness (L* scaled to 0..255) of B,G,R,A pixels. Each call rebuilds the two look-up tables, 6.5
+/// KB.
+KYFACE_EXPORT unsigned char calcLuminance_BGRA(const unsigned char* data, int width, int widthStride,
+                                               int height, int heightStride, int rectX, int rectY, int rectW,
+                                               int rectH);
 
-/// Mean CIE lightness (L* scaled to 0..255) of R,G,B,A pixels.
-KYFACE_EXPORT unsigned char calcLuminance_RGBA(const unsigned char* data, int width, int widthStride, int height,
-                                               int heightStride, int rectX, int rectY, int rectW, int rectH);
+/// Mean CIE lightness (L* scaled to 0..255) of R,G,B,A pixels. Each call rebuilds the two look-up tables, 6.5
+/// KB.
+KYFACE_EXPORT unsigned char calcLuminance_RGBA(const unsigned char* data, int width, int widthStride,
+                                               int height, int heightStride, int rectX, int rectY, int rectW,
+                                               int rectH);
