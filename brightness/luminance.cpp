@@ -1,5 +1,5 @@
 // Mean CIE lightness. Every call rebuilds the global tables; as their contents are known at compile time,
-// that is a copy of 3328 entries, a sixth of the time that a 64 x 64 region takes.
+// that is a copy of 3328 entries, a seventh of the time that a 64 x 64 region takes.
 
 #include <array>
 #include <atomic>
