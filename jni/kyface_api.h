@@ -4,7 +4,7 @@
 /// in memory, so their layout is fixed: every field offset below is checked at compile time.
 ///
 /// Unless stated otherwise an int result is the engine's result code: 0 is success, any other value names a
-/// failure and is the engine's own. Pixel formats, orientations and configuration flags are engine values too.
+/// failure and is the engine's own. Pixel formats, orientations and configuration flags are engine values.
 #pragma once
 
 #include <stddef.h>
@@ -44,17 +44,17 @@ typedef struct ky_face_t {
   ky_pointf_t points_array[KY_FACE_MAX_POINTS];
 } ky_face_t;
 
-/// A detector, tracker or verifier: an opaque, pointer-sized engine value, NULL for none. Java carries it as a
-/// `long`.
+/// A detector, tracker or verifier: an opaque, pointer-sized engine value, NULL for none. Java carries it
+/// as a `long`.
 typedef void* ky_handle_t;
 
 /// An engine-owned face feature.
 typedef void* ky_feature_t;
 
-// ---- detector ------------------------------------------------------------------------------------------------
+// ---- detector -----------------------------------------------------------------------------------
 
-/// Creates a detector from the model file at `model_path` (NULL: the engine's built-in model) and stores it in
-/// `*handle`.
+/// Creates a detector from the model file at `model_path` (NULL: the engine's built-in model) and stores it
+/// in `*handle`.
 int ky_face_create_detector(ky_handle_t* handle, const char* model_path, int config);
 
 /// Frees a detector.
@@ -66,8 +66,8 @@ int ky_face_detect_get_threshold(ky_handle_t handle, float* threshold);
 /// Sets the detection threshold.
 int ky_face_detect_set_threshold(ky_handle_t handle, float threshold);
 
-/// Detects the faces of one image. `stride` is the distance between two rows in bytes. On success `*faces` is an
-/// engine-owned array of `*count` records, freed by `ky_face_release_detector_result`.
+/// Detects the faces of one image. `stride` is the distance between two rows in bytes. On success `*faces` is
+/// an engine-owned array of `*count` records, freed by `ky_face_release_detector_result`.
 int ky_face_detect(ky_handle_t handle, const unsigned char* image, int pixel_format, int width, int height,
                    int stride, int orientation, ky_face_t** faces, int* count);
 
@@ -77,9 +77,10 @@ void ky_face_release_detector_result(ky_face_t* faces, int count);
 /// Shows the engine's algorithm and model information.
 int ky_face_algorithm_info(void);
 
-// ---- tracker -------------------------------------------------------------------------------------------------
+// ---- tracker ------------------------------------------------------------------------------------
 
-/// Creates a tracker from the model file at `model_path` (NULL: the built-in model) and stores it in `*handle`.
+/// Creates a tracker from the model file at `model_path` (NULL: the built-in model) and stores it
+/// in `*handle`.
 int ky_face_create_tracker(ky_handle_t* handle, const char* model_path, int config);
 
 /// Frees a tracker.
@@ -105,9 +106,10 @@ int ky_face_track_set_detect_interval(ky_handle_t handle, int interval, int* pre
 /// Sets the alignment threshold; may write an int to `*previous`.
 int ky_face_track_set_alignment_threshold(ky_handle_t handle, int threshold, int* previous);
 
-// ---- verifier ------------------------------------------------------------------------------------------------
+// ---- verifier -----------------------------------------------------------------------------------
 
-/// Creates a verifier from the model file at `model_path` (NULL: the built-in model) and stores it in `*handle`.
+/// Creates a verifier from the model file at `model_path` (NULL: the built-in model) and stores it
+/// in `*handle`.
 int ky_verify_create_handle(ky_handle_t* handle, const char* model_path);
 
 /// Frees a verifier.
@@ -119,10 +121,10 @@ int ky_verify_get_version(ky_handle_t handle);
 /// Returns the length of a feature, in bytes.
 int ky_verify_get_feature_length(ky_handle_t handle);
 
-/// Extracts the feature of `face` from an image. On success `*feature` is an engine-owned feature of `*length`
-/// bytes, freed by `ky_verify_release_feature`.
-int ky_verify_get_feature(ky_handle_t handle, const unsigned char* image, int pixel_format, int width, int height,
-                          int stride, const ky_face_t* face, ky_feature_t* feature, int* length);
+/// Extracts the feature of `face` from an image. On success `*feature` is an engine-owned feature of
+/// `*length` bytes, freed by `ky_verify_release_feature`.
+int ky_verify_get_feature(ky_handle_t handle, const unsigned char* image, int pixel_format, int width,
+                          int height, int stride, const ky_face_t* face, ky_feature_t* feature, int* length);
 
 /// Writes the feature's text, zero-terminated, into `text`: ((length + 2) / 3) * 4 + 1 bytes.
 void ky_verify_serialize_feature(ky_feature_t feature, char* text);

@@ -241,12 +241,12 @@ public final class FaceLibrary {
      * Extracts the feature of a face. The image is taken upright: there is no orientation.
      *
      * @param handle a verifier; 0 gives null
-     * @param image the pixels; not null
+     * @param image the pixels; null gives null
      * @param pixelFormat the engine's number for the pixels' layout
      * @param width image width in pixels
      * @param height image height in pixels
      * @param stride bytes from one row to the next
-     * @param face the face in the image's coordinates, with a rectangle and at most 256 points; null gives null
+     * @param face the face in the image's coordinates, of which 256 points at most are read; null gives null
      * @param status at least one element; set to 0 on success and left as it is on any failure; null gives null
      * @return the serialized feature, {@code (n + 2) / 3 * 4 + 1} bytes for a feature of {@code n}: text with a
      *     terminating zero, to be kept and compared as it is; null on any failure
@@ -259,7 +259,7 @@ public final class FaceLibrary {
      * Extracts the feature of a face in an image of 32-bit pixels. The image is taken upright.
      *
      * @param handle a verifier; 0 gives null
-     * @param image the pixels; not null
+     * @param image the pixels; null gives null
      * @param pixelFormat the engine's number for the pixels' layout
      * @param width image width in pixels
      * @param height image height in pixels

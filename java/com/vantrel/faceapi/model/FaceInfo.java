@@ -10,12 +10,12 @@ import android.graphics.Rect;
  * name: renaming or shrinking it away breaks the library. Coordinates are pixels of the image that was given.
  */
 public class FaceInfo {
-    /** The face's rectangle. Never null in a result; must not be null when handed to feature extraction. */
+    /** The face's rectangle. Never null in a result; feature extraction reads null as (0, 0, 0, 0). */
     public Rect faceRect;
 
     /**
-     * The landmark points; an empty array when the engine gives none, never null in a result. Handed to feature
-     * extraction it must not be null, must hold no null and at most 256 points: native code does not check.
+     * The landmark points; an empty array when the engine gives none, never null in a result. Feature extraction reads
+     * the first 256 points and ignores any further ones, reads null as no points, and a null point as (0, 0).
      */
     public PointF[] facePoints;
 
