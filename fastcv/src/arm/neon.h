@@ -6,4 +6,7 @@
 #else
 #define SIMDE_ENABLE_NATIVE_ALIASES
 #include <simde/arm/neon.h>
+#if defined(__AVX2__)
+#include "neon_x86.h"
+#endif
 #endif
