@@ -1,0 +1,99 @@
+// Native methods of FaceLibrary that measure brightness.
+#include "brightness.h"
+
+#include <jni.h>
+
+#include <algorithm>
+#include <cstdint>
+
+#include "bridge_log.h"
+#include "pinned.h"
+
+namespace {
+
+using Metric = decltype(calcGray_YUV);
+
+/// The metric of a `format`, null for one that has none.
+Metric* metric_of(jint format) {
+  switch (format) {
+    case 0:
+      return calcLuminance_RGBA;
+    case 1:
+      return calcLuminance_BGRA;
+    case 3:
+      return calcGray_YUV;
+    case 4:
+      return calcGray_BGRA;
+    case 5:
+      return calcGray_RGBA;
+    default:  // 2 deliberately among them
+      return nullptr;
+  }
+}
+
+/// The sum of `rows` by `columns` bytes, the rows `stride` bytes apart.
+std::uint32_t sum_bytes(const unsigned char* first, std::int64_t stride, int columns, int rows) {
+  std::uint32_t sum = 0;
+  for (int y = 0; y < rows; ++y) {
+    const unsigned char* row = first + y * stride;
+    for (int x = 0; x < columns; ++x) {
+      sum += row[x];
+    }
+  }
+  return sum;
+}
+
+}  // namespace
+
+extern "C" {
+
+JNIEXPORT jint JNICALL Java_com_vantrel_faceapi_FaceLibrary_faceBrightEvaluate(
+    JNIEnv* env, jobject /*thiz*/, jbyteArray image, jint format, jint width, jint widthStride, jint height,
+    jint heightStride, jint rectX, jint rectY, jint rectW, jint rectH) {
+  if (image == nullptr) {
+    FACE_LOG(ANDROID_LOG_ERROR, "IMAGE IS NULL");
+    return -1;
+  }
+  // A metric answers for an image that could not be pinned.
+  const kyface::PinnedArray pinned(env, image);
+  jint result = -1;
+  if (Metric* metric = metric_of(format)) {
+    result = metric(pinned.bytes(), width, widthStride, height, heightStride, rectX, rectY, rectW, rectH);
+  }
+  FACE_LOG(ANDROID_LOG_VERBOSE,
+           "width:%d,width_stride:%d,height:%d,height_stride:%d,rect_x:%d,rect_y:%d,rect_w:%d,rect_h:%d",
+           width, widthStride, height, heightStride, rectX, rectY, rectW, rectH);
+  return result;
+}
+
+JNIEXPORT jfloat JNICALL Java_com_vantrel_faceapi_FaceLibrary_averageBrightness(JNIEnv* env, jobject /*thiz*/,
+                                                                                jbyteArray gray, jint width,
+                                                                                jint height, jint x, jint y,
+                                                                                jint w, jint h) {
+  kyface::PinnedArray pinned(env, gray);
+  if (x > width || y > height || w < 1 || h < 1) {
+    FACE_LOG(
+        ANDROID_LOG_WARN,
+        "averageBrightness native area is not in image frame imageFrame : %dx%d,area[x,y,w,h] : %d,%d,%d,%d",
+        width, height, x, y, w, h);
+    pinned.leave_pinned();  // deliberately on this path
+    return 0.0F;
+  }
+  if (!pinned) {
+    return 0.0F;
+  }
+  const int left = std::max(x, 0);
+  const int top = std::max(y, 0);
+  const int columns = std::int64_t{left} + w > width ? width - left : w;
+  // The height test deliberately adds to the left edge: callers depend on which rectangles it cuts.
+  const int rows = std::int64_t{left} + h > height ? height - top : h;
+  const std::int64_t stride = width;
+  const std::uint32_t sum = sum_bytes(pinned.bytes() + top * stride + left, stride, columns, rows);
+  pinned.release();
+  // Both in 32 bits; a rectangle without an area is 0/0.
+  const auto full = static_cast<std::int32_t>(static_cast<std::uint32_t>(columns) *
+                                              static_cast<std::uint32_t>(rows) * std::uint32_t{255});
+  return static_cast<float>(static_cast<std::int32_t>(sum)) / static_cast<float>(full);
+}
+
+}  // extern "C"
