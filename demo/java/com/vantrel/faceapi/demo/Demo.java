@@ -101,6 +101,8 @@ public final class Demo {
         }
         System.out.println();
         time.print();
+        System.out.println();
+        new Lighting(WIDTH, HEIGHT).print(shown, nv21, faces);
         return 0;
     }
 

@@ -21,6 +21,12 @@ public class LoggingTest {
             "E/FaceAPI: kyFaceDetect detect handle is null",
             "E/FaceAPI: kyFaceDestroyDetector destroy detect handle is null");
 
+    private static final List<String> BRIGHTNESS = Arrays.asList(
+            "E/FaceAPI: IMAGE IS NULL",
+            "V/FaceAPI: width:4,width_stride:16,height:3,height_stride:7,rect_x:1,rect_y:0,rect_w:2,rect_h:3",
+            "V/FaceAPI: width:4,width_stride:16,height:3,height_stride:7,rect_x:-1,rect_y:-2,rect_w:-3,rect_h:-4",
+            "W/FaceAPI: averageBrightness native area is not in image frame imageFrame : 4x3,area[x,y,w,h] : 5,0,1,2");
+
     /** The switch does not reach these. */
     private static final List<String> CONVERSIONS = Arrays.asList(
             "I/FaceAPI: nv2BGR start",
@@ -51,12 +57,12 @@ public class LoggingTest {
 
     @Test
     public void everythingAtFirst() throws IOException, InterruptedException {
-        assertLogs("untouched", Arrays.asList(DETECTOR, CONVERSIONS));
+        assertLogs("untouched", Arrays.asList(DETECTOR, BRIGHTNESS, CONVERSIONS));
     }
 
     @Test
     public void everythingWhenOn() throws IOException, InterruptedException {
-        assertLogs("on", Arrays.asList(DETECTOR, CONVERSIONS));
+        assertLogs("on", Arrays.asList(DETECTOR, BRIGHTNESS, CONVERSIONS));
     }
 
     @Test
@@ -75,6 +81,7 @@ public class LoggingTest {
             }
             detector();
             byte[] bytes = new byte[16 * 16 * 4];
+            brightness(bytes);
             for (int code : new int[] {1, 2, 3, 5, 20, 1001}) {
                 FaceLibrary.convertColorSpace(bytes, 16, 16, new byte[bytes.length], code);
             }
@@ -93,6 +100,14 @@ public class LoggingTest {
             FaceLibrary.kyFaceDestroyDetector(detector);
             FaceLibrary.kyFaceDetectBytes(0, new byte[16], 0, 4, 4, 4, 0, status);
             FaceLibrary.kyFaceDestroyDetector(0);
+        }
+
+        private static void brightness(byte[] bytes) {
+            FaceLibrary.faceBrightEvaluate(null, 0, 4, 16, 3, 7, 1, 0, 2, 3);
+            FaceLibrary.faceBrightEvaluate(bytes, 0, 4, 16, 3, 7, 1, 0, 2, 3);
+            FaceLibrary.faceBrightEvaluate(bytes, 2, 4, 16, 3, 7, -1, -2, -3, -4); // no metric, the line all the same
+            FaceLibrary.averageBrightness(bytes, 4, 3, 0, 0, 4, 3); // says nothing
+            FaceLibrary.averageBrightness(bytes, 4, 3, 5, 0, 1, 2);
         }
     }
 }
