@@ -7,8 +7,7 @@
 #include <vector>
 
 #include "face_finder.h"
-#include "guard.h"
-#include "handles.h"
+#include "search.h"
 
 namespace kyengine {
 namespace {
@@ -46,51 +45,38 @@ class Detector {
   GrayImage gray_;
 };
 
-using Detectors = HandleTable<Detector>;
+using Detectors = Handles<Detector>;
 
 }  // namespace
 }  // namespace kyengine
 
 using kyengine::Detector;
 using kyengine::Detectors;
-using kyengine::Frame;
 using kyengine::Guarded;
 using kyengine::Require;
 
 int ky_face_create_detector(ky_handle_t* handle, const char* model_path, int config) {
-  return Guarded([&] {
-    Require(handle != nullptr, KY_ERROR_NULL_POINTER);
-    *handle = nullptr;
-    *handle = Detectors::Get().Add(std::make_shared<Detector>(model_path, config));
-  });
+  return Detectors::Create(handle, model_path, config);
 }
 
-void ky_face_destroy_detector(ky_handle_t handle) {
-  Guarded([&] { Detectors::Get().Remove(handle); });
-}
+void ky_face_destroy_detector(ky_handle_t handle) { Detectors::Destroy(handle); }
 
 int ky_face_detect_get_threshold(ky_handle_t handle, float* threshold) {
   return Guarded([&] {
-    const auto detector = Detectors::Get().Find(handle, KY_ERROR_HANDLE);
+    const auto detector = Detectors::Find(handle);
     Require(threshold != nullptr, KY_ERROR_NULL_POINTER);
     *threshold = detector->threshold();
   });
 }
 
 int ky_face_detect_set_threshold(ky_handle_t handle, float threshold) {
-  return Guarded([&] { Detectors::Get().Find(handle, KY_ERROR_HANDLE)->set_threshold(threshold); });
+  return Guarded([&] { Detectors::Find(handle)->set_threshold(threshold); });
 }
 
 int ky_face_detect(ky_handle_t handle, const unsigned char* image, int pixel_format, int width, int height,
                    int stride, int orientation, ky_face_t** faces, int* count) {
-  return Guarded([&] {
-    Require(faces != nullptr && count != nullptr, KY_ERROR_NULL_POINTER);
-    *faces = nullptr;
-    *count = 0;
-    const auto detector = Detectors::Get().Find(handle, KY_ERROR_HANDLE);
-    const Frame frame(image, pixel_format, width, height, stride, orientation);
-    kyengine::HandOver(detector->Detect(frame), faces, count);
-  });
+  return kyengine::Search(&Detector::Detect, handle, image, pixel_format, width, height, stride, orientation,
+                          faces, count);
 }
 
 void ky_face_release_detector_result(ky_face_t* faces, int /*count*/) { kyengine::ReleaseFaces(faces); }

@@ -6,51 +6,67 @@
 #include <unordered_map>
 #include <utility>
 
-#include "failure.h"
+#include "guard.h"
 
 namespace kyengine {
 
-/// All objects of one kind that callers hold. A value that is not in the table is refused without looking at
-/// what it points to, and an object that is destroyed during a call on another thread lives until that call
-/// is over.
+/// All objects of type `T` that callers hold. A value that names none is refused without looking at what it
+/// points to, and an object that is destroyed during a call on another thread lives until that call is over.
 template <typename T>
-class HandleTable {
+class Handles {
  public:
-  /// The process's table of this kind. It is never destroyed: threads may call until the process is gone.
-  static HandleTable& Get() {
-    static auto& table = *new HandleTable;
-    return table;
-  }
-
   /// Takes an object in and returns its handle, which is never null.
-  void* Add(std::shared_ptr<T> object) {
+  static void* Add(std::shared_ptr<T> object) {
     void* const handle = object.get();
-    const std::lock_guard lock(mutex_);
-    objects_.emplace(handle, std::move(object));
+    Table& table = Get();
+    const std::lock_guard lock(table.mutex);
+    table.objects.emplace(handle, std::move(object));
     return handle;
   }
 
-  /// Throws Failure{code} when there is no such object.
-  std::shared_ptr<T> Find(void* handle, ky_result_t code) const {
-    const std::lock_guard lock(mutex_);
-    const auto found = objects_.find(handle);
-    Require(found != objects_.end(), code);
+  /// Makes an object and stores its handle in `*handle`; null there and a result code on failure.
+  template <typename... Arguments>
+  static int Create(void** handle, const Arguments&... arguments) noexcept {
+    return Guarded([&] {
+      Require(handle != nullptr, KY_ERROR_NULL_POINTER);
+      *handle = nullptr;
+      *handle = Add(std::make_shared<T>(arguments...));
+    });
+  }
+
+  /// Throws Failure{code} when `handle` names no object.
+  static std::shared_ptr<T> Find(void* handle, ky_result_t code = KY_ERROR_HANDLE) {
+    Table& table = Get();
+    const std::lock_guard lock(table.mutex);
+    const auto found = table.objects.find(handle);
+    Require(found != table.objects.end(), code);
     return found->second;
   }
 
-  /// Forgets the object, if there is one.
-  void Remove(void* handle) {
-    std::shared_ptr<T> last;  // outlives the lock, as taking an object down takes time
-    const std::lock_guard lock(mutex_);
-    if (const auto found = objects_.find(handle); found != objects_.end()) {
-      last = std::move(found->second);
-      objects_.erase(found);
-    }
+  /// Forgets the object that `handle` names, if any.
+  static void Destroy(void* handle) noexcept {
+    Guarded([&] {
+      Table& table = Get();
+      std::shared_ptr<T> last;  // outlives the lock, as taking an object down takes time
+      const std::lock_guard lock(table.mutex);
+      if (const auto found = table.objects.find(handle); found != table.objects.end()) {
+        last = std::move(found->second);
+        table.objects.erase(found);
+      }
+    });
   }
 
  private:
-  mutable std::mutex mutex_;
-  std::unordered_map<void*, std::shared_ptr<T>> objects_;
+  struct Table {
+    std::mutex mutex;
+    std::unordered_map<void*, std::shared_ptr<T>> objects;
+  };
+
+  /// The one table of this type. It is never destroyed: threads may call until the process is gone.
+  static Table& Get() {
+    static auto& table = *new Table;
+    return table;
+  }
 };
 
 }  // namespace kyengine

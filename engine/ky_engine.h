@@ -58,6 +58,30 @@ typedef enum ky_config_t {
 #define KY_MIN_THRESHOLD 0.01f
 #define KY_MAX_THRESHOLD 1.0f
 
+/// A tracker looks for faces in the first frame and then in every `interval`-th; in the frames between it
+/// follows those that it knows. A face keeps its identity, a number from 1 on, as long as detections overlap
+/// with where it is followed to, through up to KY_FORGIVEN_MISSES detections in a row that miss it; no living
+/// face's number is given to another, and ky_face_reset_tracker does not start the numbers over. The score of
+/// a face is that of its last detection. Frames of one tracker have one size and orientation: a frame of
+/// another size starts anew.
+#define KY_DEFAULT_DETECT_INTERVAL 10
+#define KY_MIN_DETECT_INTERVAL 1
+#define KY_MAX_DETECT_INTERVAL 1000
+#define KY_FORGIVEN_MISSES 4
+
+/// The most faces that a tracker knows at a time; the best are kept.
+#define KY_DEFAULT_FACE_LIMIT 8
+#define KY_MIN_FACE_LIMIT 1
+#define KY_MAX_FACE_LIMIT 32
+
+/// How well what is seen must agree with a face for it to be followed there, in percent: a peak-to-side-lobe
+/// ratio of the correlation of 20 and more is 100. A face that moves steadily has 60 and more, one that is
+/// half covered 40, and another place 30 and less. A face below the threshold is not reported until a
+/// detection finds it again.
+#define KY_DEFAULT_ALIGNMENT_THRESHOLD 40
+#define KY_MIN_ALIGNMENT_THRESHOLD 0
+#define KY_MAX_ALIGNMENT_THRESHOLD 100
+
 /// Result codes: one for each kind of failure. A function that fails writes nothing but null pointers and
 /// zero counts.
 typedef enum ky_result_t {

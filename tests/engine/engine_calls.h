@@ -64,10 +64,17 @@ class Handle {
 
 using Detector = Handle<ky_face_create_detector, ky_face_destroy_detector>;
 using Detected = Faces<ky_face_release_detector_result>;
+using Tracker = Handle<ky_face_create_tracker, ky_face_destroy_tracker>;
+using Tracked = Faces<ky_face_release_tracker_result>;
 
 inline int Detect(ky_handle_t detector, const TestFrame& f, Detected& faces) {
   return ky_face_detect(detector, f.bytes.data(), f.format, f.width, f.height, f.stride, f.orientation,
                         &faces.faces, &faces.count);
+}
+
+inline int Track(ky_handle_t tracker, const TestFrame& f, Tracked& faces) {
+  return ky_face_track(tracker, f.bytes.data(), f.format, f.width, f.height, f.stride, f.orientation,
+                       &faces.faces, &faces.count);
 }
 
 inline void ExpectRect(const ky_rect_t& expected, const ky_rect_t& rect, int tolerance) {
