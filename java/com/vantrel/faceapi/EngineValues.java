@@ -48,6 +48,29 @@ public final class EngineValues {
     /** The highest detection threshold; nothing passes it. */
     public static final float MAX_THRESHOLD = 1.0f;
 
+    /** From one frame that a tracker searches for faces to the next, in frames; between them it follows faces. */
+    public static final int DEFAULT_DETECT_INTERVAL = 10;
+    /** The shortest detection interval: every frame is searched. */
+    public static final int MIN_DETECT_INTERVAL = 1;
+    /** The longest detection interval. */
+    public static final int MAX_DETECT_INTERVAL = 1000;
+    /** How many searches in a row may miss a face that a tracker follows before it is given up. */
+    public static final int FORGIVEN_MISSES = 4;
+
+    /** The most faces that a new tracker knows at a time; the best are kept. */
+    public static final int DEFAULT_FACE_LIMIT = 8;
+    /** The lowest limit of faces. */
+    public static final int MIN_FACE_LIMIT = 1;
+    /** The highest limit of faces. */
+    public static final int MAX_FACE_LIMIT = 32;
+
+    /** How well a face must fit to be followed, in percent; a face below is reported again once a search finds it. */
+    public static final int DEFAULT_ALIGNMENT_THRESHOLD = 40;
+    /** The lowest alignment threshold: a face is followed wherever it seems to go. */
+    public static final int MIN_ALIGNMENT_THRESHOLD = 0;
+    /** The highest alignment threshold. */
+    public static final int MAX_ALIGNMENT_THRESHOLD = 100;
+
     /** What follows the name of a model file in the name of the landmark model beside it. */
     public static final String LANDMARKS_SUFFIX = ".landmarks";
 
