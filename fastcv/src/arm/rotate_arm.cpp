@@ -1,0 +1,340 @@
+// Rotation of packed images by right angles. With H and W the source's height and width, destination pixel
+// (row r, column c) is source pixel
+//
+//   90:  (H - 1 - c, r)      180: (H - 1 - r, W - 1 - c)      270: (c, W - 1 - r)
+//
+// A pixel moves whole, so that only its size in bytes matters: four bytes are a pixel of four 8-bit channels
+// or of one float. 180 degrees reverses each row. A quarter turn is a transposition, of the source read from
+// its last row up (90) or written from the destination's last row up (270), made of register tiles.
+
+#include "rotate.h"
+
+#include <array>
+
+#include "entry.h"
+#include "kernel_assert.h"
+#include "loop.h"
+#include "tile.h"
+
+namespace HPC::fastcv {
+namespace arm {
+namespace {
+
+// The largest multiple of `block` in `length`.
+constexpr ptrdiff_t wholeBlocks(ptrdiff_t length, int block) { return length / block * block; }
+
+// ---- quarter turns
+
+// A rotation by 90 or 270 degrees. Everything in it is inlined into one function, so that its members are
+// registers there.
+template <int bytes>
+class QuarterTurn {
+ public:
+  TILE_INLINE QuarterTurn(bool upwards, const SourceImage& in, const TargetImage& out)
+      : upwards_(upwards),
+        source_(upwards ? in.data + (in.width - out.height) * bytes : in.data + (in.height - 1) * in.stride),
+        sourceStep_(upwards ? in.stride : -in.stride),
+        target_(out),
+        offsets_(sourceStep_) {}
+
+  // Whole blocks of destination pixels, then the rows below them, then the columns beside them.
+  template <int blockHeight, int blockWidth>
+  TILE_INLINE void run() const {
+    const ptrdiff_t height = wholeBlocks(target_.height, blockHeight);
+    const ptrdiff_t width = wholeBlocks(target_.width, blockWidth);
+    for (ptrdiff_t r = 0; r < height; r += blockHeight) {
+      for (ptrdiff_t c = 0; c < width; c += blockWidth) {
+        area(r, std::integral_constant<int, blockHeight>{}, c, std::integral_constant<int, blockWidth>{});
+      }
+    }
+    const struct {
+      ptrdiff_t top, height, left, width;
+    } rest[] = {{height, target_.height - height, 0, target_.width},
+                {0, height, width, target_.width - width}};
+    KERNEL_ROLLED_LOOP
+    for (const auto& part : rest) {
+      area(part.top, part.height, part.left, part.width);
+    }
+  }
+
+ private:
+  static constexpr TileSize kTile = kLargestTile<bytes>;
+
+  // Destination rows [top, top + height) by columns [left, left + width); `top` is even. The sizes may be
+  // constants.
+  template <typename Height, typename Width>
+  TILE_INLINE void area(ptrdiff_t top, Height height, ptrdiff_t left, Width width) const {
+    // The tiles walk along the source rows, from the lowest of the area's columns up.
+    const ptrdiff_t lowest = upwards_ ? target_.height - top - height : top;
+    const ptrdiff_t first = upwards_ ? top + height - 1 : top;
+    const ptrdiff_t second = upwards_ ? first - 1 : first + 1;
+    const ptrdiff_t step = target_.rows.afterEven + target_.rows.afterOdd;
+    strips<kTile.rows>(source_ + left * sourceStep_ + lowest * bytes, height, target_.height - lowest, width,
+                       RowPair{target_.rows.at(first) + left * bytes, target_.rows.at(second) + left * bytes,
+                               upwards_ ? -step : step});
+  }
+
+  // `width` source rows, in strips of `rows` while as many are left, then in strips of half as many.
+  template <int rows, typename Height, typename Width>
+  TILE_INLINE void strips(const unsigned char* src, Height length, ptrdiff_t readable, Width width,
+                          RowPair out) const {
+    ptrdiff_t left = width;
+    for (; left >= rows; left -= rows) {
+      strip<rows>(src, length, readable, out);
+      src += rows * sourceStep_;
+      out.first += rows * bytes;
+      out.second += rows * bytes;
+    }
+    if constexpr (rows > 1) {
+      strips<rows / 2>(src, length, readable, left, out);
+    }
+  }
+
+  // `length` columns of `rows` source rows. `readable` columns belong to the rotated image.
+  template <int rows, typename Height>
+  TILE_INLINE void strip(const unsigned char* src, Height length, ptrdiff_t readable, RowPair out) const {
+    ptrdiff_t left = length;
+    if constexpr (rows == kTile.rows && kTileReadsPast<bytes> > 0) {
+      readable -= kTileReadsPast<bytes>;
+      for (; left >= kTile.columns && readable >= kTile.columns; left -= kTile.columns) {
+        moveTile<bytes, rows, kTile.columns, true>(src, offsets_, out);
+        src += kTile.columns * bytes;
+        readable -= kTile.columns;
+      }
+    }
+    tiles<rows, kTile.columns>(src, left, out);
+  }
+
+  // `left` columns, in tiles of `columns` while as many are left, then in tiles of half as many.
+  template <int rows, int columns>
+  TILE_INLINE void tiles(const unsigned char* src, ptrdiff_t left, RowPair& out) const {
+    for (; left >= columns; left -= columns) {
+      moveTile<bytes, rows, columns, false>(src, offsets_, out);
+      src += columns * bytes;
+    }
+    if constexpr (columns > 1) {
+      tiles<rows, columns / 2>(src, left, out);
+    }
+  }
+
+  bool upwards_;
+  const unsigned char* source_;
+  ptrdiff_t sourceStep_;
+  TargetImage target_;
+  RowOffsets<kTile.rows> offsets_;
+};
+
+// ---- half turns
+
+// The pixels of a register in reverse order.
+template <int bytes>
+TILE_INLINE uint8x16_t reversed(uint8x16_t v) {
+  if constexpr (bytes == 16) {
+    return v;
+  } else {
+    static constexpr auto kOrder = [] {
+      std::array<unsigned char, 16> order = {};
+      for (int i = 0; i < 16; ++i) {
+        order[i] = static_cast<unsigned char>(16 - bytes - i / bytes * bytes + i % bytes);
+      }
+      return order;
+    }();
+    return vqtbl1q_u8(v, vld1q_u8(kOrder.data()));
+  }
+}
+
+// A walk from the end of a source row down, along the destination row up.
+struct ReversedRow {
+  const unsigned char* src;
+  unsigned char* dst;
+  ptrdiff_t left;  // pixels
+
+  // Has `move(source, destination)` reverse `pixels` pixels of `bytes` bytes at a time, as long as there are
+  // as many.
+  template <int bytes, int pixels, typename Move>
+  TILE_INLINE void each(const Move& move) {
+    KERNEL_ROLLED_LOOP
+    for (; left >= pixels; left -= pixels) {
+      src -= pixels * bytes;
+      move(src, dst);
+      dst += pixels * bytes;
+    }
+  }
+};
+
+// Four registers of pixels, or three where a pixel is a multiple of three bytes: what one load and one store
+// take.
+template <int bytes>
+inline constexpr int kReversedBlock = (bytes % 3 == 0 ? 48 : 64) / bytes;
+
+template <int bytes>
+TILE_INLINE void reverseBlock(const unsigned char* src, unsigned char* dst) {
+  if constexpr (bytes == 3) {
+    const uint8x16x3_t v = vld3q_u8(src);
+    const uint8x16x3_t out = {{reversed<1>(v.val[0]), reversed<1>(v.val[1]), reversed<1>(v.val[2])}};
+    vst3q_u8(dst, out);
+  } else if constexpr (bytes == 12) {
+    const auto turned = [](uint32x4_t v) {
+      return vreinterpretq_u32_u8(reversed<4>(vreinterpretq_u8_u32(v)));
+    };
+    const uint32x4x3_t v = vld3q_u32(reinterpret_cast<const uint32_t*>(src));
+    const uint32x4x3_t out = {{turned(v.val[0]), turned(v.val[1]), turned(v.val[2])}};
+    vst3q_u32(reinterpret_cast<uint32_t*>(dst), out);
+  } else {
+    const uint8x16x4_t v = vld1q_u8_x4(src);
+    const uint8x16x4_t out = {{reversed<bytes>(v.val[3]), reversed<bytes>(v.val[2]),
+                               reversed<bytes>(v.val[1]), reversed<bytes>(v.val[0])}};
+    vst1q_u8_x4(dst, out);
+  }
+}
+
+// Pieces of `size` bytes, down to a single pixel.
+template <int bytes, int size>
+TILE_INLINE void reversePieces(ReversedRow& row) {
+  row.each<bytes, size / bytes>([](const unsigned char* src, unsigned char* dst) TILE_LAMBDA {
+    storeLane<size, 16 / size - 1>(dst, reversed<bytes>(loadBytes<size>(src)));
+  });
+  if constexpr (size > bytes) {
+    reversePieces<bytes, size / 2>(row);
+  }
+}
+
+template <int bytes>
+void reverseRow(ReversedRow row) {
+  // For words a block is six instructions; there the loop itself is worth spreading over many.
+  constexpr int kBlock = kReversedBlock<bytes>;
+  constexpr int kInFlight = bytes == 4 ? 8 : 2;
+  row.each<bytes, kBlock * kInFlight>([](const unsigned char* src, unsigned char* dst) TILE_LAMBDA {
+    detail::unrolled<kInFlight>([&](auto i) TILE_LAMBDA {
+      constexpr ptrdiff_t kSize = kBlock * bytes;
+      reverseBlock<bytes>(src + (kInFlight - 1 - i) * kSize, dst + i * kSize);
+    });
+  });
+  row.each<bytes, kBlock>(reverseBlock<bytes>);
+  if constexpr (bytes % 3 != 0) {
+    reversePieces<bytes, 16>(row);
+  } else {
+    if constexpr (bytes == 3) {
+      row.each<bytes, 8>([](const unsigned char* src, unsigned char* dst) TILE_LAMBDA {
+        const uint8x8x3_t v = vld3_u8(src);
+        const uint8x8x3_t out = {{vrev64_u8(v.val[0]), vrev64_u8(v.val[1]), vrev64_u8(v.val[2])}};
+        vst3_u8(dst, out);
+      });
+    }
+    row.each<bytes, 1>([](const unsigned char* src, unsigned char* dst)
+                           TILE_LAMBDA { memcpy(dst, src, bytes); });
+  }
+}
+
+template <int bytes>
+void halfTurn(const SourceImage& in, const TargetImage& out) {
+  const ptrdiff_t rowSize = out.width * bytes;
+  const unsigned char* const end = in.data + (in.height - 1) * in.stride + in.width * bytes;
+  if (in.stride == rowSize && out.rows.afterEven == rowSize && out.rows.afterOdd == rowSize &&
+      in.width == out.width) {
+    // With nothing between the rows, all of them are one.
+    reverseRow<bytes>({end, out.rows.data, out.height * out.width});
+    return;
+  }
+  for (ptrdiff_t r = 0; r < out.height; ++r) {
+    reverseRow<bytes>({end - r * in.stride, out.rows.at(r), out.width});
+  }
+}
+
+}  // namespace
+
+template <int bytes, int blockHeight, int blockWidth>
+void rotatePixels(int degree, const SourceImage& in, const TargetImage& out) {
+  if (out.height < 1 || out.width < 1) {
+    return;
+  }
+  if (degree == 90 || degree == 270) {
+    QuarterTurn<bytes>(degree == 270, in, out).template run<blockHeight, blockWidth>();
+  } else if (degree == 180) {
+    halfTurn<bytes>(in, out);
+  }
+}
+
+// For the 4:2:0 rotations.
+template void rotatePixels<1, kRotateBlock, kRotateBlock>(int, const SourceImage&, const TargetImage&);
+template void rotatePixels<2, kRotateBlock, kRotateBlock>(int, const SourceImage&, const TargetImage&);
+
+}  // namespace arm
+
+namespace {
+
+// A worker: pixels of `nc` elements of T as so many bytes, strides in elements as bytes.
+template <int degree, typename T, int nc, int blockHeight, int blockWidth>
+inline void rotateImage(int inHeight, int inWidth, int inWidthStride, const T* inData, int outHeight,
+                        int outWidth, int outWidthStride, T* outData) {
+  constexpr ptrdiff_t kSize = sizeof(T);
+  const ptrdiff_t outStride = outWidthStride * kSize;
+  arm::rotatePixels<nc * kSize, blockHeight, blockWidth>(
+      degree, {reinterpret_cast<const unsigned char*>(inData), inWidthStride * kSize, inHeight, inWidth},
+      {{reinterpret_cast<unsigned char*>(outData), outStride, outStride}, outHeight, outWidth});
+}
+
+}  // namespace
+
+template <typename T, int nc, int blockHeight, int blockWidth>
+void imgRotate90degree(int inHeight, int inWidth, int inWidthStride, const T* inData, int outHeight,
+                       int outWidth, int outWidthStride, T* outData) {
+  rotateImage<90, T, nc, blockHeight, blockWidth>(inHeight, inWidth, inWidthStride, inData, outHeight,
+                                                  outWidth, outWidthStride, outData);
+}
+
+template <typename T, int nc, int blockHeight, int blockWidth>
+void imgRotate180degree(int inHeight, int inWidth, int inWidthStride, const T* inData, int outHeight,
+                        int outWidth, int outWidthStride, T* outData) {
+  rotateImage<180, T, nc, blockHeight, blockWidth>(inHeight, inWidth, inWidthStride, inData, outHeight,
+                                                   outWidth, outWidthStride, outData);
+}
+
+template <typename T, int nc, int blockHeight, int blockWidth>
+void imgRotate270degree(int inHeight, int inWidth, int inWidthStride, const T* inData, int outHeight,
+                        int outWidth, int outWidthStride, T* outData) {
+  rotateImage<270, T, nc, blockHeight, blockWidth>(inHeight, inWidth, inWidthStride, inData, outHeight,
+                                                   outWidth, outWidthStride, outData);
+}
+
+template <typename T, int ncSrc, int ncDst, int nc>
+void armRotateNx90degree(int inHeight, int inWidth, int inWidthStride, const T* inData, int outHeight,
+                         int outWidth, int outWidthStride, T* outData, int degree) {
+  // The texts are what the process ends with.
+  KERNEL_ASSERT(arm::kRotatePath, inData != NULL);   // NOLINT(modernize-use-nullptr)
+  KERNEL_ASSERT(arm::kRotatePath, outData != NULL);  // NOLINT(modernize-use-nullptr)
+  // The destination's stride is deliberately not looked at.
+  KERNEL_ASSERT(arm::kRotatePath,
+                inHeight != 0 && inWidth != 0 && inWidthStride != 0 && outHeight != 0 && outWidth != 0);
+  if (degree == 90) {
+    imgRotate90degree<T, nc, arm::kRotateBlock, arm::kRotateBlock>(
+        inHeight, inWidth, inWidthStride, inData, outHeight, outWidth, outWidthStride, outData);
+  } else if (degree == 180) {
+    imgRotate180degree<T, nc, arm::kRotateBlock, arm::kRotateBlock>(
+        inHeight, inWidth, inWidthStride, inData, outHeight, outWidth, outWidthStride, outData);
+  } else {
+    KERNEL_ASSERT(arm::kRotatePath, degree == 90 || degree == 180 || degree == 270);
+    imgRotate270degree<T, nc, arm::kRotateBlock, arm::kRotateBlock>(
+        inHeight, inWidth, inWidthStride, inData, outHeight, outWidth, outWidthStride, outData);
+  }
+}
+
+#define FASTCV_ROTATE_WORKER(name, T, nc)                                                                  \
+  template FASTCV_EXPORTED void name<T, nc, arm::kRotateBlock, arm::kRotateBlock>(int, int, int, const T*, \
+                                                                                  int, int, int, T*);
+#define FASTCV_ROTATE(T, nc)                                                                               \
+  FASTCV_ROTATE_WORKER(imgRotate90degree, T, nc)                                                           \
+  FASTCV_ROTATE_WORKER(imgRotate180degree, T, nc)                                                          \
+  FASTCV_ROTATE_WORKER(imgRotate270degree, T, nc)                                                          \
+  template FASTCV_EXPORTED void armRotateNx90degree<T, nc, nc, nc>(int, int, int, const T*, int, int, int, \
+                                                                   T*, int);
+FASTCV_ROTATE(unsigned char, 1)
+FASTCV_ROTATE(unsigned char, 2)
+FASTCV_ROTATE(unsigned char, 3)
+FASTCV_ROTATE(unsigned char, 4)
+FASTCV_ROTATE(float, 1)
+FASTCV_ROTATE(float, 2)
+FASTCV_ROTATE(float, 3)
+FASTCV_ROTATE(float, 4)
+
+}  // namespace HPC::fastcv
