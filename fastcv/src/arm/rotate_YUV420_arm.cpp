@@ -1,0 +1,109 @@
+// Rotation of whole YUV 4:2:0 frames by right angles: the luma as an image of one-byte pixels; the chroma of
+// a semi-planar frame as one of two-byte pixels, of a planar frame plane by plane.
+//
+// A planar frame (I420) with stride S keeps two chroma rows in a buffer row: row 2k of a plane at the row's
+// start, row 2k + 1 half a width behind it. The U plane begins below the luma rows. The V plane begins where
+// U ends, which is in the middle of a buffer row when the number of chroma rows is odd. With S equal to the
+// width that is plain contiguous I420.
+
+#include <cstdlib>
+#include <cstring>
+#include <memory>
+
+#include "entry.h"
+#include "kernel_assert.h"
+#include "rotate.h"
+
+namespace HPC::fastcv {
+namespace {
+
+using arm::Rows;
+
+template <int bytes>
+void rotatePlane(int degree, const arm::SourceImage& in, const arm::TargetImage& out) {
+  arm::rotatePixels<bytes, arm::kRotateBlock, arm::kRotateBlock>(degree, in, out);
+}
+
+template <typename Byte>
+struct Planes {
+  Rows<Byte> luma;
+  Rows<Byte> u;
+  Rows<Byte> v;
+};
+
+template <typename Byte>
+Planes<Byte> planesOf(Byte* frame, ptrdiff_t stride, int lumaHeight, int width) {
+  const ptrdiff_t half = width / 2;
+  const ptrdiff_t rest = stride - half;
+  const bool inTheMiddle = lumaHeight % 4 / 2 != 0;
+  Byte* const u = frame + lumaHeight * stride;
+  Byte* const v = u + lumaHeight / 4 * stride;
+  return {{frame, stride, stride},
+          {u, half, rest},
+          inTheMiddle ? Rows<Byte>{v + half, rest, half} : Rows<Byte>{v, half, rest}};
+}
+
+struct Free {
+  void operator()(unsigned char* memory) const { free(memory); }
+};
+using Scratch = std::unique_ptr<unsigned char, Free>;
+
+// `height` rows of `width` bytes, packed at `packed`.
+void gather(const Rows<const unsigned char>& rows, int height, int width, unsigned char* packed) {
+  for (int r = 0; r < height; ++r) {
+    memcpy(packed + static_cast<ptrdiff_t>(r) * width, rows.at(r), static_cast<size_t>(width));
+  }
+}
+
+}  // namespace
+
+template <typename T>
+void imgRotate_I420(int inHeight, int inWidth, int inWidthStride, const T* inData, int outHeight,
+                    int outWidth, int outWidthStride, T* outData, int degree) {
+  const int lumaIn = arm::lumaHeightOf(inHeight);
+  const int lumaOut = arm::lumaHeightOf(outHeight);
+  const int chromaHeight = lumaIn / 2;
+  const int chromaWidth = inWidth / 2;
+  const size_t size = static_cast<size_t>(static_cast<ptrdiff_t>(inWidth) * chromaHeight / 2);
+  const Scratch u(static_cast<unsigned char*>(malloc(size)));
+  const Scratch v(static_cast<unsigned char*>(malloc(size)));
+  if (u == nullptr || v == nullptr) {
+    return;
+  }
+  const Planes<const T> in = planesOf(inData, inWidthStride, lumaIn, inWidth);
+  gather(in.u, chromaHeight, chromaWidth, u.get());
+  gather(in.v, chromaHeight, chromaWidth, v.get());
+  const Planes<T> out = planesOf(outData, outWidthStride, lumaOut, outWidth);
+  rotatePlane<1>(degree, {inData, inWidthStride, lumaIn, inWidth}, {out.luma, lumaOut, outWidth});
+  rotatePlane<1>(degree, {u.get(), chromaWidth, chromaHeight, chromaWidth},
+                 {out.u, lumaOut / 2, outWidth / 2});
+  rotatePlane<1>(degree, {v.get(), chromaWidth, chromaHeight, chromaWidth},
+                 {out.v, lumaOut / 2, outWidth / 2});
+}
+
+template <typename T>
+void armRotateNx90degree_YUV420(int inHeight, int inWidth, int inWidthStride, const T* inData, int outHeight,
+                                int outWidth, int outWidthStride, T* outData, int degree, int yuv420_type) {
+  KERNEL_ASSERT(arm::kRotatePath, yuv420_type == 0 || yuv420_type == 1);
+  if (yuv420_type == 1) {
+    imgRotate_I420<T>(inHeight, inWidth, inWidthStride, inData, outHeight, outWidth, outWidthStride, outData,
+                      degree);
+    return;
+  }
+  const ptrdiff_t inStride = inWidthStride;
+  const ptrdiff_t outStride = outWidthStride;
+  const int lumaIn = arm::lumaHeightOf(inHeight);
+  const int lumaOut = arm::lumaHeightOf(outHeight);
+  rotatePlane<1>(degree, {inData, inStride, lumaIn, inWidth},
+                 {{outData, outStride, outStride}, lumaOut, outWidth});
+  rotatePlane<2>(degree, {inData + lumaIn * inStride, inStride, lumaIn / 2, inWidth / 2},
+                 {{outData + lumaOut * outStride, outStride, outStride}, lumaOut / 2, outWidth / 2});
+}
+
+template FASTCV_EXPORTED void imgRotate_I420<unsigned char>(int, int, int, const unsigned char*, int, int,
+                                                            int, unsigned char*, int);
+template FASTCV_EXPORTED void armRotateNx90degree_YUV420<unsigned char>(int, int, int, const unsigned char*,
+                                                                        int, int, int, unsigned char*, int,
+                                                                        int);
+
+}  // namespace HPC::fastcv
