@@ -214,7 +214,8 @@ template <YUV420Type type, typename T, EcoEnv_t env>
 HPCStatus_t rotate_YUV420(const Mat<unsigned char, 1, env>& /*src*/, Mat<unsigned char, 1, env>* /*dst*/,
                           float /*degree*/) {
   static_assert(detail::kNever<type, env>,
-                "HPC::fastcv::rotate_YUV420 has no such instance: unsigned char is its only element type");
+                "HPC::fastcv::rotate_YUV420 has no such instance: FASTCV_YUV420_INSTANCES lists the layouts, "
+                "and unsigned char is the only element type");
   return HPC_INVALID_ARGS;
 }
 
@@ -251,12 +252,35 @@ HPCStatus_t rotate_YUV420(const Mat<unsigned char, 1, env>& /*src*/, Mat<unsigne
   X(float, 3)                      \
   X(float, 4)
 
+// X is given (layout): the instances of `rotate_YUV420`, all of `unsigned char`.
+#define FASTCV_YUV420_INSTANCES(X) \
+  X(YUV420_NV21)                   \
+  X(YUV420_NV12)                   \
+  X(YUV420_I420)
+
 #define FASTCV_DECLARE_CVT_COLOR(type, T, ncSrc, ncDst)                                          \
   template <>                                                                                    \
   HPCStatus_t cvtColor<type, T, ncSrc, T, ncDst, ECO_ENV_ARM>(const Mat<T, ncSrc, ECO_ENV_ARM>&, \
                                                               Mat<T, ncDst, ECO_ENV_ARM>*);
 FASTCV_CVT_COLOR_INSTANCES(FASTCV_DECLARE_CVT_COLOR)
 #undef FASTCV_DECLARE_CVT_COLOR
+
+#define FASTCV_DECLARE_PACKED(T, nc)                                                                       \
+  template <>                                                                                              \
+  HPCStatus_t crop<T, nc, T, nc, nc, ECO_ENV_ARM>(const Mat<T, nc, ECO_ENV_ARM>&, Point2_<int>, T,         \
+                                                  Mat<T, nc, ECO_ENV_ARM>*);                               \
+  template <>                                                                                              \
+  HPCStatus_t rotate<T, nc, nc, nc, ECO_ENV_ARM>(const Mat<T, nc, ECO_ENV_ARM>&, Mat<T, nc, ECO_ENV_ARM>*, \
+                                                 float);
+FASTCV_PACKED_INSTANCES(FASTCV_DECLARE_PACKED)
+#undef FASTCV_DECLARE_PACKED
+
+#define FASTCV_DECLARE_ROTATE_YUV420(type)                                                               \
+  template <>                                                                                            \
+  HPCStatus_t rotate_YUV420<type, unsigned char, ECO_ENV_ARM>(const Mat<unsigned char, 1, ECO_ENV_ARM>&, \
+                                                              Mat<unsigned char, 1, ECO_ENV_ARM>*, float);
+FASTCV_YUV420_INSTANCES(FASTCV_DECLARE_ROTATE_YUV420)
+#undef FASTCV_DECLARE_ROTATE_YUV420
 
 }  // namespace HPC::fastcv
 
