@@ -78,12 +78,82 @@ void addConversion(std::vector<Operation>& operations, const char* enumerator) {
        }});
 }
 
+// Adds what one call does to a picture of `nc` channels of T, `upright` when the result has its shape. `call`
+// is given the two images.
+template <typename T, int nc, typename Call>
+void addPacked(std::vector<Operation>& operations, const std::string& name, bool upright, const Call& call) {
+  const std::string suffix = (sizeof(T) == 1 ? "-u8x" : "-f32x") + std::to_string(nc);
+  operations.push_back({name + suffix, "fastcv", 2.0 * nc * sizeof(T), [=](Size size) {
+                          const auto src = samples<T>(size.pixels() * nc);
+                          const auto dst = samples<T>(size.pixels() * nc);
+                          return [=] {
+                            const Image<T, nc> from(size.width, size.height, src.get());
+                            Image<T, nc> to(upright ? size.width : size.height,
+                                            upright ? size.height : size.width, dst.get());
+                            call(from, to);
+                          };
+                        }});
+}
+
+// Rotations by all angles, of any number of channels: through the kernel, as the front-end lacks two.
+template <typename T, int nc>
+void addRotations(std::vector<Operation>& operations) {
+  for (const int degree : {90, 180, 270}) {
+    addPacked<T, nc>(
+        operations, "rotate" + std::to_string(degree), degree == 180, [degree](const auto& from, auto& to) {
+          armRotateNx90degree<T, nc, nc, nc>(from.height, from.width, from.width * nc, from.data, to.height,
+                                             to.width, to.width * nc, to.data, degree);
+        });
+  }
+}
+
+// Crops of the whole picture: copies, and samples multiplied by a whole factor.
+template <typename T, int nc>
+void addCrops(std::vector<Operation>& operations) {
+  for (const int ratio : {1, 2}) {
+    addPacked<T, nc>(
+        operations, ratio == 1 ? "crop" : "crop-times-2", true, [ratio](const auto& from, auto& to) {
+          if (crop<T, nc, T, nc, nc, ECO_ENV_ARM>(from, {0, 0}, static_cast<T>(ratio), &to) != HPC_SUCCESS) {
+            std::abort();
+          }
+        });
+  }
+}
+
+template <YUV420Type type>
+void addFrameRotations(std::vector<Operation>& operations, const std::string& layout) {
+  for (const int degree : {90, 180, 270}) {
+    operations.push_back({"rotate" + std::to_string(degree) + "-" + layout, "fastcv", 3, [=](Size size) {
+                            const auto src = samples<unsigned char>(size.pixels() * 3 / 2);
+                            const auto dst = samples<unsigned char>(size.pixels() * 3 / 2);
+                            return [=] {
+                              const Size out = degree == 180 ? size : Size{size.height, size.width};
+                              const Image<unsigned char, 1> from(size.width, size.height * 3 / 2, src.get());
+                              Image<unsigned char, 1> to(out.width, out.height * 3 / 2, dst.get());
+                              if (rotate_YUV420<type, unsigned char, ECO_ENV_ARM>(
+                                      from, &to, static_cast<float>(degree)) != HPC_SUCCESS) {
+                                std::abort();
+                              }
+                            };
+                          }});
+  }
+}
+
 }  // namespace
 
 void addFastcv(std::vector<Operation>& operations) {
 #define BENCH_CONVERSION(type, T, ncSrc, ncDst) addConversion<type, T, ncSrc, ncDst>(operations, #type);
   FASTCV_CVT_COLOR_INSTANCES(BENCH_CONVERSION)
 #undef BENCH_CONVERSION
+#define BENCH_PACKED(T, nc)        \
+  addRotations<T, nc>(operations); \
+  addCrops<T, nc>(operations);
+  FASTCV_PACKED_INSTANCES(BENCH_PACKED)
+#undef BENCH_PACKED
+  addRotations<unsigned char, 2>(operations);
+  addRotations<float, 2>(operations);
+  addFrameRotations<YUV420_NV21>(operations, "NV21");
+  addFrameRotations<YUV420_I420>(operations, "I420");
 }
 
 }  // namespace bench
