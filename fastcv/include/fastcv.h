@@ -241,7 +241,12 @@ HPCStatus_t rotate_YUV420(const Mat<unsigned char, 1, env>& /*src*/, Mat<unsigne
   X(CVT_RGB2NV12, unsigned char, 3, 1) \
   X(CVT_RGB2NV12, unsigned char, 4, 1) \
   X(CVT_NV122RGB, unsigned char, 1, 3) \
-  X(CVT_NV122RGB, unsigned char, 1, 4)
+  X(CVT_NV122RGB, unsigned char, 1, 4) \
+  X(CVT_BGR2I420, unsigned char, 3, 1) \
+  X(CVT_BGR2I420, unsigned char, 4, 1) \
+  X(CVT_I4202BGR, unsigned char, 1, 3) \
+  X(CVT_I4202BGR, unsigned char, 1, 4) \
+  X(CVT_YUV2GRAY, unsigned char, 1, 1)
 
 // X is given (element type, channels): the instances of `crop` and `rotate`.
 #define FASTCV_PACKED_INSTANCES(X) \

@@ -1,0 +1,39 @@
+// The gray image of a YUV 4:2:0 buffer: its luma plane, which every layout has first.
+
+#include <cstddef>
+#include <cstring>
+
+#include "kernel_assert.h"
+#include "kernels.h"
+
+namespace HPC::fastcv {
+namespace {
+
+constexpr char kSource[] = "fastcv/src/arm/YUV_GRAY_arm";
+
+void YUV2Gray(int height, int width, ptrdiff_t srcStride, const unsigned char* src, ptrdiff_t dstStride,
+              unsigned char* dst) {
+  if (width < 1) {
+    return;
+  }
+  for (ptrdiff_t row = 0; row < height; ++row) {
+    memcpy(dst + row * dstStride, src + row * srcStride, static_cast<size_t>(width));
+  }
+}
+
+}  // namespace
+
+template <typename Tsrc, int ncSrc, typename Tdst, int ncDst>
+void armYUV2GRAYImage(int height, int width, int inWidthStride, const Tsrc* inData, int outWidthStride,
+                      Tdst* outData) {
+  // The messages are the expressions as written.
+  KERNEL_ASSERT(kSource, inData != NULL);   // NOLINT(modernize-use-nullptr)
+  KERNEL_ASSERT(kSource, outData != NULL);  // NOLINT(modernize-use-nullptr)
+  KERNEL_ASSERT(kSource, height != 0 && width != 0 && inWidthStride != 0 && outWidthStride != 0);
+  YUV2Gray(height, width, inWidthStride, inData, outWidthStride, outData);
+}
+
+template __attribute__((visibility("default"))) void armYUV2GRAYImage<unsigned char, 1, unsigned char, 1>(
+    int, int, int, const unsigned char*, int, unsigned char*);
+
+}  // namespace HPC::fastcv
