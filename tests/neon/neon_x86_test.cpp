@@ -11,6 +11,8 @@
 
 namespace {
 
+using HPC::fastcv::arm::roundingShiftToBytes;
+
 constexpr int kTimes = 20000;
 
 template <typename V>
@@ -169,6 +171,30 @@ WIDENING(s16, int16x8_t, int16x4_t, int32x4_t)
 WIDENING_BY_SCALAR(u16, uint16x8_t, uint16x4_t, uint32x4_t)
 WIDENING_BY_SCALAR(s16, int16x8_t, int16x4_t, int32x4_t)
 
+#define PRODUCTS(t, V)                                               \
+  TEST(Products, t) {                                                \
+    for (int i = 0; i < kTimes; ++i) {                               \
+      const auto c = random<V>();                                    \
+      const auto a = random<V>();                                    \
+      const auto b = random<V>()[0];                                 \
+      EXPECT_SAME(vmulq_n_##t(a, b), simde_vmulq_n_##t(a, b));       \
+      EXPECT_SAME(vmlaq_n_##t(c, a, b), simde_vmlaq_n_##t(c, a, b)); \
+    }                                                                \
+  }
+
+PRODUCTS(u16, uint16x8_t)
+PRODUCTS(s16, int16x8_t)
+
+// The functions of neon.h that narrow two vectors into one, of lanes whose results are about a byte.
+#define NARROWING_PAIRS(t, V, narrow, n)                                                         \
+  TEST(NarrowingPairs, t##_by_##n) {                                                             \
+    forEachVector<V>([](V wide) {                                                                \
+      const V a = wide >> (8 - n);                                                               \
+      const V b = random<V>() >> (8 - n);                                                        \
+      EXPECT_SAME(roundingShiftToBytes<n>(a, b), simde_vcombine_u8(narrow(a, n), narrow(b, n))); \
+    });                                                                                          \
+  }
+
 // Vectors to narrow: with 16-bit lanes every value that there is, with wider ones random ones.
 template <typename V, typename F>
 void forEachVector(const F& f) {
@@ -273,6 +299,9 @@ BY_9_TO_16(NARROWING_SHIFTS, s32, int32x4_t, int16x4_t, s16)
 BY_1_TO_8(NARROWING_SHIFTS_TO_UNSIGNED, s16, int16x8_t, uint8x8_t, u8)
 BY_1_TO_8(NARROWING_SHIFTS_TO_UNSIGNED, s32, int32x4_t, uint16x4_t, u16)
 BY_9_TO_16(NARROWING_SHIFTS_TO_UNSIGNED, s32, int32x4_t, uint16x4_t, u16)
+
+BY_1_TO_8(NARROWING_PAIRS, s16, int16x8_t, simde_vqrshrun_n_s16)
+BY_1_TO_8(NARROWING_PAIRS, u16, uint16x8_t, simde_vqrshrn_n_u16)
 
 #define ROUNDING_SHIFTS(t, V, n)                                       \
   TEST(RoundingShifts, t##_by_##n) {                                   \

@@ -18,6 +18,14 @@
 
 namespace HPC::fastcv::arm {
 
+/// Whether several blocks at a time are worth their registers: not with the sixteen of x86-64, whose cores
+/// look ahead far enough by themselves.
+#if defined(__ARM_NEON)
+inline constexpr bool kBlocksInFlightPay = true;
+#else
+inline constexpr bool kBlocksInFlightPay = false;
+#endif
+
 /// A number of blocks, as a type: `block(x, Blocks<2>{})` handles two neighbouring blocks at once.
 template <int n>
 using Blocks = std::integral_constant<int, n>;
@@ -35,7 +43,7 @@ enum class Tail {
 template <int kBlock, int kInFlight, int kStep, typename Block, typename Step>
 inline void walk(ptrdiff_t length, Tail tail, const Block& block, const Step& step) {
   ptrdiff_t x = 0;
-  if constexpr (kInFlight > 1) {
+  if constexpr (kInFlight > 1 && kBlocksInFlightPay) {
     for (; x <= length - kBlock * kInFlight; x += kBlock * kInFlight) {
       block(x, Blocks<kInFlight>{});
     }

@@ -49,13 +49,20 @@ inline constexpr int kBits = 8 * static_cast<int>(sizeof(Element<V>));
 template <typename V>
 inline constexpr bool kSigned = std::is_signed_v<Element<V>>;
 
-// A vector as a register. 8-byte vectors lie in the lower half, with zeros above.
+// A vector as a register. 8-byte vectors lie in the lower half; what is above is not defined.
 template <typename V>
 inline __m128i m(V v) {
-  if constexpr (sizeof(V) == 8) {
-    return _mm_cvtsi64_si128(std::bit_cast<int64_t>(v));
-  } else {
+  if constexpr (sizeof(V) == 16) {
     return std::bit_cast<__m128i>(v);
+  } else {
+#if defined(__clang__)
+    return _mm_cvtsi64_si128(std::bit_cast<int64_t>(v));
+#else
+    // It is in such a register already; GCC would spend an instruction on clearing the upper half.
+    __m128i x;
+    asm("" : "=x"(x) : "0"(v));
+    return x;
+#endif
   }
 }
 // And back: an 8-byte vector is the lower half.
@@ -79,6 +86,15 @@ inline __m128i load8(const void* p) { return _mm_loadl_epi64(static_cast<const _
 inline void store(void* p, __m128i x) { _mm_storeu_si128(static_cast<__m128i*>(p), x); }
 inline void store8(void* p, __m128i x) { _mm_storel_epi64(static_cast<__m128i*>(p), x); }
 
+// A constant in a register or in memory. GCC would rather make it anew, in a loop time and again.
+template <typename V>
+inline V kept(V v) {
+#if !defined(__clang__)
+  asm("" : "+x"(v));
+#endif
+  return v;
+}
+
 // ---- widening
 
 template <typename H>
@@ -89,18 +105,55 @@ inline Wide<H> movl(H a) {
     return as<Wide<H>>(kSigned<H> ? _mm_cvtepi16_epi32(m(a)) : _mm_cvtepu16_epi32(m(a)));
   }
 }
+// The upper half widened.
+template <typename V>
+inline Wide<V> movlHigh(V a) {
+  const __m128i zero = _mm_setzero_si128();
+  if constexpr (!kSigned<V>) {
+    return as<Wide<V>>(kBits<V> == 8 ? _mm_unpackhi_epi8(m(a), zero) : _mm_unpackhi_epi16(m(a), zero));
+  } else {
+    return movl(high(a));
+  }
+}
+
+// A product. With a known constant, GCC would make several shifts and additions of it.
+template <typename V>
+inline V product(V a, V b) {
+  return a * kept(b);
+}
+template <typename V>
+inline V product(V a, Element<V> b) {
+  return product(a, V{} + b);
+}
+
+// Products of 16-bit lanes, the lower and the upper four.
+template <typename V>
+inline __m128i upperProducts(V a, V b) {
+  return kSigned<V> ? _mm_mulhi_epi16(m(a), m(b)) : _mm_mulhi_epu16(m(a), m(b));
+}
 template <typename H>
 inline Wide<H> mull(H a, H b) {
   if constexpr (kBits<H> == 8) {
-    return movl(a) * movl(b);
+    return product(movl(a), movl(b));
   } else {
-    const __m128i upper = kSigned<H> ? _mm_mulhi_epi16(m(a), m(b)) : _mm_mulhi_epu16(m(a), m(b));
-    return as<Wide<H>>(_mm_unpacklo_epi16(_mm_mullo_epi16(m(a), m(b)), upper));
+    return as<Wide<H>>(_mm_unpacklo_epi16(_mm_mullo_epi16(m(a), m(b)), upperProducts(a, b)));
   }
 }
 template <typename H>
 inline Wide<H> mull(H a, Element<H> b) {
   return mull(a, H{} + b);
+}
+template <typename V>
+inline Wide<V> mullHigh(V a, V b) {
+  if constexpr (kBits<V> == 8) {
+    return product(movlHigh(a), movlHigh(b));
+  } else {
+    return as<Wide<V>>(_mm_unpackhi_epi16(_mm_mullo_epi16(m(a), m(b)), upperProducts(a, b)));
+  }
+}
+template <typename V>
+inline Wide<V> mullHigh(V a, Element<V> b) {
+  return mullHigh(a, V{} + b);
 }
 
 // ---- narrowing
@@ -114,7 +167,7 @@ inline __m128i packed(V a) {
 template <typename V>
 inline Narrow<V> lowerHalves(V a) {
   constexpr auto kLower = static_cast<Element<V>>((int64_t{1} << (kBits<V> / 2)) - 1);
-  return as<Narrow<V>>(packed(a & kLower));
+  return as<Narrow<V>>(packed(a & kept(V{} + kLower)));
 }
 template <typename V>
 inline Narrow<V> upperHalves(V a) {
@@ -147,7 +200,7 @@ inline V roundingShift(V a) {
     return as<V>(_mm_avg_epu8(shifted, _mm_setzero_si128()));
   } else if constexpr (kBits<V> == 16 && kSigned<V>) {
     // (a * 2^(15 - n) + 2^14) >> 15
-    return as<V>(_mm_mulhrs_epi16(m(a), _mm_set1_epi16(static_cast<int16_t>(1 << (15 - n)))));
+    return as<V>(_mm_mulhrs_epi16(m(a), kept(_mm_set1_epi16(static_cast<int16_t>(1 << (15 - n))))));
   } else if constexpr (kBits<V> == 16) {
     return as<V>(_mm_avg_epu16(_mm_srli_epi16(m(a), n - 1), _mm_setzero_si128()));
   } else {
@@ -163,6 +216,13 @@ inline Narrow<V> roundingShiftToLowerHalves(V a) {
 template <typename V>
 inline Narrow<V> roundedUpperHalves(V a) {
   return upperHalves(a + static_cast<Element<V>>(1 << (kBits<V> / 2 - 1)));
+}
+
+// Two vectors in one, limited to unsigned bytes; unsigned lanes below 2^15.
+template <typename V>
+inline uint8x16_t packedBytes(V low, V high) {
+  static_assert(kBits<V> == 16);
+  return as<uint8x16_t>(_mm_packus_epi16(m(low), m(high)));
 }
 
 // A narrowed vector behind a lower half: what the "high" forms do.
@@ -291,14 +351,29 @@ inline __m128i sorted(__m128i x) {
   return _mm_shuffle_epi8(x, load(kOrder.data()));
 }
 
+inline __m256i load32(const void* p) { return _mm256_loadu_si256(static_cast<const __m256i*>(p)); }
+inline __m256i sorted4(__m256i x) {
+  static constexpr auto kOrder = bytesOf([](int i) { return i % 4 * 4 + i / 4; });
+  return _mm256_shuffle_epi8(x, _mm256_broadcastsi128_si256(load(kOrder.data())));
+}
+
 template <int bits, typename Vectors>
 inline Vectors loadFour(const void* p) {
   const auto* bytes = static_cast<const uint8_t*>(p);
-  Four v = {{load(bytes), load(bytes + 16), load(bytes + 32), load(bytes + 48)}};
   if constexpr (bits == 8) {
-    v = {{sorted<4>(v.x[0]), sorted<4>(v.x[1]), sorted<4>(v.x[2]), sorted<4>(v.x[3])}};
+    // Eight pixels a register: bytes sorted in each half, then double words so that each channel's eight lie
+    // together.
+    const __m256i order = _mm256_setr_epi32(0, 4, 1, 5, 2, 6, 3, 7);
+    const __m256i first = _mm256_permutevar8x32_epi32(sorted4(load32(bytes)), order);
+    const __m256i last = _mm256_permutevar8x32_epi32(sorted4(load32(bytes + 32)), order);
+    const __m256i c02 = _mm256_unpacklo_epi64(first, last);
+    const __m256i c13 = _mm256_unpackhi_epi64(first, last);
+    return std::bit_cast<Vectors>(Four{{_mm256_castsi256_si128(c02), _mm256_castsi256_si128(c13),
+                                        _mm256_extracti128_si256(c02, 1), _mm256_extracti128_si256(c13, 1)}});
+  } else {
+    return std::bit_cast<Vectors>(
+        transposed({{load(bytes), load(bytes + 16), load(bytes + 32), load(bytes + 48)}}));
   }
-  return std::bit_cast<Vectors>(transposed(v));
 }
 template <int bits, typename Vectors>
 inline void storeFour(void* p, const Vectors& vectors) {
@@ -465,147 +540,157 @@ inline void storeRow(T* p, const Vectors& v) {
 #undef vmovl_u8
 #define vmovl_u8(a) neon_x86::movl(a)
 #undef vmovl_high_u8
-#define vmovl_high_u8(a) neon_x86::movl(neon_x86::high(a))
+#define vmovl_high_u8(a) neon_x86::movlHigh(a)
 #undef vmull_u8
 #define vmull_u8(a, b) neon_x86::mull(a, b)
 #undef vmull_high_u8
-#define vmull_high_u8(a, b) neon_x86::mull(neon_x86::high(a), neon_x86::high(b))
+#define vmull_high_u8(a, b) neon_x86::mullHigh(a, b)
 #undef vmlal_u8
 #define vmlal_u8(c, a, b) ((c) + neon_x86::mull(a, b))
 #undef vmlal_high_u8
-#define vmlal_high_u8(c, a, b) ((c) + neon_x86::mull(neon_x86::high(a), neon_x86::high(b)))
+#define vmlal_high_u8(c, a, b) ((c) + neon_x86::mullHigh(a, b))
 #undef vmlsl_u8
 #define vmlsl_u8(c, a, b) ((c) - neon_x86::mull(a, b))
 #undef vmlsl_high_u8
-#define vmlsl_high_u8(c, a, b) ((c) - neon_x86::mull(neon_x86::high(a), neon_x86::high(b)))
+#define vmlsl_high_u8(c, a, b) ((c) - neon_x86::mullHigh(a, b))
 #undef vaddl_u8
 #define vaddl_u8(a, b) (neon_x86::movl(a) + neon_x86::movl(b))
 #undef vaddl_high_u8
-#define vaddl_high_u8(a, b) (neon_x86::movl(neon_x86::high(a)) + neon_x86::movl(neon_x86::high(b)))
+#define vaddl_high_u8(a, b) (neon_x86::movlHigh(a) + neon_x86::movlHigh(b))
 #undef vaddw_u8
 #define vaddw_u8(c, b) ((c) + neon_x86::movl(b))
 #undef vaddw_high_u8
-#define vaddw_high_u8(c, b) ((c) + neon_x86::movl(neon_x86::high(b)))
+#define vaddw_high_u8(c, b) ((c) + neon_x86::movlHigh(b))
 #undef vsubl_u8
 #define vsubl_u8(a, b) (neon_x86::movl(a) - neon_x86::movl(b))
 #undef vsubl_high_u8
-#define vsubl_high_u8(a, b) (neon_x86::movl(neon_x86::high(a)) - neon_x86::movl(neon_x86::high(b)))
+#define vsubl_high_u8(a, b) (neon_x86::movlHigh(a) - neon_x86::movlHigh(b))
 #undef vsubw_u8
 #define vsubw_u8(c, b) ((c) - neon_x86::movl(b))
 #undef vsubw_high_u8
-#define vsubw_high_u8(c, b) ((c) - neon_x86::movl(neon_x86::high(b)))
+#define vsubw_high_u8(c, b) ((c) - neon_x86::movlHigh(b))
 #undef vmovl_s8
 #define vmovl_s8(a) neon_x86::movl(a)
 #undef vmovl_high_s8
-#define vmovl_high_s8(a) neon_x86::movl(neon_x86::high(a))
+#define vmovl_high_s8(a) neon_x86::movlHigh(a)
 #undef vmull_s8
 #define vmull_s8(a, b) neon_x86::mull(a, b)
 #undef vmull_high_s8
-#define vmull_high_s8(a, b) neon_x86::mull(neon_x86::high(a), neon_x86::high(b))
+#define vmull_high_s8(a, b) neon_x86::mullHigh(a, b)
 #undef vmlal_s8
 #define vmlal_s8(c, a, b) ((c) + neon_x86::mull(a, b))
 #undef vmlal_high_s8
-#define vmlal_high_s8(c, a, b) ((c) + neon_x86::mull(neon_x86::high(a), neon_x86::high(b)))
+#define vmlal_high_s8(c, a, b) ((c) + neon_x86::mullHigh(a, b))
 #undef vmlsl_s8
 #define vmlsl_s8(c, a, b) ((c) - neon_x86::mull(a, b))
 #undef vmlsl_high_s8
-#define vmlsl_high_s8(c, a, b) ((c) - neon_x86::mull(neon_x86::high(a), neon_x86::high(b)))
+#define vmlsl_high_s8(c, a, b) ((c) - neon_x86::mullHigh(a, b))
 #undef vaddl_s8
 #define vaddl_s8(a, b) (neon_x86::movl(a) + neon_x86::movl(b))
 #undef vaddl_high_s8
-#define vaddl_high_s8(a, b) (neon_x86::movl(neon_x86::high(a)) + neon_x86::movl(neon_x86::high(b)))
+#define vaddl_high_s8(a, b) (neon_x86::movlHigh(a) + neon_x86::movlHigh(b))
 #undef vaddw_s8
 #define vaddw_s8(c, b) ((c) + neon_x86::movl(b))
 #undef vaddw_high_s8
-#define vaddw_high_s8(c, b) ((c) + neon_x86::movl(neon_x86::high(b)))
+#define vaddw_high_s8(c, b) ((c) + neon_x86::movlHigh(b))
 #undef vsubl_s8
 #define vsubl_s8(a, b) (neon_x86::movl(a) - neon_x86::movl(b))
 #undef vsubl_high_s8
-#define vsubl_high_s8(a, b) (neon_x86::movl(neon_x86::high(a)) - neon_x86::movl(neon_x86::high(b)))
+#define vsubl_high_s8(a, b) (neon_x86::movlHigh(a) - neon_x86::movlHigh(b))
 #undef vsubw_s8
 #define vsubw_s8(c, b) ((c) - neon_x86::movl(b))
 #undef vsubw_high_s8
-#define vsubw_high_s8(c, b) ((c) - neon_x86::movl(neon_x86::high(b)))
+#define vsubw_high_s8(c, b) ((c) - neon_x86::movlHigh(b))
 #undef vmovl_u16
 #define vmovl_u16(a) neon_x86::movl(a)
 #undef vmovl_high_u16
-#define vmovl_high_u16(a) neon_x86::movl(neon_x86::high(a))
+#define vmovl_high_u16(a) neon_x86::movlHigh(a)
 #undef vmull_u16
 #define vmull_u16(a, b) neon_x86::mull(a, b)
 #undef vmull_high_u16
-#define vmull_high_u16(a, b) neon_x86::mull(neon_x86::high(a), neon_x86::high(b))
+#define vmull_high_u16(a, b) neon_x86::mullHigh(a, b)
 #undef vmlal_u16
 #define vmlal_u16(c, a, b) ((c) + neon_x86::mull(a, b))
 #undef vmlal_high_u16
-#define vmlal_high_u16(c, a, b) ((c) + neon_x86::mull(neon_x86::high(a), neon_x86::high(b)))
+#define vmlal_high_u16(c, a, b) ((c) + neon_x86::mullHigh(a, b))
 #undef vmlsl_u16
 #define vmlsl_u16(c, a, b) ((c) - neon_x86::mull(a, b))
 #undef vmlsl_high_u16
-#define vmlsl_high_u16(c, a, b) ((c) - neon_x86::mull(neon_x86::high(a), neon_x86::high(b)))
+#define vmlsl_high_u16(c, a, b) ((c) - neon_x86::mullHigh(a, b))
 #undef vaddl_u16
 #define vaddl_u16(a, b) (neon_x86::movl(a) + neon_x86::movl(b))
 #undef vaddl_high_u16
-#define vaddl_high_u16(a, b) (neon_x86::movl(neon_x86::high(a)) + neon_x86::movl(neon_x86::high(b)))
+#define vaddl_high_u16(a, b) (neon_x86::movlHigh(a) + neon_x86::movlHigh(b))
 #undef vaddw_u16
 #define vaddw_u16(c, b) ((c) + neon_x86::movl(b))
 #undef vaddw_high_u16
-#define vaddw_high_u16(c, b) ((c) + neon_x86::movl(neon_x86::high(b)))
+#define vaddw_high_u16(c, b) ((c) + neon_x86::movlHigh(b))
 #undef vsubl_u16
 #define vsubl_u16(a, b) (neon_x86::movl(a) - neon_x86::movl(b))
 #undef vsubl_high_u16
-#define vsubl_high_u16(a, b) (neon_x86::movl(neon_x86::high(a)) - neon_x86::movl(neon_x86::high(b)))
+#define vsubl_high_u16(a, b) (neon_x86::movlHigh(a) - neon_x86::movlHigh(b))
 #undef vsubw_u16
 #define vsubw_u16(c, b) ((c) - neon_x86::movl(b))
 #undef vsubw_high_u16
-#define vsubw_high_u16(c, b) ((c) - neon_x86::movl(neon_x86::high(b)))
+#define vsubw_high_u16(c, b) ((c) - neon_x86::movlHigh(b))
 #undef vmovl_s16
 #define vmovl_s16(a) neon_x86::movl(a)
 #undef vmovl_high_s16
-#define vmovl_high_s16(a) neon_x86::movl(neon_x86::high(a))
+#define vmovl_high_s16(a) neon_x86::movlHigh(a)
 #undef vmull_s16
 #define vmull_s16(a, b) neon_x86::mull(a, b)
 #undef vmull_high_s16
-#define vmull_high_s16(a, b) neon_x86::mull(neon_x86::high(a), neon_x86::high(b))
+#define vmull_high_s16(a, b) neon_x86::mullHigh(a, b)
 #undef vmlal_s16
 #define vmlal_s16(c, a, b) ((c) + neon_x86::mull(a, b))
 #undef vmlal_high_s16
-#define vmlal_high_s16(c, a, b) ((c) + neon_x86::mull(neon_x86::high(a), neon_x86::high(b)))
+#define vmlal_high_s16(c, a, b) ((c) + neon_x86::mullHigh(a, b))
 #undef vmlsl_s16
 #define vmlsl_s16(c, a, b) ((c) - neon_x86::mull(a, b))
 #undef vmlsl_high_s16
-#define vmlsl_high_s16(c, a, b) ((c) - neon_x86::mull(neon_x86::high(a), neon_x86::high(b)))
+#define vmlsl_high_s16(c, a, b) ((c) - neon_x86::mullHigh(a, b))
 #undef vaddl_s16
 #define vaddl_s16(a, b) (neon_x86::movl(a) + neon_x86::movl(b))
 #undef vaddl_high_s16
-#define vaddl_high_s16(a, b) (neon_x86::movl(neon_x86::high(a)) + neon_x86::movl(neon_x86::high(b)))
+#define vaddl_high_s16(a, b) (neon_x86::movlHigh(a) + neon_x86::movlHigh(b))
 #undef vaddw_s16
 #define vaddw_s16(c, b) ((c) + neon_x86::movl(b))
 #undef vaddw_high_s16
-#define vaddw_high_s16(c, b) ((c) + neon_x86::movl(neon_x86::high(b)))
+#define vaddw_high_s16(c, b) ((c) + neon_x86::movlHigh(b))
 #undef vsubl_s16
 #define vsubl_s16(a, b) (neon_x86::movl(a) - neon_x86::movl(b))
 #undef vsubl_high_s16
-#define vsubl_high_s16(a, b) (neon_x86::movl(neon_x86::high(a)) - neon_x86::movl(neon_x86::high(b)))
+#define vsubl_high_s16(a, b) (neon_x86::movlHigh(a) - neon_x86::movlHigh(b))
 #undef vsubw_s16
 #define vsubw_s16(c, b) ((c) - neon_x86::movl(b))
 #undef vsubw_high_s16
-#define vsubw_high_s16(c, b) ((c) - neon_x86::movl(neon_x86::high(b)))
+#define vsubw_high_s16(c, b) ((c) - neon_x86::movlHigh(b))
 #undef vmull_n_u16
 #define vmull_n_u16(a, b) neon_x86::mull(a, b)
 #undef vmull_high_n_u16
-#define vmull_high_n_u16(a, b) neon_x86::mull(neon_x86::high(a), b)
+#define vmull_high_n_u16(a, b) neon_x86::mullHigh(a, b)
 #undef vmlal_n_u16
 #define vmlal_n_u16(c, a, b) ((c) + neon_x86::mull(a, b))
 #undef vmlal_high_n_u16
-#define vmlal_high_n_u16(c, a, b) ((c) + neon_x86::mull(neon_x86::high(a), b))
+#define vmlal_high_n_u16(c, a, b) ((c) + neon_x86::mullHigh(a, b))
 #undef vmull_n_s16
 #define vmull_n_s16(a, b) neon_x86::mull(a, b)
 #undef vmull_high_n_s16
-#define vmull_high_n_s16(a, b) neon_x86::mull(neon_x86::high(a), b)
+#define vmull_high_n_s16(a, b) neon_x86::mullHigh(a, b)
 #undef vmlal_n_s16
 #define vmlal_n_s16(c, a, b) ((c) + neon_x86::mull(a, b))
 #undef vmlal_high_n_s16
-#define vmlal_high_n_s16(c, a, b) ((c) + neon_x86::mull(neon_x86::high(a), b))
+#define vmlal_high_n_s16(c, a, b) ((c) + neon_x86::mullHigh(a, b))
+
+// products
+#undef vmulq_n_s16
+#define vmulq_n_s16(a, b) neon_x86::product(a, b)
+#undef vmulq_n_u16
+#define vmulq_n_u16(a, b) neon_x86::product(a, b)
+#undef vmlaq_n_s16
+#define vmlaq_n_s16(c, a, b) ((c) + neon_x86::product(a, b))
+#undef vmlaq_n_u16
+#define vmlaq_n_u16(c, a, b) ((c) + neon_x86::product(a, b))
 
 // narrowing
 #undef vmovn_u16
