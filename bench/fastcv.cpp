@@ -5,6 +5,7 @@
 #include <cctype>
 #include <string_view>
 
+#include "brightness.h"
 #include "kernels.h"
 #include "operation.h"
 
@@ -78,65 +79,82 @@ void addConversion(std::vector<Operation>& operations, const char* enumerator) {
        }});
 }
 
-// Adds what one call does to a picture of `nc` channels of T, `upright` when the result has its shape. `call`
-// is given the two images.
-template <typename T, int nc, typename Call>
-void addPacked(std::vector<Operation>& operations, const std::string& name, bool upright, const Call& call) {
-  const std::string suffix = (sizeof(T) == 1 ? "-u8x" : "-f32x") + std::to_string(nc);
-  operations.push_back({name + suffix, "fastcv", 2.0 * nc * sizeof(T), [=](Size size) {
-                          const auto src = samples<T>(size.pixels() * nc);
+// "u8x3", "f32x1"
+template <typename T>
+std::string pixelName(int channels) {
+  return (sizeof(T) == 1 ? "u8x" : "f32x") + std::to_string(channels);
+}
+
+template <typename T, int nc>
+void addCrop(std::vector<Operation>& operations, const char* name, T ratio) {
+  operations.push_back({name + pixelName<T>(nc), "fastcv", 2.0 * nc * sizeof(T), [ratio](Size size) {
+                          const Size whole = croppedFrom(size);
+                          const auto src = samples<T>(whole.pixels() * nc);
                           const auto dst = samples<T>(size.pixels() * nc);
                           return [=] {
-                            const Image<T, nc> from(size.width, size.height, src.get());
-                            Image<T, nc> to(upright ? size.width : size.height,
-                                            upright ? size.height : size.width, dst.get());
-                            call(from, to);
+                            const Image<T, nc> from(whole.width, whole.height, src.get());
+                            Image<T, nc> to(size.width, size.height, dst.get());
+                            const Point2_<int> at{kCropMargin, kCropMargin};
+                            if (crop<T, nc, T, nc, nc, ECO_ENV_ARM>(from, at, ratio, &to) != HPC_SUCCESS) {
+                              std::abort();
+                            }
                           };
                         }});
 }
 
-// Rotations by all angles, of any number of channels: through the kernel, as the front-end lacks two.
+constexpr int kAngles[] = {90, 180, 270};
+
+// Through the kernel, as there are more of them than the front-end reaches: two channels are chroma pairs.
 template <typename T, int nc>
 void addRotations(std::vector<Operation>& operations) {
-  for (const int degree : {90, 180, 270}) {
-    addPacked<T, nc>(
-        operations, "rotate" + std::to_string(degree), degree == 180, [degree](const auto& from, auto& to) {
-          armRotateNx90degree<T, nc, nc, nc>(from.height, from.width, from.width * nc, from.data, to.height,
-                                             to.width, to.width * nc, to.data, degree);
-        });
-  }
-}
-
-// Crops of the whole picture: copies, and samples multiplied by a whole factor.
-template <typename T, int nc>
-void addCrops(std::vector<Operation>& operations) {
-  for (const int ratio : {1, 2}) {
-    addPacked<T, nc>(
-        operations, ratio == 1 ? "crop" : "crop-times-2", true, [ratio](const auto& from, auto& to) {
-          if (crop<T, nc, T, nc, nc, ECO_ENV_ARM>(from, {0, 0}, static_cast<T>(ratio), &to) != HPC_SUCCESS) {
-            std::abort();
-          }
-        });
+  for (const int angle : kAngles) {
+    operations.push_back({"rotate" + std::to_string(angle) + "-" + pixelName<T>(nc), "fastcv",
+                          2.0 * nc * sizeof(T), [angle](Size size) {
+                            const auto src = samples<T>(size.pixels() * nc);
+                            const auto dst = samples<T>(size.pixels() * nc);
+                            const Size out = rotatedBy(angle, size);
+                            return [=] {
+                              armRotateNx90degree<T, nc, nc, nc>(size.height, size.width, size.width * nc,
+                                                                 src.get(), out.height, out.width,
+                                                                 out.width * nc, dst.get(), angle);
+                            };
+                          }});
   }
 }
 
 template <YUV420Type type>
-void addFrameRotations(std::vector<Operation>& operations, const std::string& layout) {
-  for (const int degree : {90, 180, 270}) {
-    operations.push_back({"rotate" + std::to_string(degree) + "-" + layout, "fastcv", 3, [=](Size size) {
+void addFrameRotations(std::vector<Operation>& operations, const char* name) {
+  for (const int angle : kAngles) {
+    operations.push_back({"rotate" + std::to_string(angle) + "-" + name, "fastcv", 3, [angle](Size size) {
                             const auto src = samples<unsigned char>(size.pixels() * 3 / 2);
                             const auto dst = samples<unsigned char>(size.pixels() * 3 / 2);
+                            const Size out = rotatedBy(angle, size);
                             return [=] {
-                              const Size out = degree == 180 ? size : Size{size.height, size.width};
                               const Image<unsigned char, 1> from(size.width, size.height * 3 / 2, src.get());
                               Image<unsigned char, 1> to(out.width, out.height * 3 / 2, dst.get());
-                              if (rotate_YUV420<type, unsigned char, ECO_ENV_ARM>(
-                                      from, &to, static_cast<float>(degree)) != HPC_SUCCESS) {
+                              const auto degree = static_cast<float>(angle);
+                              if (rotate_YUV420<type, unsigned char, ECO_ENV_ARM>(from, &to, degree) !=
+                                  HPC_SUCCESS) {
                                 std::abort();
                               }
                             };
                           }});
   }
+}
+
+using Metric = unsigned char(const unsigned char*, int, int, int, int, int, int, int, int);
+
+// Over the whole picture.
+void addMetric(std::vector<Operation>& operations, const char* name, int channels, Metric* metric) {
+  operations.push_back({name, "fastcv", static_cast<double>(channels), [=](Size size) {
+                          const auto data =
+                              samples<unsigned char>(size.pixels() * static_cast<size_t>(channels));
+                          return [=] {
+                            [[maybe_unused]] volatile unsigned char mean =
+                                metric(data.get(), size.width, size.width * channels, size.height,
+                                       size.height, 0, 0, size.width, size.height);
+                          };
+                        }});
 }
 
 }  // namespace
@@ -145,15 +163,26 @@ void addFastcv(std::vector<Operation>& operations) {
 #define BENCH_CONVERSION(type, T, ncSrc, ncDst) addConversion<type, T, ncSrc, ncDst>(operations, #type);
   FASTCV_CVT_COLOR_INSTANCES(BENCH_CONVERSION)
 #undef BENCH_CONVERSION
-#define BENCH_PACKED(T, nc)        \
-  addRotations<T, nc>(operations); \
-  addCrops<T, nc>(operations);
-  FASTCV_PACKED_INSTANCES(BENCH_PACKED)
-#undef BENCH_PACKED
+#define BENCH_CROP(T, nc)                 \
+  addCrop<T, nc>(operations, "crop-", 1); \
+  addCrop<T, nc>(operations, "crop-scaled-", 2);
+  FASTCV_PACKED_INSTANCES(BENCH_CROP)
+#undef BENCH_CROP
+  addRotations<unsigned char, 1>(operations);
   addRotations<unsigned char, 2>(operations);
+  addRotations<unsigned char, 3>(operations);
+  addRotations<unsigned char, 4>(operations);
+  addRotations<float, 1>(operations);
   addRotations<float, 2>(operations);
+  addRotations<float, 3>(operations);
+  addRotations<float, 4>(operations);
   addFrameRotations<YUV420_NV21>(operations, "NV21");
   addFrameRotations<YUV420_I420>(operations, "I420");
+  addMetric(operations, "calcGray_YUV", 3, calcGray_YUV);
+  addMetric(operations, "calcGray_BGRA", 4, calcGray_BGRA);
+  addMetric(operations, "calcGray_RGBA", 4, calcGray_RGBA);
+  addMetric(operations, "calcLuminance_BGRA", 4, calcLuminance_BGRA);
+  addMetric(operations, "calcLuminance_RGBA", 4, calcLuminance_RGBA);
 }
 
 }  // namespace bench

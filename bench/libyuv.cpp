@@ -22,7 +22,9 @@ void add(std::vector<Operation>& operations, const char* name, double inBytes, d
          void (*call)(const Frame&)) {
   operations.push_back({name, "libyuv", inBytes + outBytes, [=](Size size) {
                           const double pixels = static_cast<double>(size.pixels());
-                          const auto in = samples<unsigned char>(static_cast<size_t>(pixels * inBytes));
+                          // With a margin, for crops.
+                          const double whole = static_cast<double>(croppedFrom(size).pixels());
+                          const auto in = samples<unsigned char>(static_cast<size_t>(whole * inBytes));
                           const auto out = samples<unsigned char>(static_cast<size_t>(pixels * outBytes));
                           return [=] { call({size.width, size.height, in.get(), out.get()}); };
                         }});
@@ -80,6 +82,12 @@ void rotated180SemiPlanar(const Frame& f) {
                      f.width, -f.height);
 }
 
+template <int nc>
+void cropped(const Frame& f) {
+  const int stride = croppedFrom({f.width, f.height}).width * nc;
+  libyuv::CopyPlane(f.in + kCropMargin * (stride + nc), stride, f.out, f.width * nc, f.width * nc, f.height);
+}
+
 void copied(const Frame& f) { libyuv::CopyPlane(f.in, f.width, f.out, f.width, f.width, f.height); }
 
 }  // namespace
@@ -132,6 +140,9 @@ void addLibyuv(std::vector<Operation>& operations) {
   conversion("rotate180-I420", 1.5, 1.5, rotatedPlanar<kRotate180>);
   conversion("rotate270-I420", 1.5, 1.5, rotatedPlanar<kRotate270>);
   conversion("rotate180-NV21", 1.5, 1.5, rotated180SemiPlanar);
+  conversion("crop-u8x1", 1, 1, cropped<1>);
+  conversion("crop-u8x3", 3, 3, cropped<3>);
+  conversion("crop-u8x4", 4, 4, cropped<4>);
 }
 
 }  // namespace bench

@@ -127,6 +127,50 @@ void addRotations(std::vector<Operation>& operations, int sampleType, int channe
   }
 }
 
+void addCrops(std::vector<Operation>& operations, int sampleType, int channels) {
+  const std::string suffix = (sampleType == CV_8U ? "u8x" : "f32x") + std::to_string(channels);
+  const double traffic = 2.0 * static_cast<double>(bytesOf(sampleType)) * channels;
+  for (const bool scaled : {false, true}) {
+    operations.push_back({(scaled ? "crop-scaled-" : "crop-") + suffix, "opencv", traffic, [=](Size size) {
+                            const Size whole = croppedFrom(size);
+                            const Image in = image(whole.height, whole.width, sampleType, channels);
+                            const Image out = image(size.height, size.width, sampleType, channels);
+                            const cv::Mat region =
+                                in.mat(cv::Rect(kCropMargin, kCropMargin, size.width, size.height));
+                            return [=] {
+                              cv::Mat dst = out.mat;
+                              scaled ? region.convertTo(dst, -1, 2) : region.copyTo(dst);
+                              // The images must outlive the views of them.
+                              static_cast<void>(in);
+                            };
+                          }});
+  }
+}
+
+// The mean of a picture's gray, by way of a gray picture where there is more than luma to read.
+void addMeans(std::vector<Operation>& operations) {
+  operations.push_back({"calcGray_YUV", "opencv", 3, [](Size size) {
+                          const Image in = image(size.height, size.width, CV_8U, 3);
+                          return [=] { [[maybe_unused]] volatile double mean = cv::mean(in.mat)[0]; };
+                        }});
+  struct Order {
+    const char* name;
+    int code;
+  };
+  for (const Order order :
+       {Order{"calcGray_BGRA", cv::COLOR_BGRA2GRAY}, Order{"calcGray_RGBA", cv::COLOR_RGBA2GRAY}}) {
+    operations.push_back({order.name, "opencv", 4, [order](Size size) {
+                            const Image in = image(size.height, size.width, CV_8U, 4);
+                            const Image gray = image(size.height, size.width, CV_8U, 1);
+                            return [=] {
+                              cv::Mat dst = gray.mat;
+                              cv::cvtColor(in.mat, dst, order.code);
+                              [[maybe_unused]] volatile double mean = cv::mean(dst)[0];
+                            };
+                          }});
+  }
+}
+
 }  // namespace
 
 void addOpencv(std::vector<Operation>& operations) {
@@ -141,8 +185,12 @@ void addOpencv(std::vector<Operation>& operations) {
   for (const int sampleType : {CV_8U, CV_32F}) {
     for (const int channels : {1, 2, 3, 4}) {
       addRotations(operations, sampleType, channels);
+      if (channels != 2) {
+        addCrops(operations, sampleType, channels);
+      }
     }
   }
+  addMeans(operations);
 }
 
 }  // namespace bench

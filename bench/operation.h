@@ -20,6 +20,13 @@ struct Size {
   size_t pixels() const { return static_cast<size_t>(width) * static_cast<size_t>(height); }
 };
 
+/// A picture's size after a rotation by 90, 180 or 270 degrees.
+inline Size rotatedBy(int angle, Size size) { return angle == 180 ? size : Size{size.height, size.width}; }
+
+/// What a picture is cropped out of: one with a margin on all sides.
+constexpr int kCropMargin = 8;
+inline Size croppedFrom(Size size) { return {size.width + 2 * kCropMargin, size.height + 2 * kCropMargin}; }
+
 /// One way of doing something to a picture. Operations of the same name do the same thing, so that those of
 /// several libraries stand side by side.
 struct Operation {
