@@ -54,4 +54,43 @@ JNIEXPORT void JNICALL Java_com_vantrel_faceapi_FaceLibrary_convertColorSpace(JN
   out.release();
 }
 
+JNIEXPORT void JNICALL Java_com_vantrel_faceapi_FaceLibrary_cropNv21Data(JNIEnv* env, jobject /*thiz*/,
+                                                                         jbyteArray nv21, jint imageWidth,
+                                                                         jint imageHeight, jint x, jint y,
+                                                                         jint w, jint h, jbyteArray out) {
+  kyface::PinnedArray frame(env, nv21);
+  if (!frame) {
+    return;
+  }
+  kyface::PinnedArray pixels(env, out);
+  if (!pixels) {
+    return;
+  }
+  cropNv21(frame.bytes(), imageWidth, imageHeight, x, y, w, h, pixels.bytes());
+  frame.release();
+  pixels.release();
+}
+
+JNIEXPORT void JNICALL Java_com_vantrel_faceapi_FaceLibrary_rotateBGR(JNIEnv* env, jobject /*thiz*/,
+                                                                      jbyteArray src, jint width, jint height,
+                                                                      jbyteArray dst, jint degree,
+                                                                      jintArray outSize) {
+  kyface::PinnedArray in(env, src);
+  if (!in) {
+    return;
+  }
+  kyface::PinnedArray out(env, dst);
+  if (!out) {
+    return;
+  }
+  kyface::PinnedArray size(env, outSize);
+  if (!size) {
+    return;
+  }
+  rotateBGR(in.bytes(), width, height, out.bytes(), degree, size.data());
+  in.release();
+  out.release();
+  size.release();
+}
+
 }  // extern "C"

@@ -156,6 +156,14 @@ TEST_F(RefusalTest, Images) {
                          return true;
                        }});
   }
+  refuse_everything({"-cropNv21Data", [&] {
+                       CALL(cropNv21Data, bytes, 4, 4, 0, 0, 2, 2, more_bytes);
+                       return true;
+                     }});
+  refuse_everything({"-rotateBGR", [&] {
+                       CALL(rotateBGR, bytes, 2, 3, more_bytes, 90, ints);
+                       return true;
+                     }});
 }
 
 TEST_F(RefusalTest, NothingIsWrittenToAnArrayWhosePartnerIsRefused) {
@@ -166,6 +174,10 @@ TEST_F(RefusalTest, NothingIsWrittenToAnArrayWhosePartnerIsRefused) {
     CALL(convertColorSpace, bytes, 2, 2, more_bytes, 2);
     EXPECT_EQ(vm.bytes(more_bytes), before);
   }
+  begin();
+  vm.refuse("GetIntArrayElements", 1);
+  CALL(rotateBGR, bytes, 2, 3, more_bytes, 90, ints);
+  EXPECT_EQ(vm.bytes(more_bytes), before);
 }
 
 TEST_F(RefusalTest, Brightness) {
