@@ -103,6 +103,14 @@ public final class Demo {
         time.print();
         System.out.println();
         new Lighting(WIDTH, HEIGHT).print(shown, nv21, faces);
+        System.out.println();
+
+        Turning turning = new Turning(nv21, WIDTH, HEIGHT);
+        File crop = new File(folder, "face.png");
+        turning.writeCrop(faces[0].faceRect, crop);
+        File turned = new File(folder, "turned.png");
+        turning.writeRotations(turned);
+        System.out.println("cut out of the frame in " + crop + ", the frame turned by right angles in " + turned);
         return 0;
     }
 
