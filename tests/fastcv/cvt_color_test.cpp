@@ -10,6 +10,7 @@
 #include <string>
 #include <vector>
 
+#include "cvt_kernels.h"
 #include "fastcv.h"
 #include "kernels.h"
 
@@ -43,40 +44,17 @@ std::string instanceOf(const char* function) {
 
 }  // namespace
 
-// The kernel behind each conversion.
-#define KERNEL_OF_CVT_BGR2NV21 armBGR2NV21Image
-#define KERNEL_OF_CVT_NV212BGR armNV212BGRImage
-#define KERNEL_OF_CVT_NV212RGB armNV212RGBImage
-#define KERNEL_OF_CVT_RGB2NV21 armRGB2NV21Image
-#define KERNEL_OF_CVT_BGR2NV12 armBGR2NV12Image
-#define KERNEL_OF_CVT_NV122BGR armNV122BGRImage
-#define KERNEL_OF_CVT_YCrCb2BGR armYCrCb2BGRImage
-#define KERNEL_OF_CVT_BGR2YCrCb armBGR2YCrCbImage
-#define KERNEL_OF_CVT_BGR2HSV armBGR2HSVImage
-#define KERNEL_OF_CVT_HSV2BGR armHSV2BGRImage
-#define KERNEL_OF_CVT_BGR2GRAY armBGR2GRAYImage
-#define KERNEL_OF_CVT_GRAY2BGR armGRAY2BGRImage
-#define KERNEL_OF_CVT_BGR2BGRA armBGR2BGRAImage
-#define KERNEL_OF_CVT_BGRA2BGR armBGRA2BGRImage
-#define KERNEL_OF_CVT_BGR2RGB armBGR2RGBImage
-#define KERNEL_OF_CVT_BGR2LAB armBGR2LABImage
-#define KERNEL_OF_CVT_LAB2BGR armLAB2BGRImage
-#define KERNEL_OF_CVT_BGR2I420 armBGR2I420Image
-#define KERNEL_OF_CVT_I4202BGR armI4202BGRImage
-#define KERNEL_OF_CVT_YUV2GRAY armYUV2GRAYImage
-#define KERNEL_OF_CVT_RGB2NV12 armRGB2NV12Image
-#define KERNEL_OF_CVT_NV122RGB armNV122RGBImage
 #define STRING_OF(name) #name
 #define EXPANDED_STRING_OF(name) STRING_OF(name)
 
 namespace HPC::fastcv {
 
-#define DEFINE_KERNEL(type, T, ncSrc, ncDst)                                                           \
-  template <>                                                                                          \
-  void KERNEL_OF_##type<T, ncSrc, T, ncDst>(int height, int width, int inWidthStride, const T* inData, \
-                                            int outWidthStride, T* outData) {                          \
-    calls.push_back({instanceOf<T, ncSrc, ncDst>(EXPANDED_STRING_OF(KERNEL_OF_##type)), height, width, \
-                     inWidthStride, inData, outWidthStride, outData});                                 \
+#define DEFINE_KERNEL(type, T, ncSrc, ncDst)                                                          \
+  template <>                                                                                         \
+  void KERNEL_OF(type)<T, ncSrc, T, ncDst>(int height, int width, int inWidthStride, const T* inData, \
+                                           int outWidthStride, T* outData) {                          \
+    calls.push_back({instanceOf<T, ncSrc, ncDst>(EXPANDED_STRING_OF(KERNEL_OF(type))), height, width, \
+                     inWidthStride, inData, outWidthStride, outData});                                \
   }
 FASTCV_CVT_COLOR_INSTANCES(DEFINE_KERNEL)
 
@@ -148,13 +126,13 @@ struct Instance {
 void PrintTo(const Instance& instance, std::ostream* out) { *out << instance.name; }
 
 const std::vector<Instance>& instances() {
-#define INSTANCE_OF(type, T, ncSrc, ncDst)                            \
-  {instanceOf<T, ncSrc, ncDst>(#type),                                \
-   instanceOf<T, ncSrc, ncDst>(EXPANDED_STRING_OF(KERNEL_OF_##type)), \
-   type,                                                              \
-   static_cast<int>(sizeof(T)),                                       \
-   ncSrc,                                                             \
-   ncDst,                                                             \
+#define INSTANCE_OF(type, T, ncSrc, ncDst)                           \
+  {instanceOf<T, ncSrc, ncDst>(#type),                               \
+   instanceOf<T, ncSrc, ncDst>(EXPANDED_STRING_OF(KERNEL_OF(type))), \
+   type,                                                             \
+   static_cast<int>(sizeof(T)),                                      \
+   ncSrc,                                                            \
+   ncDst,                                                            \
    convert<type, T, ncSrc, ncDst>},
   static const std::vector<Instance> all = {FASTCV_CVT_COLOR_INSTANCES(INSTANCE_OF)};
   return all;

@@ -21,8 +21,8 @@
 
 #include <cstddef>
 
+#include "entry.h"
 #include "kernel_assert.h"
-#include "kernels.h"
 #include "loop.h"
 
 namespace HPC::fastcv {
@@ -450,8 +450,8 @@ void armBGR2I420Image(int height, int width, int inWidthStride, const Tsrc* inDa
 
 // NOLINTEND(modernize-use-nullptr)
 
-#define INSTANCE(Name, ncSrc, ncDst)                                                                     \
-  template __attribute__((visibility("default"))) void Name<unsigned char, ncSrc, unsigned char, ncDst>( \
+#define INSTANCE(Name, ncSrc, ncDst)                                              \
+  template FASTCV_EXPORTED void Name<unsigned char, ncSrc, unsigned char, ncDst>( \
       int, int, int, const unsigned char*, int, unsigned char*);
 INSTANCE(armI4202BGRImage, 1, 3)
 INSTANCE(armI4202BGRImage, 1, 4)

@@ -3,8 +3,8 @@
 #include <cstddef>
 #include <cstring>
 
+#include "entry.h"
 #include "kernel_assert.h"
-#include "kernels.h"
 
 namespace HPC::fastcv {
 namespace {
@@ -33,7 +33,8 @@ void armYUV2GRAYImage(int height, int width, int inWidthStride, const Tsrc* inDa
   YUV2Gray(height, width, inWidthStride, inData, outWidthStride, outData);
 }
 
-template __attribute__((visibility("default"))) void armYUV2GRAYImage<unsigned char, 1, unsigned char, 1>(
-    int, int, int, const unsigned char*, int, unsigned char*);
+template FASTCV_EXPORTED void armYUV2GRAYImage<unsigned char, 1, unsigned char, 1>(int, int, int,
+                                                                                   const unsigned char*, int,
+                                                                                   unsigned char*);
 
 }  // namespace HPC::fastcv

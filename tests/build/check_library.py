@@ -1,0 +1,101 @@
+"""Looks at the built shared library: what it exports, what it needs, how it is laid out."""
+
+import argparse
+import re
+import subprocess
+import sys
+from pathlib import Path
+
+JNI_PREFIX = "Java_com_vantrel_faceapi_FaceLibrary_"
+PAGE = 16384
+NEEDED = {"liblog.so", "libjnigraphics.so", "libkyface_api.so"}
+# What the compiler and the C library bring along.
+PLATFORM = re.compile(r"lib(c|m|stdc\+\+|gcc_s)\.so\.\d+|ld-linux-[\w-]+\.so\.\d+")
+
+
+def output(*command):
+    return subprocess.run(command, stdout=subprocess.PIPE, text=True, check=True).stdout
+
+
+
+def intended(arguments):
+    """The exported functions: what intended_exports.cpp refers to, and the native methods of the Java class."""
+    names = {line.split()[-1] for line in output(arguments.nm, "-u", arguments.intended).splitlines()}
+    java = re.findall(r"\bnative\s+[\w\[\]]+\s+(\w+)\(", Path(arguments.java).read_text())
+    return {name for name in names if name.startswith("_Z")} | {JNI_PREFIX + name for name in java} | {"JNI_OnLoad"}
+
+
+def check_exports(arguments):
+    exported = {line.split()[-1].split("@")[0] for line in
+                output(arguments.nm, "-D", "--defined-only", arguments.library).splitlines()}
+    wanted = intended(arguments)
+    print(f"{len(exported)} exported, {len(wanted)} intended")
+    if len(wanted) < 100:
+        yield f"only {len(wanted)} names were found to compare with"
+    for name in sorted(exported - wanted):
+        yield f"exported, and should not be: {name}"
+    for name in sorted(wanted - exported):
+        yield f"not exported: {name}"
+
+
+def check_needed(arguments):
+    dynamic = output(arguments.readelf, "-d", arguments.library)
+    needed = set(re.findall(r"\(NEEDED\).*\[(.*)\]", dynamic))
+    print("needs " + ", ".join(sorted(needed)))
+    for name in sorted(NEEDED - needed):
+        yield f"does not need {name}"
+    for name in sorted(needed - NEEDED):
+        if not PLATFORM.fullmatch(name):
+            yield f"needs {name}"
+    if re.findall(r"\(SONAME\).*\[(.*)\]", dynamic) != ["libjni_kyface_api.so"]:
+        yield "has another name than libjni_kyface_api.so"
+    for path in re.findall(r"\((?:RPATH|RUNPATH)\).*\[(.*)\]", dynamic):
+        if path != "$ORIGIN":
+            yield f"looks for libraries in {path}"
+
+
+def check_layout(arguments):
+    dynamic = output(arguments.readelf, "-d", arguments.library)
+    headers = output(arguments.readelf, "-l", "-W", arguments.library)
+    segments = [(kind, [int(x, 16) for x in numbers.split()], flags.replace(" ", ""), int(align, 16)) for
+                kind, numbers, flags, align in
+                re.findall(r"^ *([A-Z_]+) +((?:0x[0-9a-f]+ +){5})([RWE ]+?) +(0x[0-9a-f]+)$", headers, re.MULTILINE)]
+    loads = [segment for segment in segments if segment[0] == "LOAD"]
+    print("\n".join(f"{kind} {flags} align {align:#x}" for kind, _, flags, align in segments))
+    if not loads:
+        yield "no segments were found"
+    for _, (offset, address, *_), flags, align in loads:
+        if arguments.aarch64 and (align % PAGE != 0 or (address - offset) % PAGE != 0):
+            yield f"a segment is not aligned to {PAGE} bytes"
+        if "W" in flags and "E" in flags:
+            yield "a segment is writable and executable"
+    if not any(kind == "GNU_RELRO" for kind, *_ in segments):
+        yield "relocations are not made read-only"
+    if not any(kind == "GNU_STACK" and "E" not in flags for kind, _, flags, _ in segments):
+        yield "the stack may be executable"
+    if "TEXTREL" in dynamic:
+        yield "has text relocations"
+    if "BIND_NOW" not in dynamic and not re.search(r"\(FLAGS_1\).*\bNOW\b", dynamic):
+        yield "does not bind everything when it is loaded"
+
+
+CHECKS = {"exports": check_exports, "needed": check_needed, "layout": check_layout}
+
+
+def main():
+    parser = argparse.ArgumentParser(description=__doc__)
+    parser.add_argument("check", choices=CHECKS)
+    parser.add_argument("library")
+    parser.add_argument("--nm", required=True)
+    parser.add_argument("--readelf", required=True)
+    parser.add_argument("--intended", help="the object of intended_exports.cpp")
+    parser.add_argument("--java", help="the source of the Java class")
+    parser.add_argument("--aarch64", action="store_true", help="the library is one of 64-bit Arm")
+    arguments = parser.parse_args()
+    findings = list(CHECKS[arguments.check](arguments))
+    print(*findings, sep="\n", end="\n" if findings else "")
+    return 1 if findings else 0
+
+
+if __name__ == "__main__":
+    sys.exit(main())

@@ -1,0 +1,49 @@
+// Refers to every C++ function that the shared library is meant to export. It is compiled, not linked: what
+// its object leaves undefined is the list.
+
+#include "brightness.h"
+#include "cvt_kernels.h"
+#include "fastcv.h"
+#include "frame.h"
+#include "kernels.h"
+
+namespace HPC::fastcv {
+
+using Function = void (*)();
+#define ADDRESS(...) reinterpret_cast<Function>(&__VA_ARGS__),
+
+#define COLOR(type, T, ncSrc, ncDst)                       \
+  ADDRESS(cvtColor<type, T, ncSrc, T, ncDst, ECO_ENV_ARM>) \
+  ADDRESS(KERNEL_OF(type) < T, ncSrc, T, ncDst >)
+
+#define PACKED(T, nc)                          \
+  ADDRESS(crop<T, nc, T, nc, nc, ECO_ENV_ARM>) \
+  ADDRESS(rotate<T, nc, nc, nc, ECO_ENV_ARM>)  \
+  ADDRESS(armImageCrop<T, nc, T, nc, nc>)
+
+// The kernels rotate two channels too, for pairs of chroma samples.
+#define ROTATION(T, nc)                       \
+  ADDRESS(armRotateNx90degree<T, nc, nc, nc>) \
+  ADDRESS(imgRotate90degree<T, nc, 64, 64>)   \
+  ADDRESS(imgRotate180degree<T, nc, 64, 64>)  \
+  ADDRESS(imgRotate270degree<T, nc, 64, 64>)
+
+#define FRAME(type) ADDRESS(rotate_YUV420<type, unsigned char, ECO_ENV_ARM>)
+
+// clang-format off
+extern const Function intended[];
+const Function intended[] = {
+    FASTCV_CVT_COLOR_INSTANCES(COLOR)
+    FASTCV_PACKED_INSTANCES(PACKED)
+    ROTATION(unsigned char, 1) ROTATION(unsigned char, 2) ROTATION(unsigned char, 3) ROTATION(unsigned char, 4)
+    ROTATION(float, 1) ROTATION(float, 2) ROTATION(float, 3) ROTATION(float, 4)
+    FRAME(YUV420_NV21) FRAME(YUV420_NV12) FRAME(YUV420_I420)
+    ADDRESS(armRotateNx90degree_YUV420<unsigned char>) ADDRESS(imgRotate_I420<unsigned char>)
+    ADDRESS(nv2RGB) ADDRESS(RGB2nv) ADDRESS(nv2BGR) ADDRESS(nv212BGR) ADDRESS(BGR2nv)
+    ADDRESS(BGR2RGB) ADDRESS(BGRA2RGB) ADDRESS(cropNv21) ADDRESS(rotateBGR)
+    ADDRESS(calcGray_YUV) ADDRESS(calcGray_BGRA) ADDRESS(calcGray_RGBA)
+    ADDRESS(calcLuminance_BGRA) ADDRESS(calcLuminance_RGBA)
+};
+// clang-format on
+
+}  // namespace HPC::fastcv
