@@ -54,7 +54,14 @@ enum ColorCvtType {
   CVT_BGR2BGRA = 12,
   CVT_BGRA2BGR = 13,
   CVT_BGR2RGB = 14,  ///< swaps red and blue, with or without alpha on either side; its own inverse
+  /// CIE L*a*b*, sRGB primaries, D65 white. 8-bit: L * 2.55, a + 128, b + 128. Float: L 0..100 and a, b as
+  /// they are, of colours 0..1.
   CVT_BGR2LAB = 15,
+  /// The way back; colours are clamped to 0..255, or 0..1 for float. The 8-bit conversion works on groups of
+  /// 8 pixels that start before column `width` - 3, so it reads and writes up to 4 pixels beyond the end of
+  /// each row: 12 bytes of the source and 12 (BGR) or 16 (BGRA) of the destination. Between rows that is
+  /// padding, whose contents are lost, or the start of the next row, which is written later. The buffers must
+  /// have room for it after the last row too, unless `width` % 8 is below 4.
   CVT_LAB2BGR = 16,
   CVT_BGR2I420 = 17,
   CVT_I4202BGR = 18,
@@ -225,28 +232,32 @@ HPCStatus_t rotate_YUV420(const Mat<unsigned char, 1, env>& /*src*/, Mat<unsigne
   X(type, unsigned char, ncSrc, ncDst)               \
   X(type, float, ncSrc, ncDst)
 
-#define FASTCV_CVT_COLOR_INSTANCES(X)  \
-  X(CVT_BGR2NV21, unsigned char, 3, 1) \
-  X(CVT_BGR2NV21, unsigned char, 4, 1) \
-  X(CVT_NV212BGR, unsigned char, 1, 3) \
-  X(CVT_NV212BGR, unsigned char, 1, 4) \
-  X(CVT_NV212RGB, unsigned char, 1, 3) \
-  X(CVT_NV212RGB, unsigned char, 1, 4) \
-  X(CVT_RGB2NV21, unsigned char, 3, 1) \
-  X(CVT_RGB2NV21, unsigned char, 4, 1) \
-  X(CVT_BGR2NV12, unsigned char, 3, 1) \
-  X(CVT_BGR2NV12, unsigned char, 4, 1) \
-  X(CVT_NV122BGR, unsigned char, 1, 3) \
-  X(CVT_NV122BGR, unsigned char, 1, 4) \
-  X(CVT_RGB2NV12, unsigned char, 3, 1) \
-  X(CVT_RGB2NV12, unsigned char, 4, 1) \
-  X(CVT_NV122RGB, unsigned char, 1, 3) \
-  X(CVT_NV122RGB, unsigned char, 1, 4) \
-  X(CVT_BGR2I420, unsigned char, 3, 1) \
-  X(CVT_BGR2I420, unsigned char, 4, 1) \
-  X(CVT_I4202BGR, unsigned char, 1, 3) \
-  X(CVT_I4202BGR, unsigned char, 1, 4) \
-  X(CVT_YUV2GRAY, unsigned char, 1, 1)
+#define FASTCV_CVT_COLOR_INSTANCES(X)         \
+  X(CVT_BGR2NV21, unsigned char, 3, 1)        \
+  X(CVT_BGR2NV21, unsigned char, 4, 1)        \
+  X(CVT_NV212BGR, unsigned char, 1, 3)        \
+  X(CVT_NV212BGR, unsigned char, 1, 4)        \
+  X(CVT_NV212RGB, unsigned char, 1, 3)        \
+  X(CVT_NV212RGB, unsigned char, 1, 4)        \
+  X(CVT_RGB2NV21, unsigned char, 3, 1)        \
+  X(CVT_RGB2NV21, unsigned char, 4, 1)        \
+  X(CVT_BGR2NV12, unsigned char, 3, 1)        \
+  X(CVT_BGR2NV12, unsigned char, 4, 1)        \
+  X(CVT_NV122BGR, unsigned char, 1, 3)        \
+  X(CVT_NV122BGR, unsigned char, 1, 4)        \
+  X(CVT_RGB2NV12, unsigned char, 3, 1)        \
+  X(CVT_RGB2NV12, unsigned char, 4, 1)        \
+  X(CVT_NV122RGB, unsigned char, 1, 3)        \
+  X(CVT_NV122RGB, unsigned char, 1, 4)        \
+  X(CVT_BGR2I420, unsigned char, 3, 1)        \
+  X(CVT_BGR2I420, unsigned char, 4, 1)        \
+  X(CVT_I4202BGR, unsigned char, 1, 3)        \
+  X(CVT_I4202BGR, unsigned char, 1, 4)        \
+  X(CVT_YUV2GRAY, unsigned char, 1, 1)        \
+  FASTCV_CVT_BOTH_TYPES(X, CVT_BGR2LAB, 3, 3) \
+  FASTCV_CVT_BOTH_TYPES(X, CVT_BGR2LAB, 4, 3) \
+  FASTCV_CVT_BOTH_TYPES(X, CVT_LAB2BGR, 3, 3) \
+  FASTCV_CVT_BOTH_TYPES(X, CVT_LAB2BGR, 3, 4)
 
 // X is given (element type, channels): the instances of `crop` and `rotate`.
 #define FASTCV_PACKED_INSTANCES(X) \

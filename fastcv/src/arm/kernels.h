@@ -59,8 +59,10 @@ FASTCV_COLOR_KERNEL(armBGR2HSVImage);
 FASTCV_COLOR_KERNEL(armHSV2BGRImage);
 FASTCV_COLOR_KERNEL(armBGR2LABImage);
 /// With `unsigned char`, rows are worked on in groups of 8 pixels while the group's first pixel is below
-/// `width` - 3: the last group may read and write up to 4 pixels past the row's end. The next row rewrites
-/// what was overwritten; after the last row both buffers must have room for those 4 pixels.
+/// `width` - 3. Where `width` % 8 is 4 or more, the last group so reads and writes 8 - `width` % 8 pixels, up
+/// to 4, beyond the row's end: at most 12 bytes of the source, and 12 (3 channels) or 16 (4 channels) of the
+/// destination. Padding there loses its contents, the next row is written later; after the last row both
+/// buffers must have room.
 FASTCV_COLOR_KERNEL(armLAB2BGRImage);
 
 #undef FASTCV_COLOR_KERNEL

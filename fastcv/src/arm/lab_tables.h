@@ -40,10 +40,25 @@ struct alignas(64) Spline {
   float piece[kSplineIntervals][4];
 };
 
+/// What a byte table of a curve is made of: the byte nearest to the curve at v * 255, for v in [kFloor, 1),
+/// from one entry and one addition. As the curve grows, a byte's values begin at a threshold, and no two
+/// thresholds lie in the same 128th of an octave: so the upper half of the float's bits names the entry, and
+/// adding entry and float as integers carries into bit 16 from the threshold on. (entry + bits) >> 16 is the
+/// byte.
+struct alignas(64) ByteTable {
+  static constexpr int kOctaves = 13;
+  static constexpr int kPerOctave = 128;
+  static constexpr int kShift = 16;
+  static constexpr float kFloor = 0x1p-13f;
+  static constexpr uint32_t kFirst = std::bit_cast<uint32_t>(kFloor) >> kShift;
+  uint32_t entry[kOctaves * kPerOctave];
+};
+
 namespace tables {
 
-/// Never defined: calling it makes a computation no compile-time constant, and so an error.
+// Never defined: calling one makes a computation no compile-time constant, and so an error.
 void roundingIsTooCloseToCall();
+void thresholdsAreTooClose();
 
 /// `value` rounded to float, if no value within 2^-40 of it (relative) rounds differently.
 constexpr float narrowed(double value) {
@@ -153,12 +168,70 @@ constexpr Spline splineOf(float (*curve)(float)) {
   return spline;
 }
 
+/// a * b + c, rounded once. The product is exact in double; the sum, if it is not, gets an odd last bit, so
+/// that rounding it again gives what rounding the exact sum would.
+constexpr float fusedMultiplyAdd(float a, float b, float c) {
+  const double product = static_cast<double>(a) * b;
+  const double sum = product + c;
+  const double added = sum - product;
+  const double error = (product - (sum - added)) + (c - added);
+  const auto bits = std::bit_cast<int64_t>(sum);
+  if (error == 0 || bits % 2 != 0) {
+    return static_cast<float>(sum);
+  }
+  return static_cast<float>(std::bit_cast<double>((error > 0) == (sum > 0) ? bits + 1 : bits - 1));
+}
+
+/// The curve at v in [0, 1).
+constexpr float valueAt(const Spline& spline, float v) {
+  const float t = v * kSplineIntervals;
+  const int k = static_cast<int>(t);
+  const float u = t - static_cast<float>(k);
+  const auto& a = spline.piece[k];
+  return fusedMultiplyAdd(u, fusedMultiplyAdd(u, fusedMultiplyAdd(u, a[3], a[2]), a[1]), a[0]);
+}
+
+/// The table of a curve whose bytes begin at `threshold`s.
+constexpr ByteTable byteTable(const Spline& spline) {
+  constexpr int kBytes = 256;
+  constexpr auto kEnd = std::bit_cast<uint32_t>(1.0f);
+  // The bits of the first float of each byte; positive floats are ordered as their bits are.
+  uint32_t threshold[kBytes + 1] = {};
+  uint32_t below = std::bit_cast<uint32_t>(ByteTable::kFloor);
+  for (int byte = 1; byte < kBytes; ++byte) {
+    uint32_t from = kEnd;
+    while (from - below > 1) {
+      const uint32_t middle = below + (from - below) / 2;
+      const float value = valueAt(spline, std::bit_cast<float>(middle));
+      (static_cast<int>(fusedMultiplyAdd(value, 255, 0.5f)) < byte ? below : from) = middle;
+    }
+    threshold[byte] = from;
+  }
+  threshold[kBytes] = kEnd;
+  ByteTable table{};
+  uint32_t next = 1;
+  uint32_t start = ByteTable::kFirst << ByteTable::kShift;
+  for (uint32_t& entry : table.entry) {
+    const uint32_t end = start + (1u << ByteTable::kShift);
+    if (threshold[next] <= start) {
+      ++next;
+    }
+    if (next < kBytes && threshold[next + 1] < end) {
+      thresholdsAreTooClose();
+    }
+    entry = ((next - 1) << ByteTable::kShift) - start + (threshold[next] < end ? end - threshold[next] : 0);
+    start = end;
+  }
+  return table;
+}
+
 }  // namespace tables
 
 inline constexpr GammaTable kGammaTable = tables::gammaTable();
 inline constexpr CubeRootTable kCubeRootTable = tables::cubeRootTable();
 inline constexpr Spline kExpansionSpline = tables::splineOf(tables::expanded);
 inline constexpr Spline kCompressionSpline = tables::splineOf(tables::compressed);
+inline constexpr ByteTable kCompressedBytes = tables::byteTable(kCompressionSpline);
 
 // No lightness needs a clamp: the root grows, from black to white it gives 0 to 255.
 static_assert((kCubeRootTable[0] * kLightnessScale - kLightnessOffset) >> kLightnessShift == 0);

@@ -1,0 +1,477 @@
+// BGR to and from CIE L*a*b* (sRGB primaries, D65 white).
+//
+// 8-bit BGR to Lab is integer arithmetic over the tables of gamma and cube roots:
+//
+//   X = (1777 R + 1541 G + 778 B + 2048) >> 12 of linear R, G, B; Y of 871, 2929, 296; Z of 73, 448, 3575
+//   L = (296 f(Y) - 1320550) >> 15
+//   a = (500 (f(X) - f(Y)) + 4210688) >> 15, clamped to a byte: 4210688 is 128.5 * 32768
+//   b = (200 (f(Y) - f(Z)) + 4210688) >> 15, clamped
+//
+// The others are in float, over the splines. Every multiplication that is followed by an addition is fused
+// with it, sums of products from left to right but for X, Y, Z, which are R c + (B c + G c) with the outer
+// product rounded last.
+
+#include <cmath>
+#include <cstddef>
+#include <cstdint>
+#include <cstring>
+
+#include "entry.h"
+#include "gamma_planes.h"
+#include "lab_tables.h"
+#include "loop.h"
+
+namespace HPC::fastcv {
+namespace {
+
+using namespace arm;
+
+// ---- 8-bit BGR to Lab
+
+constexpr LinearWeights kXWeights = {778, 1541, 1777};
+constexpr LinearWeights kZWeights = {3575, 448, 73};
+constexpr int kAScale = 500;
+constexpr int kBScale = 200;
+constexpr int kRootShift = 15;
+
+constexpr GammaPlanes gammaPlanes() {
+  GammaPlanes planes{};
+  for (int i = 0; i < 256; ++i) {
+    planes.set(i, kGammaTable[static_cast<size_t>(i)]);
+  }
+  return planes;
+}
+constexpr GammaPlanes kGammaPlanes = gammaPlanes();
+
+// Entries of a table by pairs of indices, as they come out of a vector. Indices are small enough that the
+// shift for the high one brings no bit of the low one.
+template <typename Entry>
+inline const Entry* lowEntry(const Entry* table, uint64_t pair) {
+  return table + static_cast<uint32_t>(pair);
+}
+template <typename Entry>
+inline const Entry* highEntry(const Entry* table, uint64_t pair) {
+  constexpr int kSizeShift = std::countr_zero(sizeof(Entry));
+  return reinterpret_cast<const Entry*>(reinterpret_cast<const char*>(table) + (pair >> (32 - kSizeShift)));
+}
+
+inline uint64_t lowPair(uint32x4_t index) { return vgetq_lane_u64(vreinterpretq_u64_u32(index), 0); }
+inline uint64_t highPair(uint32x4_t index) { return vgetq_lane_u64(vreinterpretq_u64_u32(index), 1); }
+
+// Hides how a vector was made. The compiler would make parts of it a second time where only those are used,
+// and constants one to a register.
+template <typename V>
+inline V opaque(V v) {
+#if defined(__ARM_NEON)
+  asm("" : "+w"(v));
+#endif
+  return v;
+}
+
+inline uint16x8_t gather(const CubeRootTable& table, uint32x4_t low, uint32x4_t high) {
+  const uint16_t* entries = table.data();
+  uint16x8_t v = vld1q_dup_u16(lowEntry(entries, lowPair(low)));
+  v = vld1q_lane_u16(highEntry(entries, lowPair(low)), v, 1);
+  v = vld1q_lane_u16(lowEntry(entries, highPair(low)), v, 2);
+  v = vld1q_lane_u16(highEntry(entries, highPair(low)), v, 3);
+  v = vld1q_lane_u16(lowEntry(entries, lowPair(high)), v, 4);
+  v = vld1q_lane_u16(highEntry(entries, lowPair(high)), v, 5);
+  v = vld1q_lane_u16(lowEntry(entries, highPair(high)), v, 6);
+  return opaque(vld1q_lane_u16(highEntry(entries, highPair(high)), v, 7));
+}
+
+template <int nc>
+struct BgrToLab8 {
+  using Src = unsigned char;
+  using Dst = unsigned char;
+  static constexpr int kSrcChannels = nc;
+  static constexpr int kDstChannels = 3;
+  static constexpr int kInFlight = 1;
+  static constexpr bool kUniform = true;
+
+  Pixels<unsigned char, 3> vector(const Pixels<unsigned char, nc>& p) const {
+    const uint8x16_t bytes[3] = {p.c[0], p.c[1], p.c[2]};
+    Light light[3];
+    lookUp(kGammaPlanes, bytes, light);
+    const Half low = half(light[0].half[0], light[1].half[0], light[2].half[0]);
+    const Half high = half(light[0].half[1], light[1].half[1], light[2].half[1]);
+    return {{vcombine_u8(low.l, high.l), vcombine_u8(low.a, high.a), vcombine_u8(low.b, high.b)}};
+  }
+
+  void scalar(const unsigned char* in, unsigned char* out) const {
+    const int b = kGammaTable[in[0]];
+    const int g = kGammaTable[in[1]];
+    const int r = kGammaTable[in[2]];
+    const int x = root(kXWeights, b, g, r);
+    const int y = root(kYWeights, b, g, r);
+    const int z = root(kZWeights, b, g, r);
+    constexpr int kCentre = (128 << kRootShift) + (1 << (kRootShift - 1));
+    out[0] = static_cast<unsigned char>(
+        (y * static_cast<int>(kLightnessScale) - static_cast<int>(kLightnessOffset)) >> kLightnessShift);
+    out[1] = clampToByte(((x - y) * kAScale + kCentre) >> kRootShift);
+    out[2] = clampToByte(((y - z) * kBScale + kCentre) >> kRootShift);
+  }
+
+ private:
+  // L, a and b of 8 pixels.
+  struct Half {
+    uint8x8_t l, a, b;
+  };
+
+  static int root(LinearWeights weights, int b, int g, int r) {
+    return kCubeRootTable[static_cast<size_t>(
+        (g * weights.g + b * weights.b + r * weights.r + (1 << (kWeightShift - 1))) >> kWeightShift)];
+  }
+
+  // Weights of B, G and R in a register, from lane 0.
+  static uint16x4_t lanes(LinearWeights weights) {
+    const uint16_t all[4] = {weights.b, weights.g, weights.r};
+    return opaque(vld1_u16(all));
+  }
+
+  static uint32x4_t coordinate(uint16x4_t weights, uint16x4_t b, uint16x4_t g, uint16x4_t r) {
+    uint32x4_t sum = vmull_u16(b, vdup_lane_u16(weights, 0));
+    sum = vmlal_u16(sum, g, vdup_lane_u16(weights, 1));
+    sum = vmlal_u16(sum, r, vdup_lane_u16(weights, 2));
+    return vrshrq_n_u32(sum, kWeightShift);
+  }
+
+  static uint16x8_t root(uint16x4_t weights, uint16x8_t b, uint16x8_t g, uint16x8_t r) {
+    return gather(kCubeRootTable, coordinate(weights, vget_low_u16(b), vget_low_u16(g), vget_low_u16(r)),
+                  coordinate(weights, vget_high_u16(b), vget_high_u16(g), vget_high_u16(r)));
+  }
+
+  // (296 f(Y) - 1320550) >> 15, as the high half of twice the bracket.
+  static uint16x4_t lightness(uint16x4_t root) {
+    return vsubhn_u32(vmull_n_u16(root, 2 * kLightnessScale), vdupq_n_u32(2 * kLightnessOffset));
+  }
+
+  // (scale * difference + 128.5 * 32768) >> 15, clamped to a byte: the difference of two roots fits a signed
+  // lane, the rounding doubling high product is (scale * difference + 16384) >> 15, and 128 more after
+  // saturation to a signed byte is the clamp.
+  static uint8x8_t opponent(uint16x8_t from, uint16x8_t to, int scale) {
+    const int16x8_t difference = vreinterpretq_s16_u16(vsubq_u16(from, to));
+    const int8x8_t centred = vqmovn_s16(vqrdmulhq_n_s16(difference, static_cast<int16_t>(scale)));
+    return veor_u8(vreinterpret_u8_s8(centred), vdup_n_u8(0x80));
+  }
+
+  Half half(uint16x8_t b, uint16x8_t g, uint16x8_t r) const {
+    const uint16x8_t x = root(x_, b, g, r);
+    const uint16x8_t y = root(y_, b, g, r);
+    const uint16x8_t z = root(z_, b, g, r);
+    return {vmovn_u16(vcombine_u16(lightness(vget_low_u16(y)), lightness(vget_high_u16(y)))),
+            opponent(x, y, kAScale), opponent(y, z, kBScale)};
+  }
+
+  uint16x4_t x_ = lanes(kXWeights);
+  uint16x4_t y_ = lanes(kYWeights);
+  uint16x4_t z_ = lanes(kZWeights);
+};
+
+// The roots lie in 4520..32768, so that their differences fit 16 bits.
+static_assert(kCubeRootTable[0] == 4520 && kCubeRootTable[kLinearUnit] == 32768);
+
+// ---- what the float kernels share
+
+// Four rows of four floats, by columns.
+inline float32x4x4_t columns(const float* row0, const float* row1, const float* row2, const float* row3) {
+#if defined(__ARM_NEON)
+  float32x4x4_t v = vld4q_dup_f32(row0);
+  v = vld4q_lane_f32(row1, v, 1);
+  v = vld4q_lane_f32(row2, v, 2);
+  return vld4q_lane_f32(row3, v, 3);
+#else
+  const float32x4_t r0 = vld1q_f32(row0), r1 = vld1q_f32(row1), r2 = vld1q_f32(row2), r3 = vld1q_f32(row3);
+  const float32x4_t even01 = vtrn1q_f32(r0, r1), odd01 = vtrn2q_f32(r0, r1);
+  const float32x4_t even23 = vtrn1q_f32(r2, r3), odd23 = vtrn2q_f32(r2, r3);
+  return {{vcombine_f32(vget_low_f32(even01), vget_low_f32(even23)),
+           vcombine_f32(vget_low_f32(odd01), vget_low_f32(odd23)),
+           vcombine_f32(vget_high_f32(even01), vget_high_f32(even23)),
+           vcombine_f32(vget_high_f32(odd01), vget_high_f32(odd23))}};
+#endif
+}
+
+// The spline's value at t / 1024, in piece k.
+inline float32x4_t valueIn(const Spline& spline, float32x4_t t, uint32x4_t k) {
+  const float32x4x4_t a =
+      columns(*lowEntry(spline.piece, lowPair(k)), *highEntry(spline.piece, lowPair(k)),
+              *lowEntry(spline.piece, highPair(k)), *highEntry(spline.piece, highPair(k)));
+  const float32x4_t u = vsubq_f32(t, vcvtq_f32_u32(k));
+  return vfmaq_f32(a.val[0], u, vfmaq_f32(a.val[1], u, vfmaq_f32(a.val[2], u, a.val[3])));
+}
+
+// One pixel through the vector form of `op`.
+template <typename Op>
+inline void pixelByVector(const Op& op, const typename Op::Src* in, typename Op::Dst* out) {
+  constexpr int kBlock = kBlockPixels<typename Op::Src>;
+  typename Op::Src src[kBlock * Op::kSrcChannels] = {};
+  typename Op::Dst dst[kBlock * Op::kDstChannels];
+  for (int i = 0; i < Op::kSrcChannels; ++i) {
+    src[i] = in[i];
+  }
+  storePixels(dst, op.vector(loadPixels<Op::kSrcChannels>(src)));
+  for (int i = 0; i < Op::kDstChannels; ++i) {
+    out[i] = dst[i];
+  }
+}
+
+// Where f changes from the line to the cube root, in linear light and in f, and the line.
+constexpr float kToe = 0.008856f;
+constexpr float kToeRoot = 0.20689271f;
+constexpr float kToeSlope = 7.787f;
+constexpr float kToeOffset = 0.13793103f;
+
+// ---- float BGR to Lab
+
+template <int nc>
+struct BgrToLabF32 {
+  using Src = float;
+  using Dst = float;
+  static constexpr int kSrcChannels = nc;
+  static constexpr int kDstChannels = 3;
+  static constexpr int kInFlight = 1;
+  static constexpr bool kUniform = true;
+
+  Pixels<float, 3> vector(const Pixels<float, nc>& p) const {
+    const float32x4_t b = linear(p.c[0]);
+    const float32x4_t g = linear(p.c[1]);
+    const float32x4_t r = linear(p.c[2]);
+    const float32x4_t x = weighted(b, g, r, 0.18982783f, 0.37621942f, 0.43395275f);
+    const float32x4_t y = weighted(b, g, r, 0.072169f, 0.71516f, 0.212671f);
+    const float32x4_t z = weighted(b, g, r, 0.87276554f, 0.109476514f, 0.017757913f);
+    const float32x4_t fx = root(x);
+    const float32x4_t fy = root(y);
+    const float32x4_t fz = root(z);
+    const float32x4_t l = vbslq_f32(vcgtq_f32(y, splat(kToe)), vfmaq_f32(splat(-16.0f), fy, splat(116.0f)),
+                                    vmulq_f32(y, splat(903.3f)));
+    return {{l, vmulq_f32(vsubq_f32(fx, fy), splat(500.0f)), vmulq_f32(vsubq_f32(fy, fz), splat(200.0f))}};
+  }
+
+  void scalar(const float* in, float* out) const { pixelByVector(*this, in, out); }
+
+ private:
+  // Beyond 0..1 the end pieces go on; a NaN stays one.
+  static float32x4_t linear(float32x4_t v) {
+    const float32x4_t t = vmulq_f32(v, splat(static_cast<float>(kSplineIntervals)));
+    const float32x4_t piece =
+        vminnmq_f32(vmaxnmq_f32(t, splat(0.0f)), splat(static_cast<float>(kSplineIntervals - 1)));
+    return valueIn(kExpansionSpline, t, vcvtq_u32_f32(piece));
+  }
+
+  static float32x4_t weighted(float32x4_t b, float32x4_t g, float32x4_t r, float wb, float wg, float wr) {
+    return vfmaq_f32(vfmaq_f32(vmulq_f32(g, splat(wg)), b, splat(wb)), r, splat(wr));
+  }
+
+  static float32x4_t root(float32x4_t t) {
+    float roots[4];
+    vst1q_f32(roots, t);
+    for (float& value : roots) {
+      value = value > kToe ? std::pow(value, 0.33333334f) : std::fma(value, kToeSlope, kToeOffset);
+    }
+    return vld1q_f32(roots);
+  }
+};
+
+// ---- Lab to BGR
+
+// Lab to linear light, both kernels' first half. The factors stand four to a register; a multiplication takes
+// one from its lane.
+class LabToLinear {
+ public:
+  // Linear blue, green and red of four pixels.
+  struct Linear {
+    float32x4_t c[3];
+  };
+
+  Linear operator()(float32x4_t l, float32x4_t a, float32x4_t b) const {
+    const float32x4_t toeOffset = splat(kToeOffset);
+    const uint32x4_t dark = vcleq_f32(l, splat(7.999625f));
+    const float32x4_t darkY = times<3>(l, blue_);
+    const float32x4_t darkRoot = plus<3>(toeOffset, darkY, green_);
+    const float32x4_t brightRoot = plus<3>(toeOffset, l, red_);
+    const float32x4_t fy = vbslq_f32(dark, darkRoot, brightRoot);
+    const float32x4_t y = vbslq_f32(dark, darkY, cubed(brightRoot));
+    const float32x4_t x = unrooted(plus<0>(fy, a, others_));
+    const float32x4_t z = unrooted(plus<1>(fy, b, others_));
+    return {{weighted(x, y, z, blue_), weighted(x, y, z, green_), weighted(x, y, z, red_)}};
+  }
+
+ private:
+  static float32x4_t factors(float f0, float f1, float f2, float f3) {
+    const float all[4] = {f0, f1, f2, f3};
+    return opaque(vld1q_f32(all));
+  }
+
+  template <int lane>
+  static float32x4_t times(float32x4_t v, float32x4_t factors) {
+    return vmulq_f32(v, vdupq_laneq_f32(factors, lane));
+  }
+  template <int lane>
+  static float32x4_t plus(float32x4_t sum, float32x4_t v, float32x4_t factors) {
+    return vfmaq_f32(sum, v, vdupq_laneq_f32(factors, lane));
+  }
+  static float32x4_t weighted(float32x4_t x, float32x4_t y, float32x4_t z, float32x4_t weights) {
+    return plus<2>(plus<1>(times<0>(x, weights), y, weights), z, weights);
+  }
+
+  static float32x4_t cubed(float32x4_t v) { return vmulq_f32(vmulq_f32(v, v), v); }
+
+  // The inverse of f.
+  float32x4_t unrooted(float32x4_t f) const {
+    return vbslq_f32(vcgtq_f32(f, splat(kToeRoot)), cubed(f),
+                     times<2>(vsubq_f32(f, splat(kToeOffset)), others_));
+  }
+
+  // Weights of X, Y, Z in a colour, and one of: Y of a dark L, its root, a bright L's root.
+  float32x4_t blue_ = factors(0.052890975f, -0.204043f, 1.1511517f, 0.001107052f);
+  float32x4_t green_ = factors(-0.9212352f, 1.875991f, 0.045244265f, kToeSlope);
+  float32x4_t red_ = factors(3.0799327f, -1.53715f, -0.542782f, 0.00862069f);
+  // A fx of a, fz of b, the inverse toe's slope.
+  float32x4_t others_ = factors(0.002f, -0.005f, 0.12841916f, 0);
+};
+
+template <int nc>
+struct LabToBgrF32 {
+  using Src = float;
+  using Dst = float;
+  static constexpr int kSrcChannels = 3;
+  static constexpr int kDstChannels = nc;
+  static constexpr int kInFlight = 2;
+  static constexpr bool kUniform = true;
+
+  Pixels<float, nc> vector(const Pixels<float, 3>& p) const {
+    const LabToLinear::Linear linear = linear_(p.c[0], p.c[1], p.c[2]);
+    return pixelsOf<nc, float>(compressed(linear.c[0]), compressed(linear.c[1]), compressed(linear.c[2]));
+  }
+
+  void scalar(const float* in, float* out) const { pixelByVector(*this, in, out); }
+
+ private:
+  // At 0 and below the curve is 0, at 1 and above the end of its last piece; a NaN stays one.
+  static float32x4_t compressed(float32x4_t v) {
+    const float32x4_t limited = vminq_f32(vmaxq_f32(v, splat(0.0f)), splat(1.0f));
+    const float32x4_t t = vmulq_f32(limited, splat(static_cast<float>(kSplineIntervals)));
+    return valueIn(kCompressionSpline, t, vminq_u32(vcvtq_u32_f32(t), vdupq_n_u32(kSplineIntervals - 1)));
+  }
+
+  LabToLinear linear_;
+};
+
+// A row of 8-bit Lab to BGR.
+template <int nc>
+struct LabToBgr8Row {
+  static constexpr int kGroup = 8;
+
+  const LabToLinear& linear;
+  const unsigned char* in;
+  unsigned char* out;
+
+  template <int n>
+  void block(ptrdiff_t x, Blocks<n>) const {
+    for (int i = 0; i < n; ++i) {
+      group(in + (x + i * kGroup) * 3, out + (x + i * kGroup) * nc);
+    }
+  }
+
+  void step(ptrdiff_t x) const {
+    unsigned char src[kGroup * 3] = {};
+    unsigned char dst[kGroup * nc];
+    memcpy(src, in + x * 3, 3);
+    group(src, dst);
+    memcpy(out + x * nc, dst, nc);
+  }
+
+ private:
+  void group(const unsigned char* src, unsigned char* dst) const {
+    const uint8x8x3_t lab = vld3_u8(src);
+    const uint16x8_t l = vmovl_u8(lab.val[0]);
+    const int16x8_t a = vreinterpretq_s16_u16(vsubl_u8(lab.val[1], vdup_n_u8(128)));
+    const int16x8_t b = vreinterpretq_s16_u16(vsubl_u8(lab.val[2], vdup_n_u8(128)));
+    const LabToLinear::Linear low =
+        linear(scaled(vget_low_u16(l)), whole(vget_low_s16(a)), whole(vget_low_s16(b)));
+    const LabToLinear::Linear high =
+        linear(scaled(vget_high_u16(l)), whole(vget_high_s16(a)), whole(vget_high_s16(b)));
+    uint8x8_t bgr[3];
+    for (int i = 0; i < 3; ++i) {
+      bgr[i] = vmovn_u16(vcombine_u16(compressed(low.c[i]), compressed(high.c[i])));
+    }
+    if constexpr (nc == 4) {
+      const uint8x8x4_t all = {{bgr[0], bgr[1], bgr[2], vdup_n_u8(255)}};
+      vst4_u8(dst, all);
+    } else {
+      const uint8x8x3_t all = {{bgr[0], bgr[1], bgr[2]}};
+      vst3_u8(dst, all);
+    }
+  }
+
+  static float32x4_t scaled(uint16x4_t l) {
+    return vmulq_f32(vcvtq_f32_u32(vmovl_u16(l)), splat(0.39215687f));
+  }
+  static float32x4_t whole(int16x4_t v) { return vcvtq_f32_s32(vmovl_s16(v)); }
+
+  // The nearest byte to 255 times the curve: see ByteTable.
+  static uint16x4_t compressed(float32x4_t v) {
+    const float32x4_t limited = vminq_f32(vmaxq_f32(v, splat(ByteTable::kFloor)), splat(0x1.fffffep-1f));
+    const uint32x4_t bits = vreinterpretq_u32_f32(limited);
+    const uint32x4_t index = vshrq_n_u32(bits, ByteTable::kShift);
+    // Where entry 0 would be, outside the table: an address that is only ever added to.
+    const uintptr_t zeroth =
+        reinterpret_cast<uintptr_t>(kCompressedBytes.entry) - ByteTable::kFirst * sizeof(uint32_t);
+    const auto* entries = reinterpret_cast<const uint32_t*>(zeroth);  // NOLINT(performance-no-int-to-ptr)
+    uint32x4_t entry = vld1q_dup_u32(lowEntry(entries, lowPair(index)));
+    entry = vld1q_lane_u32(highEntry(entries, lowPair(index)), entry, 1);
+    entry = vld1q_lane_u32(lowEntry(entries, highPair(index)), entry, 2);
+    entry = vld1q_lane_u32(highEntry(entries, highPair(index)), entry, 3);
+    return vaddhn_u32(entry, bits);
+  }
+};
+
+// The workers of the float kernels, and of 8-bit Lab to BGR.
+template <int nc>
+inline void cvt_color_bgr2lab_f32(int height, int width, int inWidthStride, const float* inData,
+                                  int outWidthStride, float* outData) {
+  forEachPixel(BgrToLabF32<nc>{}, height, width, inWidthStride, inData, outWidthStride, outData);
+}
+
+template <int nc>
+inline void cvt_color_lab2bgr_f32(int height, int width, int inWidthStride, const float* inData,
+                                  int outWidthStride, float* outData) {
+  forEachPixel(LabToBgrF32<nc>{}, height, width, inWidthStride, inData, outWidthStride, outData);
+}
+
+// A row is worked on in groups of 8 while the first pixel of the group lies below width - 3. The last group
+// may reach up to 4 pixels beyond the row: callers leave room for that, and may count on the row's end being
+// reached.
+template <int nc>
+inline void cvt_color_lab2bgr_uchar(int height, int width, int inWidthStride, const unsigned char* inData,
+                                    int outWidthStride, unsigned char* outData) {
+  using Row = LabToBgr8Row<nc>;
+  const ptrdiff_t grouped = width > 3 ? (static_cast<ptrdiff_t>(width) + 4) / Row::kGroup * Row::kGroup : 0;
+  const LabToLinear linear;
+  const ptrdiff_t length = grouped > width ? grouped : width;
+  for (ptrdiff_t y = 0; y < height; ++y) {
+    const Row row{linear, inData + y * inWidthStride, outData + y * outWidthStride};
+    walk<Row::kGroup, 2, 1>(
+        length, Tail::kSteps, [&](ptrdiff_t x, auto blocks) { row.block(x, blocks); },
+        [&](ptrdiff_t x) { row.step(x); });
+  }
+}
+
+template <int nc>
+inline void bgr2lab_uchar(int height, int width, int inWidthStride, const unsigned char* inData,
+                          int outWidthStride, unsigned char* outData) {
+  forEachPixel(BgrToLab8<nc>{}, height, width, inWidthStride, inData, outWidthStride, outData);
+}
+
+}  // namespace
+
+FASTCV_ENTRY(armBGR2LABImage, unsigned char, 3, 3, bgr2lab_uchar<3>)
+FASTCV_ENTRY(armBGR2LABImage, unsigned char, 4, 3, bgr2lab_uchar<4>)
+FASTCV_ENTRY(armBGR2LABImage, float, 3, 3, cvt_color_bgr2lab_f32<3>)
+FASTCV_ENTRY(armBGR2LABImage, float, 4, 3, cvt_color_bgr2lab_f32<4>)
+FASTCV_ENTRY(armLAB2BGRImage, unsigned char, 3, 3, cvt_color_lab2bgr_uchar<3>)
+FASTCV_ENTRY(armLAB2BGRImage, unsigned char, 3, 4, cvt_color_lab2bgr_uchar<4>)
+FASTCV_ENTRY(armLAB2BGRImage, float, 3, 3, cvt_color_lab2bgr_f32<3>)
+FASTCV_ENTRY(armLAB2BGRImage, float, 3, 4, cvt_color_lab2bgr_f32<4>)
+
+}  // namespace HPC::fastcv
