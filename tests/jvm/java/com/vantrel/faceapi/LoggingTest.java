@@ -37,7 +37,9 @@ public class LoggingTest {
             "I/FaceAPI: nv2BGR end",
             "I/FaceAPI: RGB2nv ",
             "I/FaceAPI: nv212BGR start",
-            "I/FaceAPI: nv212BGR end");
+            "I/FaceAPI: nv212BGR end",
+            "D/FaceAPI: rotateBGR degree: 270",
+            "D/FaceAPI: rotateBGR degree: 45");
 
     private static List<String> all(List<List<String>> parts) {
         List<String> lines = new ArrayList<>();
@@ -85,6 +87,9 @@ public class LoggingTest {
             for (int code : new int[] {1, 2, 3, 5, 20, 1001}) {
                 FaceLibrary.convertColorSpace(bytes, 16, 16, new byte[bytes.length], code);
             }
+            FaceLibrary.rotateBGR(bytes, 4, 4, new byte[bytes.length], 270, new int[2]);
+            FaceLibrary.rotateBGR(bytes, 4, 4, new byte[bytes.length], 45, new int[2]);
+            FaceLibrary.cropNv21Data(bytes, 4, 4, 0, 0, 4, 4, new byte[bytes.length]); // says nothing
         }
 
         private static void detector() {
