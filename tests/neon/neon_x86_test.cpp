@@ -131,6 +131,9 @@ STORE_ROW(vst1q_f32_x4, float, float32x4x4_t)
       const auto p = random<V>();                                          \
       const auto q = random<V>();                                          \
       EXPECT_SAME(vmovl_##t(a), simde_vmovl_##t(a));                       \
+      EXPECT_SAME(vshll_n_##t(a, 3), simde_vshll_n_##t(a, 3));             \
+      EXPECT_SAME(vcombine_##t(a, b), simde_vcombine_##t(a, b));           \
+      EXPECT_SAME(vget_high_##t(p), simde_vget_high_##t(p));               \
       EXPECT_SAME(vmull_##t(a, b), simde_vmull_##t(a, b));                 \
       EXPECT_SAME(vmlal_##t(c, a, b), simde_vmlal_##t(c, a, b));           \
       EXPECT_SAME(vmlsl_##t(c, a, b), simde_vmlsl_##t(c, a, b));           \
@@ -163,6 +166,7 @@ WIDENING(s16, int16x8_t, int16x4_t, int32x4_t)
       const auto b = random<H>()[0];                                                           \
       EXPECT_SAME(vmull_n_##t(a, b), simde_vmull_n_##t(a, b));                                 \
       EXPECT_SAME(vmlal_n_##t(c, a, b), simde_vmlal_n_##t(c, a, b));                           \
+      EXPECT_SAME(vmlsl_n_##t(c, a, b), simde_vmlsl_n_##t(c, a, b));                           \
       EXPECT_SAME(vmull_high_n_##t(p, b), simde_vmull_n_##t(simde_vget_high_##t(p), b));       \
       EXPECT_SAME(vmlal_high_n_##t(c, p, b), simde_vmlal_n_##t(c, simde_vget_high_##t(p), b)); \
     }                                                                                          \
@@ -170,6 +174,17 @@ WIDENING(s16, int16x8_t, int16x4_t, int32x4_t)
 
 WIDENING_BY_SCALAR(u16, uint16x8_t, uint16x4_t, uint32x4_t)
 WIDENING_BY_SCALAR(s16, int16x8_t, int16x4_t, int32x4_t)
+
+TEST(Products, Doubled) {
+  for (int i = 0; i < kTimes; ++i) {
+    auto a = random<int16x8_t>();
+    auto b = random<int16x8_t>();
+    // The one product that is limited.
+    a[i % 8] = b[i % 8] = INT16_MIN;
+    EXPECT_SAME(vqdmulhq_s16(a, b), simde_vqdmulhq_s16(a, b));
+    EXPECT_SAME(vqdmulhq_n_s16(a, b[0]), simde_vqdmulhq_n_s16(a, b[0]));
+  }
+}
 
 #define PRODUCTS(t, V)                                               \
   TEST(Products, t) {                                                \
@@ -321,6 +336,20 @@ BY_1_TO_8(ROUNDING_SHIFTS, u32, uint32x4_t)
 BY_9_TO_16(ROUNDING_SHIFTS, u32, uint32x4_t)
 BY_1_TO_8(ROUNDING_SHIFTS, s32, int32x4_t)
 BY_9_TO_16(ROUNDING_SHIFTS, s32, int32x4_t)
+
+#define HALVES(t, V, H)                                          \
+  TEST(Halves, t) {                                              \
+    for (int i = 0; i < kTimes; ++i) {                           \
+      const auto a = random<H>();                                \
+      const auto b = random<H>();                                \
+      const auto c = random<V>();                                \
+      EXPECT_SAME(vcombine_##t(a, b), simde_vcombine_##t(a, b)); \
+      EXPECT_SAME(vget_high_##t(c), simde_vget_high_##t(c));     \
+    }                                                            \
+  }
+
+HALVES(u32, uint32x4_t, uint32x2_t)
+HALVES(s32, int32x4_t, int32x2_t)
 
 #define TRANSPOSES(t, V)                                     \
   TEST(Transposes, t) {                                      \

@@ -156,6 +156,16 @@ inline Wide<V> mullHigh(V a, Element<V> b) {
   return mullHigh(a, V{} + b);
 }
 
+// The upper halves of twice the products, limited: only -2^15 squared is too much.
+inline int16x8_t doubledProduct(int16x8_t a, int16x8_t b) {
+  const __m128i upper = _mm_mulhi_epi16(m(a), m(b));
+  const __m128i doubled =
+      _mm_add_epi16(_mm_add_epi16(upper, upper), _mm_srli_epi16(_mm_mullo_epi16(m(a), m(b)), 15));
+  const __m128i tooMuch = _mm_cmpeq_epi16(doubled, _mm_set1_epi16(INT16_MIN));
+  return as<int16x8_t>(_mm_xor_si128(doubled, tooMuch));
+}
+inline int16x8_t doubledProduct(int16x8_t a, int16_t b) { return doubledProduct(a, int16x8_t{} + b); }
+
 // ---- narrowing
 
 // Lanes that fit in half their width, as unsigned.
@@ -536,11 +546,39 @@ inline void storeRow(T* p, const Vectors& v) {
 #undef vst1q_f32_x4
 #define vst1q_f32_x4(p, ...) neon_x86::storeRow(p, __VA_ARGS__)
 
+// halves
+#undef vcombine_u8
+#define vcombine_u8(a, b) neon_x86::joined(a, b)
+#undef vget_high_u8
+#define vget_high_u8(a) neon_x86::high(a)
+#undef vcombine_s8
+#define vcombine_s8(a, b) neon_x86::joined(a, b)
+#undef vget_high_s8
+#define vget_high_s8(a) neon_x86::high(a)
+#undef vcombine_u16
+#define vcombine_u16(a, b) neon_x86::joined(a, b)
+#undef vget_high_u16
+#define vget_high_u16(a) neon_x86::high(a)
+#undef vcombine_s16
+#define vcombine_s16(a, b) neon_x86::joined(a, b)
+#undef vget_high_s16
+#define vget_high_s16(a) neon_x86::high(a)
+#undef vcombine_u32
+#define vcombine_u32(a, b) neon_x86::joined(a, b)
+#undef vget_high_u32
+#define vget_high_u32(a) neon_x86::high(a)
+#undef vcombine_s32
+#define vcombine_s32(a, b) neon_x86::joined(a, b)
+#undef vget_high_s32
+#define vget_high_s32(a) neon_x86::high(a)
+
 // widening
 #undef vmovl_u8
 #define vmovl_u8(a) neon_x86::movl(a)
 #undef vmovl_high_u8
 #define vmovl_high_u8(a) neon_x86::movlHigh(a)
+#undef vshll_n_u8
+#define vshll_n_u8(a, n) (neon_x86::movl(a) << (n))
 #undef vmull_u8
 #define vmull_u8(a, b) neon_x86::mull(a, b)
 #undef vmull_high_u8
@@ -573,6 +611,8 @@ inline void storeRow(T* p, const Vectors& v) {
 #define vmovl_s8(a) neon_x86::movl(a)
 #undef vmovl_high_s8
 #define vmovl_high_s8(a) neon_x86::movlHigh(a)
+#undef vshll_n_s8
+#define vshll_n_s8(a, n) (neon_x86::movl(a) << (n))
 #undef vmull_s8
 #define vmull_s8(a, b) neon_x86::mull(a, b)
 #undef vmull_high_s8
@@ -605,6 +645,8 @@ inline void storeRow(T* p, const Vectors& v) {
 #define vmovl_u16(a) neon_x86::movl(a)
 #undef vmovl_high_u16
 #define vmovl_high_u16(a) neon_x86::movlHigh(a)
+#undef vshll_n_u16
+#define vshll_n_u16(a, n) (neon_x86::movl(a) << (n))
 #undef vmull_u16
 #define vmull_u16(a, b) neon_x86::mull(a, b)
 #undef vmull_high_u16
@@ -637,6 +679,8 @@ inline void storeRow(T* p, const Vectors& v) {
 #define vmovl_s16(a) neon_x86::movl(a)
 #undef vmovl_high_s16
 #define vmovl_high_s16(a) neon_x86::movlHigh(a)
+#undef vshll_n_s16
+#define vshll_n_s16(a, n) (neon_x86::movl(a) << (n))
 #undef vmull_s16
 #define vmull_s16(a, b) neon_x86::mull(a, b)
 #undef vmull_high_s16
@@ -669,6 +713,8 @@ inline void storeRow(T* p, const Vectors& v) {
 #define vmull_n_u16(a, b) neon_x86::mull(a, b)
 #undef vmull_high_n_u16
 #define vmull_high_n_u16(a, b) neon_x86::mullHigh(a, b)
+#undef vmlsl_n_u16
+#define vmlsl_n_u16(c, a, b) ((c) - neon_x86::mull(a, b))
 #undef vmlal_n_u16
 #define vmlal_n_u16(c, a, b) ((c) + neon_x86::mull(a, b))
 #undef vmlal_high_n_u16
@@ -677,6 +723,8 @@ inline void storeRow(T* p, const Vectors& v) {
 #define vmull_n_s16(a, b) neon_x86::mull(a, b)
 #undef vmull_high_n_s16
 #define vmull_high_n_s16(a, b) neon_x86::mullHigh(a, b)
+#undef vmlsl_n_s16
+#define vmlsl_n_s16(c, a, b) ((c) - neon_x86::mull(a, b))
 #undef vmlal_n_s16
 #define vmlal_n_s16(c, a, b) ((c) + neon_x86::mull(a, b))
 #undef vmlal_high_n_s16
@@ -687,6 +735,10 @@ inline void storeRow(T* p, const Vectors& v) {
 #define vmulq_n_s16(a, b) neon_x86::product(a, b)
 #undef vmulq_n_u16
 #define vmulq_n_u16(a, b) neon_x86::product(a, b)
+#undef vqdmulhq_s16
+#define vqdmulhq_s16(a, b) neon_x86::doubledProduct(a, b)
+#undef vqdmulhq_n_s16
+#define vqdmulhq_n_s16(a, b) neon_x86::doubledProduct(a, b)
 #undef vmlaq_n_s16
 #define vmlaq_n_s16(c, a, b) ((c) + neon_x86::product(a, b))
 #undef vmlaq_n_u16
