@@ -86,8 +86,11 @@ int ky_face_algorithm_info() {
     const int written = std::printf(
         "kyface open engine %s, dlib %d.%d.%d\n"
         "  detector: frontal faces by histograms of oriented gradients; built in\n"
-        "  landmarks: from a model file of the caller's\n",
-        KY_ENGINE_VERSION, DLIB_MAJOR_VERSION, DLIB_MINOR_VERSION, DLIB_PATCH_VERSION);
+        "  landmarks: from a model file of the caller's\n"
+        "  tracker: the detector, and correlation filters between its frames\n"
+        "  verifier: uniform local binary patterns, version %d, %d bytes a feature\n",
+        KY_ENGINE_VERSION, DLIB_MAJOR_VERSION, DLIB_MINOR_VERSION, DLIB_PATCH_VERSION, KY_VERIFY_VERSION,
+        KY_FEATURE_LENGTH);
     Require(written > 0 && std::fflush(stdout) == 0, KY_ERROR_INTERNAL);
   });
 }

@@ -82,8 +82,30 @@ typedef enum ky_config_t {
 #define KY_MIN_ALIGNMENT_THRESHOLD 0
 #define KY_MAX_ALIGNMENT_THRESHOLD 100
 
-/// Result codes: one for each kind of failure. A function that fails writes nothing but null pointers and
-/// zero counts.
+/// A verifier describes what is seen in a face by uniform local binary patterns. Two features of one model
+/// compare to a similarity: 1 for the same picture, 0.5 at the border between the same face in another frame
+/// and something else, 0 for nothing in common. That tells a face that is followed from what it might be
+/// confused with; it is not meant to prove who somebody is.
+///
+/// The crop that is described goes by the eyes when the face record has the landmarks of a model of 68 or 5
+/// points, or when the verifier was created with such a model of its own (its model path names a
+/// `dlib::shape_predictor`; NULL is the built-in way without one); it is upright then. Otherwise it is the
+/// face's rectangle as the frame shows it, so that features compare between frames of one orientation.
+///
+/// A feature has KY_FEATURE_LENGTH bytes, and its text is as long as every text of a feature,
+/// KY_FEATURE_TEXT_LENGTH bytes with the terminating zero. A text that is not exactly one that was written is
+/// refused; no text is read beyond its zero or its full length. For no verifier at all, version and length
+/// are KY_ERROR_HANDLE.
+#define KY_VERIFY_VERSION 1
+#define KY_FEATURE_LENGTH 3783
+#define KY_FEATURE_TEXT_LENGTH 5045
+
+/// Smallest face that a feature is taken of: the longer side of its rectangle, or twice the distance of its
+/// eyes, in pixels.
+#define KY_SMALLEST_VERIFIED_FACE 16
+
+/// Result codes: one for each kind of failure. A function that fails writes nothing but null pointers,
+/// zero counts and zero scores.
 typedef enum ky_result_t {
   KY_SUCCESS = 0,
   KY_ERROR_NULL_POINTER = -1,     ///< a pointer that must not be null is
@@ -96,8 +118,8 @@ typedef enum ky_result_t {
   KY_ERROR_RANGE = -8,            ///< a setting is outside its range
   KY_ERROR_MODEL_FILE = -9,       ///< the model file cannot be opened
   KY_ERROR_MODEL = -10,           ///< the model file holds no model that fits
-  KY_ERROR_LANDMARK_MODEL = -11,  ///< the file beside the model holds no landmark model that fits
-  KY_ERROR_FACE = -12,            ///< the face record cannot belong to the frame
+  KY_ERROR_LANDMARK_MODEL = -11,  ///< the file beside the model is no landmark model that fits
+  KY_ERROR_FACE = -12,            ///< the face record cannot belong to the frame, or the face is too small
   KY_ERROR_FEATURE = -13,         ///< the feature is null, released, or no feature
   KY_ERROR_MEMORY = -14,          ///< not enough memory
   KY_ERROR_INTERNAL = -15         ///< anything else
@@ -114,7 +136,8 @@ typedef enum ky_result_t {
 // of each eye, and the nose), also gives the eye distance in pixels and the roll, and one of 68 points yaw
 // and pitch. Angles are in degrees and describe the face in the upright frame, as the viewer sees it: yaw is
 // positive when the nose points to the viewer's right, pitch when it points down, roll when the head leans
-// clockwise.
+// clockwise. Yaw and pitch are estimates from an average head: a smile, which lifts the corners of the mouth,
+// reads as a nod.
 #define KY_LANDMARKS_SUFFIX ".landmarks"
 
 #ifdef __cplusplus

@@ -32,13 +32,13 @@ struct HeadPoint {
   double z;
 };
 
-// An average adult head, in units of a fifteenth of a millimetre about the tip of the nose.
-constexpr std::array<HeadPoint, 6> kHead = {{{30, 0, 0, 0},
-                                             {8, 0, 330, -65},
-                                             {36, -225, -170, -135},
-                                             {45, 225, -170, -135},
-                                             {48, -150, 150, -125},
-                                             {54, 150, 150, -125}}};
+// As seen from the front, the mean of the faces that models of 68 points are trained with; in depth, an
+// average adult head. The eyes' outer corners are 450 apart.
+constexpr std::array<HeadPoint, 5> kHead = {{{30, 0, 0, 0},
+                                             {36, -225, -183, -135},
+                                             {45, 225, -183, -135},
+                                             {48, -144, 162, -125},
+                                             {54, 144, 162, -125}}};
 
 }  // namespace
 

@@ -94,7 +94,7 @@ bool Reads(Read read) {
 
 }  // namespace
 
-std::shared_ptr<const LandmarkModel> LoadLandmarks(const char* path) {
+std::shared_ptr<const LandmarkModel> LoadLandmarks(const char* path, ky_result_t misfit) {
   // A file that was replaced is another file.
   using File = std::tuple<std::string, uintmax_t, std::filesystem::file_time_type>;
   static std::mutex mutex;
@@ -112,7 +112,7 @@ std::shared_ptr<const LandmarkModel> LoadLandmarks(const char* path) {
     }
   }
   std::shared_ptr<const LandmarkModel> model;
-  Require(Reads([&] { model = std::make_shared<const LandmarkModel>(in); }), KY_ERROR_LANDMARK_MODEL);
+  Require(Reads([&] { model = std::make_shared<const LandmarkModel>(in); }), misfit);
   loaded[file] = model;
   return model;
 }
@@ -125,11 +125,9 @@ Model LoadModel(const char* path) {
   Detector detector;
   if (Reads([&] { detector = ReadDetector(in); })) {
     const std::string beside = std::string(path) + KY_LANDMARKS_SUFFIX;
-    return {detector, Exists(beside) ? LoadLandmarks(beside.c_str()) : nullptr};
+    return {detector, Exists(beside) ? LoadLandmarks(beside.c_str(), KY_ERROR_LANDMARK_MODEL) : nullptr};
   }
-  std::shared_ptr<const LandmarkModel> landmarks;
-  Require(Reads([&] { landmarks = LoadLandmarks(path); }), KY_ERROR_MODEL);
-  return {BuiltInDetector(), landmarks};
+  return {BuiltInDetector(), LoadLandmarks(path, KY_ERROR_MODEL)};
 }
 
 }  // namespace kyengine

@@ -17,7 +17,8 @@ struct Model {
 /// Loads what `path` names, as `ky_engine.h` describes; throws Failure.
 Model LoadModel(const char* path);
 
-/// Loads a landmark model; throws Failure. Handles created from one file share it: such models are large.
-std::shared_ptr<const LandmarkModel> LoadLandmarks(const char* path);
+/// Loads a landmark model; throws Failure, with the code `misfit` when the file holds something else. Handles
+/// created from one file share it: such models are large.
+std::shared_ptr<const LandmarkModel> LoadLandmarks(const char* path, ky_result_t misfit);
 
 }  // namespace kyengine

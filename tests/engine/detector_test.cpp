@@ -319,7 +319,9 @@ TEST(DetectorTest, TellsAboutItself) {
   EXPECT_EQ(KY_SUCCESS, ky_face_algorithm_info());
   const std::string text = testing::internal::GetCapturedStdout();
   EXPECT_NE(std::string::npos, text.find("dlib 19.")) << text;
-  EXPECT_NE(std::string::npos, text.find("detector")) << text;
+  for (const char* part : {"detector", "landmarks", "tracker", "verifier"}) {
+    EXPECT_NE(std::string::npos, text.find(part)) << text;
+  }
 }
 
 }  // namespace

@@ -77,6 +77,23 @@ inline int Track(ky_handle_t tracker, const TestFrame& f, Tracked& faces) {
                        &faces.faces, &faces.count);
 }
 
+/// A feature, released when it goes.
+class Feature {
+ public:
+  Feature() = default;
+  ~Feature() { ky_verify_release_feature(feature); }
+  Feature(const Feature&) = delete;
+  Feature& operator=(const Feature&) = delete;
+
+  ky_feature_t feature = nullptr;
+  int length = 0;
+};
+
+inline int GetFeature(ky_handle_t verifier, const TestFrame& f, const ky_face_t& face, Feature& feature) {
+  return ky_verify_get_feature(verifier, f.bytes.data(), f.format, f.width, f.height, f.stride, &face,
+                               &feature.feature, &feature.length);
+}
+
 inline void ExpectRect(const ky_rect_t& expected, const ky_rect_t& rect, int tolerance) {
   EXPECT_NEAR(expected.left, rect.left, tolerance);
   EXPECT_NEAR(expected.top, rect.top, tolerance);

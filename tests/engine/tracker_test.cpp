@@ -11,7 +11,7 @@
 namespace kyengine::test {
 namespace {
 
-constexpr int kSide = 176;
+constexpr int kSide = 152;
 
 /// A tracker of faces as large as the portrait's that looks for them in every `interval`-th frame.
 class EveryNth : public Tracker {
@@ -35,9 +35,9 @@ struct Shot {
   }
 
  private:
-  static double X(int i) { return 240 - 2 * i; }
-  static double Y(int i) { return 140 - i; }
-  static double Zoom(int i) { return 1 + 0.008 * i; }
+  static double X(int i) { return 234 - 1.5 * i; }
+  static double Y(int i) { return 134 - i; }
+  static double Zoom(int i) { return 1 + 0.006 * i; }
   static double Roll(int i) { return 0.4 * i; }
 };
 
@@ -85,7 +85,7 @@ int TrackOne(ky_handle_t tracker, const Picture& picture) {
 TEST(TrackerTest, OneIdentityThroughAPan) {
   const EveryNth tracker(6);
   int id = 0;
-  for (int i = 0; i < 20; ++i) {
+  for (int i = 0; i < 16; ++i) {
     const Shot shot(i);
     Tracked faces;
     ASSERT_EQ(KY_SUCCESS, Track(tracker, TestFrame(shot.picture, KY_PIXEL_NV21), faces));

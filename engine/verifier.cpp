@@ -1,0 +1,154 @@
+/// Verifiers: features of faces, and the C interface to them.
+#include <algorithm>
+#include <cmath>
+#include <memory>
+#include <optional>
+#include <vector>
+
+#include "feature.h"
+#include "handles.h"
+#include "model.h"
+
+namespace kyengine {
+namespace {
+
+// Where the eyes are in the detector's boxes: crops by the eyes and by the box show about the same.
+constexpr double kEyeDistance = 0.49;  // of the side of the crop
+constexpr double kEyesAboveCentre = 0.235;
+
+FaceCrop CropByEyes(const Eyes& eyes) {
+  const dlib::dpoint across = eyes.right - eyes.left;
+  const double side = dlib::length(across) / kEyeDistance;
+  const dlib::dpoint down = dlib::dpoint(-across.y(), across.x()) / dlib::length(across);
+  return {(eyes.left + eyes.right) / 2 + down * (kEyesAboveCentre * side), side,
+          std::atan2(across.y(), across.x())};
+}
+
+/// The box of a record, with its last row and column as dlib has them. Throws Failure when it is empty.
+dlib::drectangle BoxOf(const ky_face_t& face) {
+  Require(face.rect.left < face.rect.right && face.rect.top < face.rect.bottom, KY_ERROR_FACE);
+  return {static_cast<double>(face.rect.left), static_cast<double>(face.rect.top), face.rect.right - 1.0,
+          face.rect.bottom - 1.0};
+}
+
+/// The points of a record. Throws Failure when they cannot be.
+std::vector<dlib::dpoint> PointsOf(const ky_face_t& face) {
+  Require(face.points_count >= 0 && face.points_count <= KY_FACE_MAX_POINTS, KY_ERROR_FACE);
+  std::vector<dlib::dpoint> points;
+  for (int i = 0; i < face.points_count; ++i) {
+    const ky_pointf_t p = face.points_array[i];
+    Require(std::isfinite(p.x) && std::isfinite(p.y), KY_ERROR_FACE);
+    points.emplace_back(p.x, p.y);
+  }
+  return points;
+}
+
+/// Takes features. Holds nothing that a call changes, so that calls need not wait for one another.
+class Verifier {
+ public:
+  explicit Verifier(const char* model_path) {
+    if (model_path != nullptr) {
+      landmarks_ = LoadLandmarks(model_path, KY_ERROR_MODEL);
+    }
+  }
+
+  Feature Extract(const Frame& frame, const ky_face_t& face) const {
+    const dlib::drectangle box = BoxOf(face);
+    std::vector<dlib::dpoint> points = PointsOf(face);
+    const dlib::drectangle view(0, 0, frame.upright_width() - 1.0, frame.upright_height() - 1.0);
+    Require(view.contains(dlib::center(box)), KY_ERROR_FACE);
+    Require(std::max(box.width(), box.height()) <= 2 * std::max(view.width(), view.height()), KY_ERROR_FACE);
+    GrayImage gray;
+    frame.ToUprightGray(gray);
+
+    Eyes eyes;
+    bool aligned = FindEyes(points, &eyes);
+    if (!aligned && landmarks_ != nullptr) {
+      aligned = FindEyes(landmarks_->Locate(gray, box), &eyes);
+    }
+    const FaceCrop crop =
+        aligned ? CropByEyes(eyes) : FaceCrop{dlib::center(box), std::max(box.width(), box.height()), 0};
+    Require(crop.side >= KY_SMALLEST_VERIFIED_FACE && view.contains(crop.centre), KY_ERROR_FACE);
+    Require(crop.side <= 2 * std::max(view.width(), view.height()), KY_ERROR_FACE);
+    return ExtractFeature(gray, crop);
+  }
+
+ private:
+  std::shared_ptr<const LandmarkModel> landmarks_;
+};
+
+using Verifiers = Handles<Verifier>;
+using Features = Handles<Feature>;
+
+/// What a verifier says of itself, or KY_ERROR_HANDLE when `handle` names none.
+int Constant(ky_handle_t handle, int value) {
+  const int result = Guarded([&] { Verifiers::Find(handle); });
+  return result == KY_SUCCESS ? value : result;
+}
+
+}  // namespace
+}  // namespace kyengine
+
+using kyengine::Feature;
+using kyengine::Features;
+using kyengine::Frame;
+using kyengine::Guarded;
+using kyengine::Require;
+using kyengine::Verifiers;
+
+int ky_verify_create_handle(ky_handle_t* handle, const char* model_path) {
+  return Verifiers::Create(handle, model_path);
+}
+
+void ky_verify_destroy_handle(ky_handle_t handle) { Verifiers::Destroy(handle); }
+
+int ky_verify_get_version(ky_handle_t handle) { return kyengine::Constant(handle, KY_VERIFY_VERSION); }
+
+int ky_verify_get_feature_length(ky_handle_t handle) { return kyengine::Constant(handle, KY_FEATURE_LENGTH); }
+
+int ky_verify_get_feature(ky_handle_t handle, const unsigned char* image, int pixel_format, int width,
+                          int height, int stride, const ky_face_t* face, ky_feature_t* feature, int* length) {
+  return Guarded([&] {
+    Require(feature != nullptr && length != nullptr, KY_ERROR_NULL_POINTER);
+    *feature = nullptr;
+    *length = 0;
+    const auto verifier = Verifiers::Find(handle);
+    Require(face != nullptr, KY_ERROR_NULL_POINTER);
+    const Frame frame(image, pixel_format, width, height, stride, KY_ORIENTATION_0);
+    *feature = Features::Add(std::make_shared<Feature>(verifier->Extract(frame, *face)));
+    *length = KY_FEATURE_LENGTH;
+  });
+}
+
+void ky_verify_serialize_feature(ky_feature_t feature, char* text) {
+  if (text == nullptr) {
+    return;
+  }
+  *text = '\0';  // what is no feature has the empty text
+  Guarded([&] { kyengine::WriteText(*Features::Find(feature, KY_ERROR_FEATURE), text); });
+}
+
+ky_feature_t ky_verify_deserialize_feature(const char* text) {
+  ky_feature_t feature = nullptr;
+  Guarded([&] {
+    Require(text != nullptr, KY_ERROR_NULL_POINTER);
+    const std::optional<Feature> read = kyengine::ReadText(text);
+    Require(read.has_value(), KY_ERROR_FEATURE);
+    feature = Features::Add(std::make_shared<Feature>(*read));
+  });
+  return feature;
+}
+
+int ky_verify_compare_feature(ky_handle_t handle, ky_feature_t feature1, ky_feature_t feature2,
+                              float* score) {
+  return Guarded([&] {
+    Require(score != nullptr, KY_ERROR_NULL_POINTER);
+    *score = 0;
+    Verifiers::Find(handle);
+    const auto a = Features::Find(feature1, KY_ERROR_FEATURE);
+    const auto b = Features::Find(feature2, KY_ERROR_FEATURE);
+    *score = kyengine::Similarity(*a, *b);
+  });
+}
+
+void ky_verify_release_feature(ky_feature_t feature) { Features::Destroy(feature); }

@@ -1,0 +1,342 @@
+// Model files: detectors and landmark models that dlib serialized, and everything else.
+#include "dlib_config.h"
+// The configuration of dlib comes first.
+#include <dlib/image_processing/frontal_face_detector.h>
+#include <dlib/image_processing/shape_predictor.h>
+#include <dlib/serialize.h>
+
+#include <cmath>
+#include <cstdio>
+#include <fstream>
+#include <map>
+#include <sstream>
+#include <string>
+
+#include "engine_calls.h"
+
+namespace kyengine::test {
+namespace {
+
+constexpr int kSide = 128;
+const Picture& AboutFace() {
+  static const Picture part = Part(Portrait(), 160, 60, kSide, kSide);
+  return part;
+}
+
+std::string Bytes(const dlib::frontal_face_detector& detector) {
+  std::ostringstream out;
+  serialize(detector, out);
+  return out.str();
+}
+
+const std::string& BuiltIn() {
+  static const std::string bytes = Bytes(dlib::get_frontal_face_detector());
+  return bytes;
+}
+
+/// A landmark model that puts its points at the same places of every box, given from 0 to 1 in both
+/// directions.
+std::string Landmarks(const std::vector<ky_pointf_t>& points) {
+  dlib::matrix<float, 0, 1> shape(static_cast<long>(2 * points.size()));
+  for (size_t i = 0; i < points.size(); ++i) {
+    shape(static_cast<long>(2 * i)) = points[i].x;
+    shape(static_cast<long>(2 * i + 1)) = points[i].y;
+  }
+  std::ostringstream out;
+  serialize(dlib::shape_predictor(shape, {}, {}), out);
+  return out.str();
+}
+
+/// Points of a model of five: the eyes' centres at the given places.
+std::vector<ky_pointf_t> FivePoints(ky_pointf_t left, ky_pointf_t right) {
+  return {{right.x + 0.08F, right.y},
+          {right.x - 0.08F, right.y},
+          {left.x - 0.08F, left.y},
+          {left.x + 0.08F, left.y},
+          {0.5F, 0.6F}};
+}
+
+class ModelTest : public testing::Test {
+ protected:
+  void TearDown() override {
+    for (const std::string& path : written_) {
+      std::remove(path.c_str());
+    }
+  }
+
+  std::string Write(const std::string& name, const std::string& bytes) {
+    const std::string path = testing::TempDir() + "ky_engine_" + name;
+    std::ofstream(path, std::ios::binary) << bytes;
+    written_.push_back(path);
+    return path;
+  }
+
+  static int CreateDetector(const std::string& path) {
+    ky_handle_t handle = nullptr;
+    const int result = ky_face_create_detector(&handle, path.c_str(), KY_CONFIG_DEFAULT);
+    EXPECT_EQ(result == KY_SUCCESS, handle != nullptr);
+    ky_face_destroy_detector(handle);
+    return result;
+  }
+
+  /// The one face in a frame about the portrait's.
+  static ky_face_t FaceWith(const char* model, int orientation = KY_ORIENTATION_0) {
+    const Detector detector(KY_CONFIG_LARGE_FACES, model);
+    Detected faces;
+    EXPECT_EQ(KY_SUCCESS, Detect(detector, TestFrame(AboutFace(), KY_PIXEL_GRAY, orientation), faces));
+    EXPECT_EQ(1, faces.count);
+    return faces.count == 1 ? faces[0] : ky_face_t{};
+  }
+
+  std::vector<std::string> written_;
+};
+
+TEST_F(ModelTest, SerializedDetectorFindsWhatItWouldFind) {
+  const std::string path = Write("detector", BuiltIn());
+  const ky_face_t expected = FaceWith(nullptr);
+  const ky_face_t face = FaceWith(path.c_str());
+  ExpectRect(expected.rect, face.rect, 0);
+  EXPECT_EQ(expected.score, face.score);
+  EXPECT_EQ(0, face.points_count);
+
+  ky_handle_t tracker = nullptr;
+  EXPECT_EQ(KY_SUCCESS, ky_face_create_tracker(&tracker, path.c_str(), KY_CONFIG_DEFAULT));
+  Tracked tracked;
+  EXPECT_EQ(KY_SUCCESS, Track(tracker, TestFrame(AboutFace()), tracked));
+  EXPECT_EQ(1, tracked.count);
+  ky_face_destroy_tracker(tracker);
+}
+
+TEST_F(ModelTest, DetectorOfOneFilterIsAnother) {
+  // The third filter alone sees faces that look to a side, which the portrait's does not.
+  const dlib::frontal_face_detector all = dlib::get_frontal_face_detector();
+  const dlib::frontal_face_detector one(all.get_scanner(), all.get_overlap_tester(), all.get_w(2));
+  const std::string path = Write("one", Bytes(one));
+  const Detector detector(KY_CONFIG_LARGE_FACES, path.c_str());
+  Detected faces;
+  ASSERT_EQ(KY_SUCCESS, Detect(detector, TestFrame(AboutFace()), faces));
+  EXPECT_EQ(0, faces.count);
+}
+
+TEST_F(ModelTest, FilesThatCannotBeOpened) {
+  EXPECT_EQ(KY_ERROR_MODEL_FILE, CreateDetector(""));
+  EXPECT_EQ(KY_ERROR_MODEL_FILE, CreateDetector(testing::TempDir() + "ky_engine_there_is_none"));
+  ky_handle_t handle = nullptr;
+  EXPECT_EQ(KY_ERROR_MODEL_FILE, ky_face_create_tracker(&handle, "/no/such/model", KY_CONFIG_DEFAULT));
+  EXPECT_EQ(KY_ERROR_MODEL_FILE, ky_verify_create_handle(&handle, ""));
+  EXPECT_EQ(nullptr, handle);
+}
+
+TEST_F(ModelTest, FilesThatHoldSomethingElse) {
+  EXPECT_EQ(KY_ERROR_MODEL, CreateDetector(testing::TempDir())) << "a folder";
+  EXPECT_EQ(KY_ERROR_MODEL, CreateDetector(Write("empty", "")));
+  EXPECT_EQ(KY_ERROR_MODEL, CreateDetector(Write("text", "This is no model, however long one reads on.")));
+  EXPECT_EQ(KY_ERROR_MODEL, CreateDetector(Write("zeros", std::string(5000, '\0'))));
+  EXPECT_EQ(KY_ERROR_MODEL, CreateDetector(Write("ones", std::string(5000, '\1'))));
+  EXPECT_EQ(KY_ERROR_MODEL, CreateDetector(KY_PORTRAIT));
+
+  ky_handle_t handle = nullptr;
+  EXPECT_EQ(KY_ERROR_MODEL, ky_face_create_tracker(&handle, Write("text", "none").c_str(), 0));
+  EXPECT_EQ(KY_ERROR_MODEL, ky_verify_create_handle(&handle, Write("text", "none").c_str()));
+  EXPECT_EQ(KY_ERROR_MODEL, ky_verify_create_handle(&handle, Write("detector", BuiltIn()).c_str()))
+      << "a verifier takes landmarks alone";
+}
+
+TEST_F(ModelTest, TruncatedFilesAreRefused) {
+  const std::string landmarks = Landmarks(FivePoints({0.3F, 0.3F}, {0.7F, 0.3F}));
+  for (const std::string& whole : {BuiltIn(), landmarks}) {
+    ASSERT_EQ(KY_SUCCESS, CreateDetector(Write("whole", whole)));
+    for (const size_t length : {size_t{1}, size_t{2}, size_t{5}, size_t{10}, whole.size() / 3,
+                                whole.size() / 2, whole.size() - 2, whole.size() - 1}) {
+      EXPECT_EQ(KY_ERROR_MODEL, CreateDetector(Write("truncated", whole.substr(0, length)))) << length;
+    }
+  }
+}
+
+TEST_F(ModelTest, DetectorsWhosePartsDoNotFitAreRefused) {
+  const dlib::frontal_face_detector good = dlib::get_frontal_face_detector();
+  using Weights = dlib::frontal_face_detector::feature_vector_type;
+  const Weights weights = good.get_w(0);
+  const auto write = [&](int version, const std::vector<Weights>& filters, unsigned long count) {
+    std::ostringstream out;
+    dlib::serialize(version, out);
+    dlib::scan_fhog_pyramid<dlib::pyramid_down<6>> scanner;
+    scanner.copy_configuration(good.get_scanner());
+    serialize(scanner, out);
+    serialize(good.get_overlap_tester(), out);
+    dlib::serialize(count, out);
+    for (const Weights& w : filters) {
+      dlib::serialize(w, out);
+    }
+    return Write("parts", out.str());
+  };
+  EXPECT_EQ(KY_SUCCESS, CreateDetector(write(2, {weights}, 1)));
+  EXPECT_EQ(KY_ERROR_MODEL, CreateDetector(write(3, {weights}, 1)));
+  EXPECT_EQ(KY_ERROR_MODEL, CreateDetector(write(2, {}, 0)));
+  EXPECT_EQ(KY_ERROR_MODEL, CreateDetector(write(2, {weights}, 1000000000)));
+  const Weights shorter = dlib::rowm(weights, dlib::range(0, weights.size() - 2));
+  const Weights none;
+  EXPECT_EQ(KY_ERROR_MODEL, CreateDetector(write(2, {shorter}, 1)));
+  EXPECT_EQ(KY_ERROR_MODEL, CreateDetector(write(2, {weights, none}, 2)));
+}
+
+// ---- landmarks
+// -----------------------------------------------------------------------------------------------
+
+TEST_F(ModelTest, LandmarksComeInTheFramesCoordinates) {
+  const std::vector<ky_pointf_t> places = FivePoints({0.25F, 0.25F}, {0.75F, 0.35F});
+  const std::string path = Write("detector", BuiltIn());
+  Write(std::string("detector") + KY_LANDMARKS_SUFFIX, Landmarks(places));
+  const ky_rect_t box = FaceWith(nullptr).rect;
+  for (const int orientation :
+       {KY_ORIENTATION_0, KY_ORIENTATION_90, KY_ORIENTATION_180, KY_ORIENTATION_270}) {
+    const ky_face_t face = FaceWith(path.c_str(), orientation);
+    ExpectRect(Turned(box, kSide, kSide, orientation), face.rect, 0);
+    ASSERT_EQ(5, face.points_count);
+    for (size_t i = 0; i < places.size(); ++i) {
+      float x = static_cast<float>(box.left) + places[i].x * static_cast<float>(box.right - 1 - box.left);
+      float y = static_cast<float>(box.top) + places[i].y * static_cast<float>(box.bottom - 1 - box.top);
+      for (int turn = 0; turn < orientation; turn += 90) {
+        const float turned_y = kSide - 1 - x;
+        x = y;
+        y = turned_y;
+      }
+      EXPECT_NEAR(x, face.points_array[i].x, 0.51) << "point " << i << ", turned by " << orientation;
+      EXPECT_NEAR(y, face.points_array[i].y, 0.51) << "point " << i << ", turned by " << orientation;
+    }
+    // Of the face, not of the frame.
+    EXPECT_NEAR(std::hypot(0.5, 0.1) * (box.right - 1 - box.left), face.eye_dist, 1.5);
+    EXPECT_NEAR(std::atan2(0.1, 0.5) * 180 / M_PI, face.roll, 1.5);
+    EXPECT_EQ(0, face.yaw);
+    EXPECT_EQ(0, face.pitch);
+  }
+}
+
+TEST_F(ModelTest, LandmarkModelAloneGoesWithTheBuiltInDetector) {
+  const std::string path = Write("five", Landmarks(FivePoints({0.3F, 0.3F}, {0.7F, 0.3F})));
+  const ky_face_t face = FaceWith(path.c_str());
+  ExpectRect(FaceWith(nullptr).rect, face.rect, 0);
+  EXPECT_EQ(5, face.points_count);
+  EXPECT_NEAR(0, face.roll, 0.01);
+
+  const Tracker tracker(KY_CONFIG_LARGE_FACES, path.c_str());
+  for (int i = 0; i < 2; ++i) {
+    Tracked faces;
+    ASSERT_EQ(KY_SUCCESS, Track(tracker, TestFrame(AboutFace()), faces));
+    ASSERT_EQ(1, faces.count);
+    EXPECT_EQ(5, faces[0].points_count);
+  }
+}
+
+TEST_F(ModelTest, UnknownLayoutsSayNothingOfThePose) {
+  const std::string path = Write("nine", Landmarks(std::vector<ky_pointf_t>(9, {0.5F, 0.5F})));
+  const ky_face_t face = FaceWith(path.c_str());
+  EXPECT_EQ(9, face.points_count);
+  EXPECT_EQ(0, face.eye_dist);
+  EXPECT_EQ(0, face.yaw);
+  EXPECT_EQ(0, face.pitch);
+  EXPECT_EQ(0, face.roll);
+}
+
+TEST_F(ModelTest, LandmarksMustFitTheRecord) {
+  const std::vector<ky_pointf_t> most(KY_FACE_MAX_POINTS, {0.5F, 0.5F});
+  EXPECT_EQ(KY_FACE_MAX_POINTS, FaceWith(Write("most", Landmarks(most)).c_str()).points_count);
+  const std::vector<ky_pointf_t> more(KY_FACE_MAX_POINTS + 1, {0.5F, 0.5F});
+  EXPECT_EQ(KY_ERROR_MODEL, CreateDetector(Write("more", Landmarks(more))));
+  EXPECT_EQ(KY_ERROR_MODEL, CreateDetector(Write("no_points", Landmarks({}))));
+}
+
+TEST_F(ModelTest, FileBesideTheModelMustHoldLandmarks) {
+  const std::string path = Write("detector", BuiltIn());
+  EXPECT_EQ(KY_SUCCESS, CreateDetector(path));
+  for (const std::string& bytes : {std::string("none"), std::string(), BuiltIn()}) {
+    Write(std::string("detector") + KY_LANDMARKS_SUFFIX, bytes);
+    EXPECT_EQ(KY_ERROR_LANDMARK_MODEL, CreateDetector(path));
+  }
+}
+
+TEST_F(ModelTest, ReplacedFilesAreReadAgain) {
+  const std::string path = Write("changing", Landmarks(std::vector<ky_pointf_t>(3, {0.5F, 0.5F})));
+  const Detector first(KY_CONFIG_LARGE_FACES, path.c_str());
+  Write("changing", Landmarks(std::vector<ky_pointf_t>(4, {0.5F, 0.5F})));
+  EXPECT_EQ(4, FaceWith(path.c_str()).points_count);
+  Detected faces;
+  ASSERT_EQ(KY_SUCCESS, Detect(first, TestFrame(AboutFace()), faces));
+  ASSERT_EQ(1, faces.count);
+  EXPECT_EQ(3, faces[0].points_count);
+}
+
+TEST_F(ModelTest, PoseOfSixtyEightPoints) {
+  // The nose tip, eye corners and mouth corners of an average head, seen from far away after a nod and a
+  // turn.
+  const std::map<size_t, std::array<double, 3>> head = {{30, {0, 0, 0}},
+                                                        {36, {-225, -183, -135}},
+                                                        {45, {225, -183, -135}},
+                                                        {48, {-144, 162, -125}},
+                                                        {54, {144, 162, -125}}};
+  for (const auto& [yaw, pitch] :
+       {std::pair(0.0, 0.0), {25.0, 0.0}, {-25.0, 0.0}, {0.0, 20.0}, {0.0, -20.0}, {20.0, 15.0}}) {
+    const double sy = std::sin(yaw * M_PI / 180);
+    const double cy = std::cos(yaw * M_PI / 180);
+    const double sp = std::sin(pitch * M_PI / 180);
+    const double cp = std::cos(pitch * M_PI / 180);
+    std::vector<ky_pointf_t> points(68, {0.5F, 0.5F});
+    for (const auto& [index, p] : head) {
+      const double y = cp * p[1] + sp * p[2];
+      const double z = -sp * p[1] + cp * p[2];
+      const double x = cy * p[0] + sy * z;
+      points[index] = {static_cast<float>(0.5 + x / 500), static_cast<float>(0.5 + y / 500)};
+    }
+    const ky_face_t face = FaceWith(Write("pose", Landmarks(points)).c_str());
+    ASSERT_EQ(68, face.points_count);
+    EXPECT_NEAR(yaw, face.yaw, 4) << pitch;
+    EXPECT_NEAR(pitch, face.pitch, 4) << yaw;
+  }
+  // Points in one place are no head.
+  const ky_face_t none =
+      FaceWith(Write("pose", Landmarks(std::vector<ky_pointf_t>(68, {0.5F, 0.5F}))).c_str());
+  EXPECT_EQ(0, none.yaw);
+  EXPECT_EQ(0, none.pitch);
+  EXPECT_EQ(0, none.roll);
+  EXPECT_EQ(0, none.eye_dist);
+}
+
+TEST_F(ModelTest, VerifierAlignsByALandmarkModelOfItsOwn) {
+  // Eyes rolled by 30 degrees in every box, as they are in the view.
+  const float dx = static_cast<float>(0.2 * std::cos(M_PI / 6));
+  const float dy = static_cast<float>(0.2 * std::sin(M_PI / 6));
+  const std::string path =
+      Write("rolled", Landmarks(FivePoints({0.5F - dx, 0.3F - dy}, {0.5F + dx, 0.3F + dy})));
+  const TestFrame rolled(View(Portrait(), 222, 126, 1, 30, kSide));
+  ky_handle_t verifier = nullptr;
+  ASSERT_EQ(KY_SUCCESS, ky_verify_create_handle(&verifier, path.c_str()));
+  ky_face_t face = {};
+  face.rect = {20, 20, 107, 107};
+  Feature by_model;
+  EXPECT_EQ(KY_SUCCESS, GetFeature(verifier, rolled, face, by_model));
+
+  // The same points in the record: the same crop. None, and no model: another.
+  face.points_count = 5;
+  const std::vector<ky_pointf_t> places = FivePoints({0.5F - dx, 0.3F - dy}, {0.5F + dx, 0.3F + dy});
+  for (size_t i = 0; i < places.size(); ++i) {
+    face.points_array[i] = {20 + 86 * places[i].x, 20 + 86 * places[i].y};
+  }
+  Feature by_record;
+  EXPECT_EQ(KY_SUCCESS, GetFeature(verifier, rolled, face, by_record));
+  face.points_count = 0;
+  ky_handle_t without = nullptr;
+  ASSERT_EQ(KY_SUCCESS, ky_verify_create_handle(&without, nullptr));
+  Feature by_rectangle;
+  EXPECT_EQ(KY_SUCCESS, GetFeature(without, rolled, face, by_rectangle));
+  float same = 0;
+  float other = 0;
+  EXPECT_EQ(KY_SUCCESS, ky_verify_compare_feature(verifier, by_model.feature, by_record.feature, &same));
+  EXPECT_EQ(KY_SUCCESS, ky_verify_compare_feature(verifier, by_model.feature, by_rectangle.feature, &other));
+  EXPECT_GT(same, 0.9F);
+  EXPECT_LT(other, 0.6F);
+  ky_verify_destroy_handle(without);
+  ky_verify_destroy_handle(verifier);
+}
+
+}  // namespace
+}  // namespace kyengine::test
