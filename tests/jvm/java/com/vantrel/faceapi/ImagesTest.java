@@ -1,0 +1,198 @@
+package com.vantrel.faceapi;
+
+import static com.vantrel.faceapi.CameraFrameTest.refused;
+import static org.junit.Assert.assertArrayEquals;
+import static org.junit.Assert.assertEquals;
+import static org.junit.Assert.assertSame;
+import static org.junit.Assert.fail;
+
+import android.graphics.Bitmap;
+import java.util.Random;
+import org.junit.BeforeClass;
+import org.junit.Test;
+
+/** The checked image operations: the same pixels as the native methods, and no way past an array's end. */
+public final class ImagesTest {
+    private static final int WIDTH = 20;
+    private static final int HEIGHT = 12;
+
+    private static byte[] random(int bytes) {
+        byte[] content = new byte[bytes];
+        new Random(bytes).nextBytes(content);
+        return content;
+    }
+
+    @BeforeClass
+    public static void quiet() {
+        FaceLibrary.setDebug(false);
+    }
+
+    @Test
+    public void conversionsAreThoseOfTheNativeMethod() {
+        for (Images.Conversion conversion : Images.Conversion.values()) {
+            byte[] src = random((int) packed(conversion.source()));
+            byte[] want = new byte[(int) packed(conversion.result())];
+            FaceLibrary.convertColorSpace(src, WIDTH, HEIGHT, want, codeOf(conversion));
+            byte[] reuse = new byte[want.length];
+            byte[] got = Images.convert(src, WIDTH, HEIGHT, conversion, reuse);
+            assertSame(reuse, got);
+            assertArrayEquals(conversion.name(), want, got);
+            assertArrayEquals(conversion.name(), want, Images.convert(src, WIDTH, HEIGHT, conversion, null));
+        }
+    }
+
+    private static long packed(PixelFormat format) {
+        return format.imageBytes(WIDTH, HEIGHT, (int) format.rowBytes(WIDTH));
+    }
+
+    private static int codeOf(Images.Conversion conversion) {
+        switch (conversion) {
+            case NV21_TO_BGRA: return 1;
+            case NV21_TO_RGBA: return 2;
+            case RGBA_TO_NV21: return 3;
+            case NV12_TO_BGRA: return 5;
+            case RGBA_TO_NV12: return 20;
+            case NV21_TO_BGR: return 1001;
+            default: return 14;
+        }
+    }
+
+    @Test
+    public void conversionsRefuseWhatDoesNotFit() {
+        byte[] frame = random(WIDTH * HEIGHT * 3 / 2);
+        Images.Conversion c = Images.Conversion.NV21_TO_RGBA;
+        refused("width", () -> Images.convert(frame, WIDTH - 1, HEIGHT, c, null));
+        refused("height", () -> Images.convert(frame, WIDTH, HEIGHT + 1, c, null));
+        refused("width", () -> Images.convert(frame, -WIDTH, -HEIGHT, c, null));
+        refused("width x height", () -> Images.convert(frame, 65536, 65536, c, null));
+        refused("src.length", () -> Images.convert(frame, WIDTH, HEIGHT + 2, c, null));
+        refused("reuse.length", () -> Images.convert(frame, WIDTH, HEIGHT, c, new byte[WIDTH * HEIGHT * 4 - 1]));
+        byte[] pixels = random(WIDTH * HEIGHT * 4);
+        refused("reuse must not", () ->
+                Images.convert(pixels, WIDTH, HEIGHT, Images.Conversion.BGRA_TO_RGBA, pixels));
+        try {
+            Images.convert(null, WIDTH, HEIGHT, c, null);
+            fail("a null source was taken");
+        } catch (NullPointerException right) {
+            assertEquals("src is null", right.getMessage());
+        }
+    }
+
+    @Test
+    public void cropsAreMadeEven() {
+        CameraFrame frame = CameraFrame.of(random(WIDTH * HEIGHT * 3 / 2), PixelFormat.NV21, WIDTH, HEIGHT, 0);
+        byte[] whole = Images.convert(frame.data(), WIDTH, HEIGHT, Images.Conversion.NV21_TO_RGBA, null);
+        for (int x = 0; x < WIDTH; x += 3) {
+            for (int y = 0; y < HEIGHT; y += 3) {
+                for (int w = 1; w <= WIDTH - x; w += 2) {
+                    int h = HEIGHT - y;
+                    int left = x / 2 * 2;
+                    int top = y / 2 * 2;
+                    int evenW = (x + w + 1) / 2 * 2 - left;
+                    int evenH = (y + h + 1) / 2 * 2 - top;
+                    assertEquals(evenW, Images.evenLength(x, w));
+                    assertEquals(evenH, Images.evenLength(y, h));
+                    byte[] want = new byte[evenW * evenH * 4];
+                    for (int r = 0; r < evenH; r++) {
+                        System.arraycopy(whole, ((top + r) * WIDTH + left) * 4, want, r * evenW * 4, evenW * 4);
+                    }
+                    assertArrayEquals(want, Images.crop(frame, x, y, w, h, null));
+                }
+            }
+        }
+        refused("x", () -> Images.crop(frame, -1, 0, 2, 2, null));
+        refused("x", () -> Images.crop(frame, WIDTH - 1, 0, 2, 2, null));
+        refused("y", () -> Images.crop(frame, 0, HEIGHT, 2, 2, null));
+        refused("w", () -> Images.crop(frame, 0, 0, 0, 2, null));
+        refused("h", () -> Images.crop(frame, 0, 0, 2, -2, null));
+        refused("x", () -> Images.crop(frame, 2, 0, Integer.MAX_VALUE, 2, null));
+        refused("reuse.length", () -> Images.crop(frame, 0, 0, 2, 2, new byte[3]));
+        CameraFrame small = CameraFrame.of(random(96), PixelFormat.NV21, 16, 4, 0);
+        refused("reuse must not", () -> Images.crop(small, 0, 0, 12, 2, small.data()));
+    }
+
+    @Test
+    public void rotationsTurnEveryPixel() {
+        byte[] src = random(WIDTH * HEIGHT * 3);
+        byte[] right = Images.rotate(src, WIDTH, HEIGHT, 90, null);
+        byte[] back = Images.rotate(right, HEIGHT, WIDTH, 270, new byte[src.length]);
+        assertArrayEquals(src, back);
+        byte[] around = Images.rotate(src, WIDTH, HEIGHT, 180, null);
+        for (int i = 0; i < WIDTH * HEIGHT; i++) {
+            for (int c = 0; c < 3; c++) {
+                assertEquals(src[i * 3 + c], around[(WIDTH * HEIGHT - 1 - i) * 3 + c]);
+            }
+        }
+        // Destination row 0 is the first column from the bottom up.
+        for (int c = 0; c < HEIGHT; c++) {
+            assertEquals(src[(HEIGHT - 1 - c) * WIDTH * 3], right[c * 3]);
+        }
+        refused("degrees", () -> Images.rotate(src, WIDTH, HEIGHT, 45, null));
+        refused("degrees", () -> Images.rotate(src, WIDTH, HEIGHT, 0, null));
+        refused("src.length", () -> Images.rotate(src, WIDTH, HEIGHT + 1, 90, null));
+        refused("reuse.length", () -> Images.rotate(src, WIDTH, HEIGHT, 90, new byte[1]));
+        refused("reuse must not", () -> Images.rotate(src, WIDTH, HEIGHT, 90, src));
+    }
+
+    @Test
+    public void brightnessIsTheMeanOfTheRectangle() {
+        byte[] data = random(WIDTH * HEIGHT * 3 / 2);
+        CameraFrame frame = CameraFrame.of(data, PixelFormat.NV12, WIDTH, HEIGHT, 0);
+        for (int x = 0; x < WIDTH; x += 3) {
+            for (int y = 0; y < HEIGHT; y += 2) {
+                int w = WIDTH - x;
+                int h = HEIGHT - y;
+                int sum = 0;
+                for (int r = y; r < y + h; r++) {
+                    for (int c = x; c < x + w; c++) {
+                        sum += data[r * WIDTH + c] & 0xFF;
+                    }
+                }
+                assertEquals((float) sum / (float) (w * h * 255), Images.brightness(frame, x, y, w, h), 0);
+            }
+        }
+        refused("y", () -> Images.brightness(frame, 0, 4, 2, HEIGHT - 3));
+        refused("x", () -> Images.brightness(frame, WIDTH, 0, 1, 1));
+    }
+
+    @Test
+    public void lightnessIsMeasuredInsideTheImage() {
+        byte[] pixels = new byte[WIDTH * HEIGHT * 4];
+        assertEquals(0, Images.lightness(pixels, PixelFormat.RGBA, WIDTH, HEIGHT, WIDTH * 4, 0, 0, WIDTH, HEIGHT));
+        java.util.Arrays.fill(pixels, (byte) 255);
+        assertEquals(255, Images.lightness(pixels, PixelFormat.BGRA, WIDTH, HEIGHT, WIDTH * 4, 3, 2, 5, 7));
+        refused("stride", () -> Images.lightness(pixels, PixelFormat.RGBA, WIDTH, HEIGHT, WIDTH, 0, 0, 1, 1));
+        refused("image", () ->
+                Images.lightness(pixels, PixelFormat.RGBA, WIDTH, HEIGHT + 1, WIDTH * 4, 0, 0, 1, 1));
+        refused("format", () -> Images.lightness(pixels, PixelFormat.BGR, WIDTH, HEIGHT, WIDTH * 4, 0, 0, 1, 1));
+        refused("w", () -> Images.lightness(pixels, PixelFormat.RGBA, WIDTH, HEIGHT, WIDTH * 4, 0, 0, 0, 1));
+    }
+
+    @Test
+    public void bitmapsOfAnyStrideGiveTheSamePixels() {
+        for (int padding : new int[] {0, 4, 12}) {
+            Bitmap bitmap = Bitmap.createBitmap(7, 5, Bitmap.Config.ARGB_8888, 7 * 4 + padding);
+            byte[] bgra = new byte[7 * 5 * 4];
+            byte[] bgr = new byte[7 * 5 * 3];
+            Random random = new Random(3);
+            for (int i = 0; i < 35; i++) {
+                int color = random.nextInt();
+                bitmap.setPixel(i % 7, i / 7, color);
+                for (int c = 0; c < 4; c++) {
+                    bgra[i * 4 + c] = (byte) (color >> (8 * c));
+                    if (c < 3) {
+                        bgr[i * 3 + c] = (byte) (color >> (8 * c));
+                    }
+                }
+            }
+            assertArrayEquals(bgra, Images.pixels(bitmap, PixelFormat.BGRA, null));
+            assertArrayEquals(bgr, Images.pixels(bitmap, PixelFormat.BGR, new byte[bgr.length]));
+            refused("reuse.length", () -> Images.pixels(bitmap, PixelFormat.BGR, bgra));
+            refused("format", () -> Images.pixels(bitmap, PixelFormat.RGBA, null));
+            bitmap.recycle();
+            refused("bitmap is recycled", () -> Images.pixels(bitmap, PixelFormat.BGRA, null));
+        }
+        refused("bitmap must", () -> Images.pixels(
+                Bitmap.createBitmap(2, 2, Bitmap.Config.RGB_565), PixelFormat.BGRA, null));
+    }
+}
