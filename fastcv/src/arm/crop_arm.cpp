@@ -57,28 +57,40 @@ unsigned char scaleSample(unsigned char sample, float ratio) {
   return v > 255 ? 255 : v >= 0 ? static_cast<unsigned char>(v) : 0;
 }
 
+// `count` samples; all are loaded before one is stored, for the cores that work in order.
+template <int count, typename Scale>
+inline void scaleSamples(const Scale& scale, const unsigned char* src, unsigned char* dst) {
+  if constexpr (count == 8) {
+    vst1_u8(dst, scale(vld1_u8(src)));
+  } else {
+    constexpr int kRegisters = count / 16;
+    uint8x16_t samples[kRegisters];
+    for (int i = 0; i < kRegisters; ++i) {
+      samples[i] = vld1q_u8(src + i * 16);
+    }
+    for (uint8x16_t& v : samples) {
+      v = vcombine_u8(scale(vget_low_u8(v)), scale(vget_high_u8(v)));
+    }
+    for (int i = 0; i < kRegisters; ++i) {
+      vst1q_u8(dst + i * 16, samples[i]);
+    }
+    if constexpr (count % 16 != 0) {
+      scaleSamples<count % 16>(scale, src + count / 16 * 16, dst + count / 16 * 16);
+    }
+  }
+}
+
 template <int nc, typename Scale>
 inline void scaleRows(const Scale& scale, float ratio, ptrdiff_t height, ptrdiff_t width, ptrdiff_t inStride,
                       const unsigned char* in, ptrdiff_t outStride, unsigned char* out) {
   constexpr int kGroup = kGroupPixels * nc;
-  constexpr int kRegister = 16;
+  constexpr int kInFlight = nc == 1 ? 4 : 2;
   for (ptrdiff_t row = 0; row < height; ++row) {
     const unsigned char* src = in + row * inStride;
     unsigned char* dst = out + row * outStride;
-    walk<kGroup, 2, 1>(
+    walk<kGroup, kInFlight, 1>(
         width * nc, Tail::kSteps,
-        [&](ptrdiff_t x, auto groups) {
-          constexpr int kSamples = kGroup * groups;
-          // A pair of groups of one or three channels is whole registers; so is a group of four.
-          for (int i = 0; i < kSamples / kRegister * kRegister; i += kRegister) {
-            const uint8x16_t samples = vld1q_u8(src + x + i);
-            vst1q_u8(dst + x + i, vcombine_u8(scale(vget_low_u8(samples)), scale(vget_high_u8(samples))));
-          }
-          if constexpr (kSamples % kRegister != 0) {
-            constexpr int kLast = kSamples - kSamples % kRegister;
-            vst1_u8(dst + x + kLast, scale(vld1_u8(src + x + kLast)));
-          }
-        },
+        [&](ptrdiff_t x, auto groups) { scaleSamples<groups * kGroup>(scale, src + x, dst + x); },
         [&](ptrdiff_t x) { dst[x] = scaleSample(src[x], ratio); });
   }
 }
@@ -118,10 +130,14 @@ void scaleImage(float ratio, int height, int width, int inStride, const float* i
 
 // ---- any sample
 
-// Copies the rows, in order. A row and its copy may overlap.
+// Copies rows as they are, also over themselves; all at once where nothing lies between them.
 template <typename T>
 void copyRows(ptrdiff_t height, ptrdiff_t rowElements, ptrdiff_t inStride, const T* in, ptrdiff_t outStride,
               T* out) {
+  if (inStride == rowElements && outStride == rowElements) {
+    rowElements *= height;
+    height = 1;
+  }
   for (ptrdiff_t row = 0; row < height; ++row) {
     memmove(out + row * outStride, in + row * inStride, static_cast<size_t>(rowElements) * sizeof(T));
   }

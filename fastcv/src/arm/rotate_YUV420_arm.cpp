@@ -48,10 +48,14 @@ struct Free {
 };
 using Scratch = std::unique_ptr<unsigned char, Free>;
 
-// `height` rows of `width` bytes, packed at `packed`.
-void gather(const Rows<const unsigned char>& rows, int height, int width, unsigned char* packed) {
-  for (int r = 0; r < height; ++r) {
-    memcpy(packed + static_cast<ptrdiff_t>(r) * width, rows.at(r), static_cast<size_t>(width));
+// Copies `height` rows of `width` bytes to `packed`, with nothing between them.
+void gather(const Rows<const unsigned char>& rows, ptrdiff_t height, ptrdiff_t width, unsigned char* packed) {
+  if (rows.afterEven == width && rows.afterOdd == width) {
+    width *= height;
+    height = 1;
+  }
+  for (ptrdiff_t r = 0; r < height; ++r) {
+    memcpy(packed + r * width, rows.at(r), static_cast<size_t>(width));
   }
 }
 

@@ -9,7 +9,9 @@
 
 #include "rotate.h"
 
+#include <algorithm>
 #include <array>
+#include <type_traits>
 
 #include "entry.h"
 #include "kernel_assert.h"
@@ -40,6 +42,7 @@ class QuarterTurn {
   // Whole blocks of destination pixels, then the rows below them, then the columns beside them.
   template <int blockHeight, int blockWidth>
   TILE_INLINE void run() const {
+    static_assert(blockHeight % 2 == 0 && blockHeight % kTile.columns == 0 && blockWidth % kTile.rows == 0);
     const ptrdiff_t height = wholeBlocks(target_.height, blockHeight);
     const ptrdiff_t width = wholeBlocks(target_.width, blockWidth);
     for (ptrdiff_t r = 0; r < height; r += blockHeight) {
@@ -69,52 +72,69 @@ class QuarterTurn {
     const ptrdiff_t first = upwards_ ? top + height - 1 : top;
     const ptrdiff_t second = upwards_ ? first - 1 : first + 1;
     const ptrdiff_t step = target_.rows.afterEven + target_.rows.afterOdd;
+    unsigned char* const row = target_.rows.at(first);
     strips<kTile.rows>(source_ + left * sourceStep_ + lowest * bytes, height, target_.height - lowest, width,
-                       RowPair{target_.rows.at(first) + left * bytes, target_.rows.at(second) + left * bytes,
-                               upwards_ ? -step : step});
+                       RowPairs{row + left * bytes, target_.rows.at(second) - row, upwards_ ? -step : step});
   }
 
   // `width` source rows, in strips of `rows` while as many are left, then in strips of half as many.
   template <int rows, typename Height, typename Width>
   TILE_INLINE void strips(const unsigned char* src, Height length, ptrdiff_t readable, Width width,
-                          RowPair out) const {
-    ptrdiff_t left = width;
-    for (; left >= rows; left -= rows) {
+                          RowPairs out) const {
+    for (ptrdiff_t n = width / rows; n > 0; --n) {
       strip<rows>(src, length, readable, out);
       src += rows * sourceStep_;
       out.first += rows * bytes;
-      out.second += rows * bytes;
     }
     if constexpr (rows > 1) {
-      strips<rows / 2>(src, length, readable, left, out);
+      strips<rows / 2>(src, length, readable, width % rows, out);
     }
   }
 
   // `length` columns of `rows` source rows. `readable` columns belong to the rotated image.
-  template <int rows, typename Height>
-  TILE_INLINE void strip(const unsigned char* src, Height length, ptrdiff_t readable, RowPair out) const {
-    ptrdiff_t left = length;
+  template <int rows, typename Length>
+  TILE_INLINE void strip(const unsigned char* src, Length length, ptrdiff_t readable, RowPairs out) const {
+    constexpr int kColumns = kTile.columns;
+    settle(src, out);
     if constexpr (rows == kTile.rows && kTileReadsPast<bytes> > 0) {
-      readable -= kTileReadsPast<bytes>;
-      for (; left >= kTile.columns && readable >= kTile.columns; left -= kTile.columns) {
-        moveTile<bytes, rows, kTile.columns, true>(src, offsets_, out);
-        src += kTile.columns * bytes;
-        readable -= kTile.columns;
+      // All but the last tile, unless more columns follow.
+      const ptrdiff_t tilesPast = std::min<ptrdiff_t>(length, readable - kTileReadsPast<bytes>) / kColumns;
+      for (ptrdiff_t n = tilesPast; n > 0; --n) {
+        tile<rows, kColumns, true>(src, out);
       }
+      tiles<rows, kColumns>(src, length - std::max<ptrdiff_t>(tilesPast, 0) * kColumns, out);
+    } else if constexpr (std::is_same_v<Length, ptrdiff_t>) {
+      tiles<rows, kColumns>(src, length, out);
+    } else if constexpr (kInterleaves<bytes> && rows == kTile.rows) {
+      moveTiles<bytes, length / kColumns>(src, offsets_, out);
+    } else {
+      detail::unrolled<length / kColumns>([&](auto) TILE_LAMBDA { tile<rows, kColumns, false>(src, out); });
     }
-    tiles<rows, kTile.columns>(src, left, out);
   }
 
-  // `left` columns, in tiles of `columns` while as many are left, then in tiles of half as many.
+  // `length` columns, in tiles of `columns` while as many are left, then in tiles of half as many.
   template <int rows, int columns>
-  TILE_INLINE void tiles(const unsigned char* src, ptrdiff_t left, RowPair& out) const {
-    for (; left >= columns; left -= columns) {
-      moveTile<bytes, rows, columns, false>(src, offsets_, out);
-      src += columns * bytes;
+  TILE_INLINE void tiles(const unsigned char* src, ptrdiff_t length, RowPairs& out) const {
+    for (ptrdiff_t n = length / columns; n > 0; --n) {
+      tile<rows, columns, false>(src, out);
     }
     if constexpr (columns > 1) {
-      tiles<rows, columns / 2>(src, left, out);
+      tiles<rows, columns / 2>(src, length % columns, out);
     }
+  }
+
+  // What moves on does so tile by tile: left to itself the compiler forms many addresses anew from that of
+  // the first, and runs out of registers.
+  static TILE_INLINE void settle(const unsigned char*& src, RowPairs& out) {
+    keepInRegister(src);
+    keepInRegister(out.first);
+  }
+
+  template <int rows, int columns, bool past>
+  TILE_INLINE void tile(const unsigned char*& src, RowPairs& out) const {
+    moveTile<bytes, rows, columns, past>(src, offsets_, out);
+    src += columns * bytes;
+    settle(src, out);
   }
 
   bool upwards_;
@@ -149,16 +169,26 @@ struct ReversedRow {
   unsigned char* dst;
   ptrdiff_t left;  // pixels
 
-  // Has `move(source, destination)` reverse `pixels` pixels of `bytes` bytes at a time, as long as there are
-  // as many.
-  template <int bytes, int pixels, typename Move>
+  // Reverses `blocks` blocks of `pixels` pixels of `bytes` bytes at a time, as long as there are as many:
+  // `move(source, destination)` does one.
+  template <int bytes, int pixels, int blocks, typename Move>
   TILE_INLINE void each(const Move& move) {
+    constexpr ptrdiff_t kSize = pixels * bytes;
+    // In registers, both steps are the loads' and the stores' own.
+    ptrdiff_t down = -kSize;
+    keepInRegister(down);
+    src += down;
     KERNEL_ROLLED_LOOP
-    for (; left >= pixels; left -= pixels) {
-      src -= pixels * bytes;
-      move(src, dst);
-      dst += pixels * bytes;
+    for (ptrdiff_t n = left / (pixels * blocks); n != 0; --n) {
+      detail::unrolled<blocks>([&](auto) TILE_LAMBDA {
+        move(src, dst);
+        src += down;
+        dst += kSize;
+        keepInRegister(dst);
+      });
     }
+    src -= down;
+    left %= pixels * blocks;
   }
 };
 
@@ -191,7 +221,7 @@ TILE_INLINE void reverseBlock(const unsigned char* src, unsigned char* dst) {
 // Pieces of `size` bytes, down to a single pixel.
 template <int bytes, int size>
 TILE_INLINE void reversePieces(ReversedRow& row) {
-  row.each<bytes, size / bytes>([](const unsigned char* src, unsigned char* dst) TILE_LAMBDA {
+  row.each<bytes, size / bytes, 1>([](const unsigned char* src, unsigned char* dst) TILE_LAMBDA {
     storeLane<size, 16 / size - 1>(dst, reversed<bytes>(loadBytes<size>(src)));
   });
   if constexpr (size > bytes) {
@@ -200,29 +230,25 @@ TILE_INLINE void reversePieces(ReversedRow& row) {
 }
 
 template <int bytes>
-void reverseRow(ReversedRow row) {
-  // For words a block is six instructions; there the loop itself is worth spreading over many.
+void reverseRow(const unsigned char* end, unsigned char* dst, ptrdiff_t pixels) {
+  ReversedRow row = {end, dst, pixels};
+  // A block takes few instructions, six for pixels of a power of two: the loop itself is worth spreading.
   constexpr int kBlock = kReversedBlock<bytes>;
-  constexpr int kInFlight = bytes == 4 ? 8 : 2;
-  row.each<bytes, kBlock * kInFlight>([](const unsigned char* src, unsigned char* dst) TILE_LAMBDA {
-    detail::unrolled<kInFlight>([&](auto i) TILE_LAMBDA {
-      constexpr ptrdiff_t kSize = kBlock * bytes;
-      reverseBlock<bytes>(src + (kInFlight - 1 - i) * kSize, dst + i * kSize);
-    });
-  });
-  row.each<bytes, kBlock>(reverseBlock<bytes>);
+  constexpr int kInFlight = bytes >= 4 ? 8 : 2;
+  row.each<bytes, kBlock, kInFlight>(reverseBlock<bytes>);
+  row.each<bytes, kBlock, 1>(reverseBlock<bytes>);
   if constexpr (bytes % 3 != 0) {
     reversePieces<bytes, 16>(row);
   } else {
     if constexpr (bytes == 3) {
-      row.each<bytes, 8>([](const unsigned char* src, unsigned char* dst) TILE_LAMBDA {
-        const uint8x8x3_t v = vld3_u8(src);
+      row.each<bytes, 8, 1>([](const unsigned char* from, unsigned char* to) TILE_LAMBDA {
+        const uint8x8x3_t v = vld3_u8(from);
         const uint8x8x3_t out = {{vrev64_u8(v.val[0]), vrev64_u8(v.val[1]), vrev64_u8(v.val[2])}};
-        vst3_u8(dst, out);
+        vst3_u8(to, out);
       });
     }
-    row.each<bytes, 1>([](const unsigned char* src, unsigned char* dst)
-                           TILE_LAMBDA { memcpy(dst, src, bytes); });
+    row.each<bytes, 1, 1>([](const unsigned char* from, unsigned char* to)
+                              TILE_LAMBDA { memcpy(to, from, bytes); });
   }
 }
 
@@ -233,11 +259,11 @@ void halfTurn(const SourceImage& in, const TargetImage& out) {
   if (in.stride == rowSize && out.rows.afterEven == rowSize && out.rows.afterOdd == rowSize &&
       in.width == out.width) {
     // With nothing between the rows, all of them are one.
-    reverseRow<bytes>({end, out.rows.data, out.height * out.width});
+    reverseRow<bytes>(end, out.rows.data, out.height * out.width);
     return;
   }
   for (ptrdiff_t r = 0; r < out.height; ++r) {
-    reverseRow<bytes>({end - r * in.stride, out.rows.at(r), out.width});
+    reverseRow<bytes>(end - r * in.stride, out.rows.at(r), out.width);
   }
 }
 

@@ -19,20 +19,27 @@
 
 namespace HPC::fastcv::arm {
 
-/// The destination rows of a tile, in the order in which they are written: two pointers that take turns, each
-/// `step` bytes before its own next. Two, so that rows at alternating distances cost nothing.
-struct RowPair {
+/// The destination rows of tiles, in the order in which they are written: rows whose distances alternate
+/// between two values, `toSecond` behind a tile's first row and then what is left of `step`.
+struct RowPairs {
   unsigned char* first;
-  unsigned char* second;
+  ptrdiff_t toSecond;
   ptrdiff_t step;
+  unsigned char* second = nullptr;
 
-  /// The place of row `index` of the tile, to be asked for in order.
+  /// The place of row `index` of a tile, to be asked for in order. Of each pair one address is the other's
+  /// update and one a sum of its own: in-order cores wait for a chain of updates, and a sum for every row is
+  /// an instruction for every row.
   template <int index>
   TILE_INLINE unsigned char* next() {
-    unsigned char*& row = index % 2 == 0 ? first : second;
-    unsigned char* const at = row;
-    row += step;
-    return at;
+    if constexpr (index % 2 == 1) {
+      return second;
+    } else {
+      unsigned char* const at = first;
+      second = first + toSecond;
+      first += step;
+      return at;
+    }
   }
 };
 
@@ -56,8 +63,8 @@ struct RowOffsets {
   }
 };
 
-/// The largest tile of a pixel size: `rows` by `columns`, both powers of two. More than one column, so that
-/// one tile behind another finds the turns of the row pair as it expects them.
+/// The largest tile of a pixel size: `rows` by `columns`, both powers of two. An even number of
+/// columns, so that a tile ends with a pair of rows.
 struct TileSize {
   int rows;
   int columns;
@@ -70,6 +77,11 @@ template <>
 inline constexpr TileSize kLargestTile<12> = {1, 4};
 template <>
 inline constexpr TileSize kLargestTile<16> = {2, 2};
+
+/// Whether tiles of a pixel size are interleaved in registers, whose size they divide; else they are moved in
+/// other ways.
+template <int bytes>
+inline constexpr bool kInterleaves = bytes < 16 && 16 % bytes == 0;
 
 /// Source columns behind a tile that `moveTile` of the largest size also reads when it may.
 template <int bytes>
@@ -186,9 +198,11 @@ TILE_INLINE auto interleaved(const Registers<bytes, used, groups, segments>& in)
   }
 }
 
-/// Writes the columns of an interleaved tile. Where two groups are left, the store interleaves them.
-template <int columns, int bytes, int used, int groups, int segments>
-TILE_INLINE void storeColumns(const Registers<bytes, used, groups, segments>& in, RowPair& out) {
+/// Writes the columns of an interleaved tile and calls `between(c)` after each. Where two groups are left,
+/// the store interleaves them.
+template <int columns, int bytes, int used, int groups, int segments, typename Between>
+TILE_INLINE void storeColumns(const Registers<bytes, used, groups, segments>& in, RowPairs& out,
+                              const Between& between) {
   unrolled<columns>([&](auto c) TILE_LAMBDA {
     constexpr int kInRegister = used / bytes;
     constexpr int kAt = c / kInRegister;
@@ -201,6 +215,7 @@ TILE_INLINE void storeColumns(const Registers<bytes, used, groups, segments>& in
     } else {
       storeLane<bytes, kLane>(p, in.v[kAt]);
     }
+    between(c);
   });
 }
 
@@ -226,7 +241,7 @@ TILE_INLINE void storeWords(unsigned char* p, uint32x4_t first, uint32x4_t secon
 /// d, is three words; each is put together for all four columns at once, from the two rows that it holds
 /// bytes of.
 template <bool past>
-TILE_INLINE void moveTripletTile(const unsigned char* src, const RowOffsets<4>& rows, RowPair& out) {
+TILE_INLINE void moveTripletTile(const unsigned char* src, const RowOffsets<4>& rows, RowPairs& out) {
   static constexpr unsigned char kFirst[] = {0, 1, 2, 16, 3, 4, 5, 19, 6, 7, 8, 22, 9, 10, 11, 25};
   static constexpr unsigned char kSecondFromB[] = {1, 2, 99, 99, 4, 5, 99, 99, 7, 8, 99, 99, 10, 11, 99, 99};
   static constexpr unsigned char kSecondFromC[] = {99, 99, 0, 1, 99, 99, 3, 4, 99, 99, 6, 7, 99, 99, 9, 10};
@@ -249,7 +264,7 @@ TILE_INLINE void moveTripletTile(const unsigned char* src, const RowOffsets<4>& 
 /// Moves the tile at `src`. With `past` it may read kTileReadsPast<bytes> columns behind itself; without, it
 /// reads exactly its own pixels.
 template <int bytes, int rows, int columns, bool past, int count>
-TILE_INLINE void moveTile(const unsigned char* src, const RowOffsets<count>& from, RowPair& out) {
+TILE_INLINE void moveTile(const unsigned char* src, const RowOffsets<count>& from, RowPairs& out) {
   static_assert(rows <= kLargestTile<bytes>.rows && columns <= kLargestTile<bytes>.columns);
   if constexpr (bytes == 3 && rows == 4 && columns == 4) {
     detail::moveTripletTile<past>(src, from, out);
@@ -257,7 +272,7 @@ TILE_INLINE void moveTile(const unsigned char* src, const RowOffsets<count>& fro
     const uint32x4x3_t v = vld3q_u32(reinterpret_cast<const uint32_t*>(src));
     detail::unrolled<4>(
         [&](auto i) TILE_LAMBDA { detail::storeWords<i>(out.next<i>(), v.val[0], v.val[1], v.val[2]); });
-  } else if constexpr (bytes % 3 == 0 || bytes == 16) {
+  } else if constexpr (!kInterleaves<bytes>) {
     detail::unrolled<columns>([&](auto c) TILE_LAMBDA {
       unsigned char* const p = out.next<c>();
       detail::unrolled<rows>([&](auto r)
@@ -267,8 +282,31 @@ TILE_INLINE void moveTile(const unsigned char* src, const RowOffsets<count>& fro
     detail::Registers<bytes, bytes * columns, rows, 1> in;
     detail::unrolled<rows>([&](auto r)
                                TILE_LAMBDA { in.v[r] = loadBytes<bytes * columns>(src + from.at[r]); });
-    detail::storeColumns<columns>(detail::interleaved(in), out);
+    detail::storeColumns<columns>(detail::interleaved(in), out, [](auto) TILE_LAMBDA {});
   }
+}
+
+/// Moves `tiles` of the largest tiles, one behind the other along the source rows. Each tile's rows are
+/// loaded between the stores of the one before, which gives in-order cores something to do.
+template <int bytes, int tiles>
+TILE_INLINE void moveTiles(const unsigned char* src, const RowOffsets<kLargestTile<bytes>.rows>& from,
+                           RowPairs& out) {
+  static_assert(kInterleaves<bytes>);
+  constexpr int kSide = kLargestTile<bytes>.rows;
+  static_assert(kLargestTile<bytes>.columns == kSide);
+  detail::Registers<bytes, 16, kSide, 1> in;
+  detail::unrolled<kSide>([&](auto r) TILE_LAMBDA { in.v[r] = loadBytes<16>(src + from.at[r]); });
+  detail::unrolled<tiles>([&](auto tile) TILE_LAMBDA {
+    const auto current = detail::interleaved(in);
+    src += 16;
+    keepInRegister(src);
+    detail::storeColumns<kSide>(current, out, [&](auto r) TILE_LAMBDA {
+      if constexpr (tile + 1 < tiles) {
+        in.v[r] = loadBytes<16>(src + from.at[r]);
+      }
+    });
+    keepInRegister(out.first);
+  });
 }
 
 }  // namespace HPC::fastcv::arm
