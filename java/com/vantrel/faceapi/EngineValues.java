@@ -71,6 +71,15 @@ public final class EngineValues {
     /** The highest alignment threshold. */
     public static final int MAX_ALIGNMENT_THRESHOLD = 100;
 
+    /** The version of the verifier's model. */
+    public static final int VERIFY_VERSION = 1;
+    /** Bytes of a feature. */
+    public static final int FEATURE_LENGTH = 3783;
+    /** Bytes of a serialized feature, with the terminating zero. */
+    public static final int FEATURE_TEXT_LENGTH = 5045;
+    /** The smallest face that a feature is taken of, in pixels: its longer side, or twice the distance of its eyes. */
+    public static final int SMALLEST_VERIFIED_FACE = 16;
+
     /** What follows the name of a model file in the name of the landmark model beside it. */
     public static final String LANDMARKS_SUFFIX = ".landmarks";
 
@@ -96,9 +105,9 @@ public final class EngineValues {
     public static final int ERROR_MODEL_FILE = -9;
     /** The model file holds no model that fits. */
     public static final int ERROR_MODEL = -10;
-    /** The file beside the model holds no landmark model that fits. */
+    /** The file beside the model is no landmark model that fits. */
     public static final int ERROR_LANDMARK_MODEL = -11;
-    /** The face cannot belong to the frame. */
+    /** The face cannot belong to the frame, or is too small. */
     public static final int ERROR_FACE = -12;
     /** The feature is null, released, or no feature. */
     public static final int ERROR_FEATURE = -13;

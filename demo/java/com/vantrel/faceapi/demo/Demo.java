@@ -111,7 +111,10 @@ public final class Demo {
         File turned = new File(folder, "turned.png");
         turning.writeRotations(turned);
         System.out.println("cut out of the frame in " + crop + ", the frame turned by right angles in " + turned);
-        return 0;
+        System.out.println();
+
+        MovingScene scene = new MovingScene(picture, view.toPicture(faces[0].faceRect), WIDTH, HEIGHT);
+        return scene.run(new File(folder, "track.png")) ? 0 : stop(3, "The engine failed while it tracked.");
     }
 
     private static String text(Rect r) {

@@ -19,6 +19,14 @@ final class Stopwatch {
         last = System.nanoTime();
     }
 
+    void printPerFrame(int frames) {
+        System.out.printf("%-28s %9s %9s%n", "stage", "ms/frame", "frames/s");
+        for (Map.Entry<String, Long> stage : stages.entrySet()) {
+            double seconds = stage.getValue() / 1e9;
+            System.out.printf("%-28s %9.2f %9.1f%n", stage.getKey(), seconds / frames * 1e3, frames / seconds);
+        }
+    }
+
     void print() {
         System.out.printf("%-28s %9s%n", "stage", "ms");
         for (Map.Entry<String, Long> stage : stages.entrySet()) {

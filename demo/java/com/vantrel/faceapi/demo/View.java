@@ -48,6 +48,20 @@ final class View {
         return centreY + ((y - height / 2.0) * cos - (x - width / 2.0) * sin) / zoom;
     }
 
+    /** The frame's x of the picture's point (x, y). */
+    double frameX(double x, double y) {
+        return width / 2.0 + ((x - centreX) * cos - (y - centreY) * sin) * zoom;
+    }
+
+    /** The frame's y of the picture's point (x, y). */
+    double frameY(double x, double y) {
+        return height / 2.0 + ((y - centreY) * cos + (x - centreX) * sin) * zoom;
+    }
+
+    double zoom() {
+        return zoom;
+    }
+
     /** A rectangle of the frame in the picture's coordinates: the smallest upright one that holds it. */
     Rect toPicture(Rect r) {
         double[] xs = new double[4];

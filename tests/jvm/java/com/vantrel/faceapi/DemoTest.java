@@ -1,0 +1,107 @@
+package com.vantrel.faceapi;
+
+import static org.junit.Assert.assertEquals;
+import static org.junit.Assert.assertFalse;
+import static org.junit.Assert.assertTrue;
+
+import android.graphics.Rect;
+import com.vantrel.faceapi.demo.Demo;
+import java.awt.image.BufferedImage;
+import java.io.File;
+import java.io.IOException;
+import java.nio.charset.StandardCharsets;
+import java.nio.file.Files;
+import java.util.Arrays;
+import java.util.regex.Matcher;
+import java.util.regex.Pattern;
+import javax.imageio.ImageIO;
+import org.junit.Rule;
+import org.junit.Test;
+import org.junit.rules.TemporaryFolder;
+
+/** The demo says and draws what it found, and is plain about what it cannot use. */
+public class DemoTest {
+    /** A tight box around the portrait's face. */
+    private static final Rect FACE = new Rect(179, 83, 266, 170);
+    /** The camera frame is the same on every machine. */
+    private static final String FRAME = "3cbd3de2674885756e77b344b9ba15f2352be69ba587f624905607379bba4d35";
+
+    @Rule public final TemporaryFolder folder = new TemporaryFolder();
+
+    private Child demo(File picture) throws IOException, InterruptedException {
+        Child child = Child.run(Demo.class, picture.getPath(), new File(folder.getRoot(), "out").getPath());
+        assertFalse(child.output, child.output.contains("in native method"));
+        return child;
+    }
+
+    private static Matcher find(String text, String pattern) {
+        Matcher m = Pattern.compile(pattern).matcher(text);
+        assertTrue(pattern + " in " + text, m.find());
+        return m;
+    }
+
+    @Test
+    public void thePortrait() throws IOException, InterruptedException {
+        Child child = demo(new File(System.getProperty("kyface.source"), "demo/portrait.png"));
+        assertEquals(child.errors.toString(), 0, child.exitStatus);
+        assertEquals(FRAME, find(child.output, "frame sha-256 (\\w+)").group(1));
+        String box = "\\((\\d+), (\\d+)\\)-\\((\\d+), (\\d+)\\)";
+        Matcher m = find(child.output, "\n1 +" + box + " +" + box);
+        int[] edges = new int[4];
+        for (int i = 0; i < 4; i++) {
+            edges[i] = Integer.parseInt(m.group(5 + i));
+        }
+        Rect found = new Rect(edges[0], edges[1], edges[2], edges[3]);
+        assertTrue(found.toString(), Portrait.overlap(found, FACE) >= 0.5);
+
+        BufferedImage drawn = ImageIO.read(new File(folder.getRoot(), "out/faces.png"));
+        int left = Integer.parseInt(m.group(1));
+        int middle = (Integer.parseInt(m.group(2)) + Integer.parseInt(m.group(4))) / 2;
+        assertEquals("the box is drawn", 0xFF50FF78, drawn.getRGB(left, middle));
+
+        find(child.output, "in view in 30 and tracked in 30, as identity \\d+\n");
+        float margin = Float.parseFloat(find(child.output, "margin[^\n]* (-?[\\d.]+)\n").group(1));
+        assertTrue("margin " + margin, margin > 0);
+        for (String file : new String[] {"track.png", "face.png", "turned.png"}) {
+            assertTrue(file, new File(folder.getRoot(), "out/" + file).length() > 0);
+        }
+    }
+
+    private void assertRefuses(int exitStatus, String sentence, File picture)
+            throws IOException, InterruptedException {
+        Child child = demo(picture);
+        assertEquals(exitStatus, child.exitStatus);
+        assertEquals("", child.output);
+        child.errors.removeIf(line -> line.matches("[VDI]/FaceAPI: .*"));
+        assertEquals(Arrays.asList(sentence), child.errors);
+    }
+
+    @Test
+    public void aPictureWithoutAFace() throws IOException, InterruptedException {
+        File file = folder.newFile("gray.png");
+        ImageIO.write(new BufferedImage(300, 200, BufferedImage.TYPE_INT_RGB), "png", file);
+        assertRefuses(1, "There is no face in " + file + ".", file);
+    }
+
+    @Test
+    public void aFileThatIsNoPicture() throws IOException, InterruptedException {
+        File file = folder.newFile("letter.txt");
+        Files.write(file.toPath(), "Dear all".getBytes(StandardCharsets.UTF_8));
+        assertRefuses(2, "The file " + file + " is no picture (PNG, JPEG, GIF and BMP are known).", file);
+    }
+
+    @Test
+    public void aDamagedPicture() throws IOException, InterruptedException {
+        byte[] whole = Files.readAllBytes(
+                new File(System.getProperty("kyface.source"), "demo/portrait.png").toPath());
+        File file = folder.newFile("cut.png");
+        Files.write(file.toPath(), Arrays.copyOf(whole, 20000));
+        assertRefuses(2, "The picture " + file + " is damaged or cannot be read.", file);
+    }
+
+    @Test
+    public void aMissingFile() throws IOException, InterruptedException {
+        File file = new File(folder.getRoot(), "nothing.png");
+        assertRefuses(2, "There is no file " + file + ".", file);
+    }
+}
