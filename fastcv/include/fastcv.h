@@ -232,32 +232,46 @@ HPCStatus_t rotate_YUV420(const Mat<unsigned char, 1, env>& /*src*/, Mat<unsigne
   X(type, unsigned char, ncSrc, ncDst)               \
   X(type, float, ncSrc, ncDst)
 
-#define FASTCV_CVT_COLOR_INSTANCES(X)         \
-  X(CVT_BGR2NV21, unsigned char, 3, 1)        \
-  X(CVT_BGR2NV21, unsigned char, 4, 1)        \
-  X(CVT_NV212BGR, unsigned char, 1, 3)        \
-  X(CVT_NV212BGR, unsigned char, 1, 4)        \
-  X(CVT_NV212RGB, unsigned char, 1, 3)        \
-  X(CVT_NV212RGB, unsigned char, 1, 4)        \
-  X(CVT_RGB2NV21, unsigned char, 3, 1)        \
-  X(CVT_RGB2NV21, unsigned char, 4, 1)        \
-  X(CVT_BGR2NV12, unsigned char, 3, 1)        \
-  X(CVT_BGR2NV12, unsigned char, 4, 1)        \
-  X(CVT_NV122BGR, unsigned char, 1, 3)        \
-  X(CVT_NV122BGR, unsigned char, 1, 4)        \
-  X(CVT_RGB2NV12, unsigned char, 3, 1)        \
-  X(CVT_RGB2NV12, unsigned char, 4, 1)        \
-  X(CVT_NV122RGB, unsigned char, 1, 3)        \
-  X(CVT_NV122RGB, unsigned char, 1, 4)        \
-  X(CVT_BGR2I420, unsigned char, 3, 1)        \
-  X(CVT_BGR2I420, unsigned char, 4, 1)        \
-  X(CVT_I4202BGR, unsigned char, 1, 3)        \
-  X(CVT_I4202BGR, unsigned char, 1, 4)        \
-  X(CVT_YUV2GRAY, unsigned char, 1, 1)        \
-  FASTCV_CVT_BOTH_TYPES(X, CVT_BGR2LAB, 3, 3) \
-  FASTCV_CVT_BOTH_TYPES(X, CVT_BGR2LAB, 4, 3) \
-  FASTCV_CVT_BOTH_TYPES(X, CVT_LAB2BGR, 3, 3) \
-  FASTCV_CVT_BOTH_TYPES(X, CVT_LAB2BGR, 3, 4)
+#define FASTCV_CVT_COLOR_INSTANCES(X)           \
+  X(CVT_BGR2NV21, unsigned char, 3, 1)          \
+  X(CVT_BGR2NV21, unsigned char, 4, 1)          \
+  X(CVT_NV212BGR, unsigned char, 1, 3)          \
+  X(CVT_NV212BGR, unsigned char, 1, 4)          \
+  X(CVT_NV212RGB, unsigned char, 1, 3)          \
+  X(CVT_NV212RGB, unsigned char, 1, 4)          \
+  X(CVT_RGB2NV21, unsigned char, 3, 1)          \
+  X(CVT_RGB2NV21, unsigned char, 4, 1)          \
+  X(CVT_BGR2NV12, unsigned char, 3, 1)          \
+  X(CVT_BGR2NV12, unsigned char, 4, 1)          \
+  X(CVT_NV122BGR, unsigned char, 1, 3)          \
+  X(CVT_NV122BGR, unsigned char, 1, 4)          \
+  X(CVT_RGB2NV12, unsigned char, 3, 1)          \
+  X(CVT_RGB2NV12, unsigned char, 4, 1)          \
+  X(CVT_NV122RGB, unsigned char, 1, 3)          \
+  X(CVT_NV122RGB, unsigned char, 1, 4)          \
+  X(CVT_BGR2I420, unsigned char, 3, 1)          \
+  X(CVT_BGR2I420, unsigned char, 4, 1)          \
+  X(CVT_I4202BGR, unsigned char, 1, 3)          \
+  X(CVT_I4202BGR, unsigned char, 1, 4)          \
+  X(CVT_YUV2GRAY, unsigned char, 1, 1)          \
+  FASTCV_CVT_BOTH_TYPES(X, CVT_BGR2LAB, 3, 3)   \
+  FASTCV_CVT_BOTH_TYPES(X, CVT_BGR2LAB, 4, 3)   \
+  FASTCV_CVT_BOTH_TYPES(X, CVT_LAB2BGR, 3, 3)   \
+  FASTCV_CVT_BOTH_TYPES(X, CVT_LAB2BGR, 3, 4)   \
+  FASTCV_CVT_BOTH_TYPES(X, CVT_YCrCb2BGR, 3, 3) \
+  FASTCV_CVT_BOTH_TYPES(X, CVT_YCrCb2BGR, 3, 4) \
+  FASTCV_CVT_BOTH_TYPES(X, CVT_BGR2YCrCb, 3, 3) \
+  FASTCV_CVT_BOTH_TYPES(X, CVT_BGR2YCrCb, 4, 3) \
+  FASTCV_CVT_BOTH_TYPES(X, CVT_BGR2GRAY, 3, 1)  \
+  FASTCV_CVT_BOTH_TYPES(X, CVT_BGR2GRAY, 4, 1)  \
+  FASTCV_CVT_BOTH_TYPES(X, CVT_GRAY2BGR, 1, 3)  \
+  FASTCV_CVT_BOTH_TYPES(X, CVT_GRAY2BGR, 1, 4)  \
+  FASTCV_CVT_BOTH_TYPES(X, CVT_BGR2BGRA, 3, 4)  \
+  FASTCV_CVT_BOTH_TYPES(X, CVT_BGRA2BGR, 4, 3)  \
+  FASTCV_CVT_BOTH_TYPES(X, CVT_BGR2RGB, 3, 3)   \
+  FASTCV_CVT_BOTH_TYPES(X, CVT_BGR2RGB, 3, 4)   \
+  FASTCV_CVT_BOTH_TYPES(X, CVT_BGR2RGB, 4, 3)   \
+  FASTCV_CVT_BOTH_TYPES(X, CVT_BGR2RGB, 4, 4)
 
 // X is given (element type, channels): the instances of `crop` and `rotate`.
 #define FASTCV_PACKED_INSTANCES(X) \

@@ -102,6 +102,45 @@ inline void storePixels(float* p, const Pixels<float, nc>& v) {
   }
 }
 
+/// Loads 8 pixels into both halves of a block.
+template <int nc>
+inline Pixels<unsigned char, nc> loadHalf(const unsigned char* p) {
+  static_assert(nc == 3 || nc == 4);
+  const auto twice = [](uint8x8_t v) { return vcombine_u8(v, v); };
+  if constexpr (nc == 3) {
+    const uint8x8x3_t v = vld3_u8(p);
+    return {{twice(v.val[0]), twice(v.val[1]), twice(v.val[2])}};
+  } else {
+    const uint8x8x4_t v = vld4_u8(p);
+    return {{twice(v.val[0]), twice(v.val[1]), twice(v.val[2]), twice(v.val[3])}};
+  }
+}
+
+/// Stores the first 8 pixels of a block.
+template <int nc>
+inline void storeHalf(unsigned char* p, const Pixels<unsigned char, nc>& v) {
+  static_assert(nc == 3 || nc == 4);
+  if constexpr (nc == 3) {
+    const uint8x8x3_t all = {{vget_low_u8(v.c[0]), vget_low_u8(v.c[1]), vget_low_u8(v.c[2])}};
+    vst3_u8(p, all);
+  } else {
+    const uint8x8x4_t all = {
+        {vget_low_u8(v.c[0]), vget_low_u8(v.c[1]), vget_low_u8(v.c[2]), vget_low_u8(v.c[3])}};
+    vst4_u8(p, all);
+  }
+}
+
+/// A block with `nc` channels: `v` itself, or its three channels and `alpha`.
+template <int nc, typename T, int channels>
+inline Pixels<T, nc> withAlpha(const Pixels<T, channels>& v, VectorOf<T> alpha) {
+  if constexpr (nc == channels) {
+    return v;
+  } else {
+    static_assert(nc == 4 && channels == 3);
+    return {{v.c[0], v.c[1], v.c[2], alpha}};
+  }
+}
+
 /// A block of three channels, with an opaque fourth where `nc` is 4.
 template <int nc, typename T>
 inline Pixels<T, nc> pixelsOf(VectorOf<T> c0, VectorOf<T> c1, VectorOf<T> c2) {
@@ -111,6 +150,26 @@ inline Pixels<T, nc> pixelsOf(VectorOf<T> c0, VectorOf<T> c1, VectorOf<T> c2) {
   } else {
     return {{c0, c1, c2}};
   }
+}
+
+/// Loads a block of 4-channel pixels as it lies in memory, 16 bytes a register.
+inline Pixels<unsigned char, 4> loadPacked(const unsigned char* p) {
+  const uint8x16x4_t v = vld1q_u8_x4(p);
+  return {{v.val[0], v.val[1], v.val[2], v.val[3]}};
+}
+inline Pixels<float, 4> loadPacked(const float* p) {
+  const float32x4x4_t v = vld1q_f32_x4(p);
+  return {{v.val[0], v.val[1], v.val[2], v.val[3]}};
+}
+
+/// Stores what `loadPacked` loads.
+inline void storePacked(unsigned char* p, const Pixels<unsigned char, 4>& v) {
+  const uint8x16x4_t all = {{v.c[0], v.c[1], v.c[2], v.c[3]}};
+  vst1q_u8_x4(p, all);
+}
+inline void storePacked(float* p, const Pixels<float, 4>& v) {
+  const float32x4x4_t all = {{v.c[0], v.c[1], v.c[2], v.c[3]}};
+  vst1q_f32_x4(p, all);
 }
 
 /// Writes one pixel from three channels, with an opaque fourth where `nc` is 4.

@@ -1,0 +1,98 @@
+// Gray of BGR and BGRA, and gray spread over the colour channels.
+//
+//   8-bit: gray = (29 B + 150 G + 77 R + 128) >> 8
+//   float: gray = fma(G, 0.587, fma(R, 0.299, B * 0.114))
+
+#include <cmath>
+
+#include "entry.h"
+#include "loop.h"
+
+namespace HPC::fastcv {
+namespace {
+
+using namespace arm;
+
+template <typename T, int ncSrc>
+struct ToGray;
+
+template <int ncSrc>
+struct ToGray<unsigned char, ncSrc> {
+  using Src = unsigned char;
+  using Dst = unsigned char;
+  static constexpr int kSrcChannels = ncSrc;
+  static constexpr int kDstChannels = 1;
+  static constexpr int kInFlight = 4;
+  static constexpr bool kUniform = true;
+
+  static constexpr int kB = 29, kG = 150, kR = 77;
+  static constexpr int kShift = 8;
+
+  Pixels<unsigned char, 1> vector(const Pixels<unsigned char, ncSrc>& p) const {
+    return {{vcombine_u8(half(vget_low_u8(p.c[0]), vget_low_u8(p.c[1]), vget_low_u8(p.c[2])),
+                         half(vget_high_u8(p.c[0]), vget_high_u8(p.c[1]), vget_high_u8(p.c[2])))}};
+  }
+
+  void scalar(const unsigned char* in, unsigned char* out) const {
+    *out = static_cast<unsigned char>((kB * in[0] + kG * in[1] + kR * in[2] + (1 << (kShift - 1))) >> kShift);
+  }
+
+ private:
+  // The weights sum to 256: the sum is at most 65280, and with the rounding half added still a 16-bit number.
+  static uint8x8_t half(uint8x8_t b, uint8x8_t g, uint8x8_t r) {
+    uint16x8_t sum = vmull_u8(b, vdup_n_u8(kB));
+    sum = vmlal_u8(sum, g, vdup_n_u8(kG));
+    sum = vmlal_u8(sum, r, vdup_n_u8(kR));
+    return vrshrn_n_u16(sum, kShift);
+  }
+};
+
+template <int ncSrc>
+struct ToGray<float, ncSrc> {
+  using Src = float;
+  using Dst = float;
+  static constexpr int kSrcChannels = ncSrc;
+  static constexpr int kDstChannels = 1;
+  static constexpr int kInFlight = 4;
+  static constexpr bool kUniform = true;
+
+  static constexpr float kB = 0.114f, kG = 0.587f, kR = 0.299f;
+
+  Pixels<float, 1> vector(const Pixels<float, ncSrc>& p) const {
+    const float32x4_t red = vfmaq_f32(vmulq_f32(p.c[0], vdupq_n_f32(kB)), p.c[2], vdupq_n_f32(kR));
+    return {{vfmaq_f32(red, p.c[1], vdupq_n_f32(kG))}};
+  }
+
+  void scalar(const float* in, float* out) const {
+    *out = std::fma(in[1], kG, std::fma(in[2], kR, in[0] * kB));
+  }
+};
+
+template <typename T, int ncDst>
+struct FromGray {
+  using Src = T;
+  using Dst = T;
+  static constexpr int kSrcChannels = 1;
+  static constexpr int kDstChannels = ncDst;
+  static constexpr int kInFlight = ncDst == 3 ? 8 : 4;
+  static constexpr bool kUniform = true;
+
+  Pixels<T, 3> vector(const Pixels<T, 1>& p) const { return {{p.c[0], p.c[0], p.c[0]}}; }
+
+  void scalar(const T* in, T* out) const { storePixel<ncDst, T>(out, *in, *in, *in); }
+};
+
+using uchar = unsigned char;
+
+}  // namespace
+
+FASTCV_ENTRY(armBGR2GRAYImage, uchar, 3, 1, convertImage<ToGray<uchar, 3>>)
+FASTCV_ENTRY(armBGR2GRAYImage, uchar, 4, 1, convertImage<ToGray<uchar, 4>>)
+FASTCV_ENTRY(armBGR2GRAYImage, float, 3, 1, convertImage<ToGray<float, 3>>)
+FASTCV_ENTRY(armBGR2GRAYImage, float, 4, 1, convertImage<ToGray<float, 4>>)
+FASTCV_ENTRY(armGRAY2BGRImage, uchar, 1, 3, convertImage<FromGray<uchar, 3>>)
+FASTCV_ENTRY(armGRAY2BGRImage, uchar, 1, 4, convertImage<FromGray<uchar, 4>>)
+FASTCV_ENTRY(armGRAY2BGRImage, float, 1, 3, convertImage<FromGray<float, 3>>)
+FASTCV_ENTRY(armGRAY2BGRImage, float, 1, 4, convertImage<FromGray<float, 4>>)
+
+}  // namespace HPC::fastcv

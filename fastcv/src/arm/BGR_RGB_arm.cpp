@@ -1,0 +1,92 @@
+// Channel reorderings: alpha added or dropped, red and blue swapped. Values are moved bit for bit.
+
+#include "entry.h"
+#include "loop.h"
+
+namespace HPC::fastcv {
+namespace {
+
+using namespace arm;
+
+enum class Order { kKept, kSwapped };
+
+/// All but four channels to four. Interleaved loads and stores separate the channels; table look-ups on whole
+/// registers (three loads, three look-ups, three stores) took 0.65 instructions a pixel for 0.41 here from
+/// BGR to RGB, and no fewer cycles.
+template <typename T, int ncSrc, int ncDst, Order order>
+struct Reorder {
+  using Src = T;
+  using Dst = T;
+  static constexpr int kSrcChannels = ncSrc;
+  static constexpr int kDstChannels = ncDst;
+  static constexpr int kInFlight = 4;
+  static constexpr bool kUniform = true;
+
+  static constexpr int kFirst = order == Order::kSwapped ? 2 : 0;
+  static constexpr int kThird = 2 - kFirst;
+
+  Pixels<T, 3> vector(const Pixels<T, ncSrc>& p) const { return {{p.c[kFirst], p.c[1], p.c[kThird]}}; }
+
+  void scalar(const T* in, T* out) const { storePixel<ncDst, T>(out, in[kFirst], in[1], in[kThird]); }
+};
+
+/// Red and blue swapped, alpha kept. A pixel's bytes stay within their register, so a table look-up per
+/// register does it: 0.47 instructions and 0.25 cycles a pixel on Neoverse N1, where the interleaved store of
+/// four registers alone takes 0.19 and the whole 0.44.
+template <typename T>
+struct SwapKeepingAlpha {
+  using Src = T;
+  using Dst = T;
+  static constexpr int kSrcChannels = 4;
+  static constexpr int kDstChannels = 4;
+  static constexpr int kInFlight = 4;
+  static constexpr bool kUniform = true;
+  static constexpr bool kPacked = true;
+
+  Pixels<T, 4> vector(const Pixels<T, 4>& p) const {
+    return {{swapped(p.c[0]), swapped(p.c[1]), swapped(p.c[2]), swapped(p.c[3])}};
+  }
+
+  void scalar(const T* in, T* out) const {
+    const T alpha = in[3];
+    storePixel<3, T>(out, in[2], in[1], in[0]);
+    out[3] = alpha;
+  }
+
+ private:
+  static uint8x16_t swapped(uint8x16_t pixels) {
+    static constexpr unsigned char kOrder[] = {2, 1, 0, 3, 6, 5, 4, 7, 10, 9, 8, 11, 14, 13, 12, 15};
+    return vqtbl1q_u8(pixels, vld1q_u8(kOrder));
+  }
+  static float32x4_t swapped(float32x4_t pixel) {
+    static constexpr unsigned char kOrder[] = {8, 9, 10, 11, 4, 5, 6, 7, 0, 1, 2, 3, 12, 13, 14, 15};
+    return vreinterpretq_f32_u8(vqtbl1q_u8(vreinterpretq_u8_f32(pixel), vld1q_u8(kOrder)));
+  }
+};
+
+using uchar = unsigned char;
+
+// The workers.
+template <int ncSrc, int ncDst>
+constexpr auto cvt_color_bgr2bgr_f32 = convertImage<Reorder<float, ncSrc, ncDst, Order::kKept>>;
+template <int ncSrc, int ncDst>
+constexpr auto cvt_color_bgr2rgb_f32 = convertImage<Reorder<float, ncSrc, ncDst, Order::kSwapped>>;
+constexpr auto cvt_color_bgra2rgba_uchar = convertImage<SwapKeepingAlpha<uchar>>;
+constexpr auto cvt_color_bgra2rgba_f32 = convertImage<SwapKeepingAlpha<float>>;
+
+}  // namespace
+
+FASTCV_ENTRY(armBGR2BGRAImage, uchar, 3, 4, convertImage<Reorder<uchar, 3, 4, Order::kKept>>)
+FASTCV_ENTRY(armBGR2BGRAImage, float, 3, 4, cvt_color_bgr2bgr_f32<3, 4>)
+FASTCV_ENTRY(armBGRA2BGRImage, uchar, 4, 3, convertImage<Reorder<uchar, 4, 3, Order::kKept>>)
+FASTCV_ENTRY(armBGRA2BGRImage, float, 4, 3, convertImage<Reorder<float, 4, 3, Order::kKept>>)
+FASTCV_ENTRY(armBGR2RGBImage, uchar, 3, 3, convertImage<Reorder<uchar, 3, 3, Order::kSwapped>>)
+FASTCV_ENTRY(armBGR2RGBImage, uchar, 3, 4, convertImage<Reorder<uchar, 3, 4, Order::kSwapped>>)
+FASTCV_ENTRY(armBGR2RGBImage, uchar, 4, 3, convertImage<Reorder<uchar, 4, 3, Order::kSwapped>>)
+FASTCV_ENTRY(armBGR2RGBImage, uchar, 4, 4, cvt_color_bgra2rgba_uchar)
+FASTCV_ENTRY(armBGR2RGBImage, float, 3, 3, convertImage<Reorder<float, 3, 3, Order::kSwapped>>)
+FASTCV_ENTRY(armBGR2RGBImage, float, 3, 4, cvt_color_bgr2rgb_f32<3, 4>)
+FASTCV_ENTRY(armBGR2RGBImage, float, 4, 3, convertImage<Reorder<float, 4, 3, Order::kSwapped>>)
+FASTCV_ENTRY(armBGR2RGBImage, float, 4, 4, cvt_color_bgra2rgba_f32)
+
+}  // namespace HPC::fastcv
