@@ -1,5 +1,5 @@
-/// The NEON intrinsics: the compiler's own on Arm, SIMDe's on x86-64, some of them in a better form. Kernels include
-/// nothing else for them.
+/// The NEON intrinsics: the compiler's own on Arm, SIMDe's on x86-64, some of them in a better form. Kernels
+/// include nothing else for them.
 #pragma once
 
 #if defined(__ARM_NEON)
@@ -8,6 +8,9 @@
 #define SIMDE_ENABLE_NATIVE_ALIASES
 #include <simde/arm/neon.h>
 #include "neon_x86.h"
+#ifndef vdivq_f32
+inline float32x4_t vdivq_f32(float32x4_t a, float32x4_t b) { return a / b; }
+#endif
 #endif
 
 namespace HPC::fastcv::arm {
