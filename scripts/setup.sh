@@ -18,13 +18,13 @@ packages_host=(
   openjdk-17-jdk-headless      # javac, JNI headers and the virtual machine
   junit4                       # the tests in the virtual machine
   libjetbrains-annotations-java # nullability annotations, for the compiler only
+  python3                      # the tests that look at what was built; scripts/bench
 )
 packages_aarch64=(
   "${packages_host[@]}"
   clang-19 lld-19 llvm-19      # the compiler family of Android's NDK
   g++-aarch64-linux-gnu        # the C and C++ libraries that it compiles and links against
   qemu-user                    # runs the result
-  python3                      # scripts/bench, which checks the instruction counts
 )
 packages_lint=(
   "${packages_aarch64[@]}"
