@@ -288,15 +288,21 @@ TEST(CropExamples, FloatsAreCopiedBitByBit) {
   EXPECT_EQ(0, memcmp(in.data(), out.data(), bits.size() * sizeof(float)));
 }
 
-// Rows that overlap their own copies arrive whole.
+// Rows that overlap their own copies arrive whole, whichever way they move.
 TEST(CropExamples, OverlappingRowsAreCopied) {
-  std::vector<u8> image(100);
+  std::vector<u8> image(300);
   for (size_t i = 0; i < image.size(); ++i) {
     image[i] = static_cast<u8>(i);
   }
-  armImageCrop<u8, 1, u8, 1, 1>(0, 5, 100, image.data(), 1, 90, 100, image.data(), 1.0f);
-  for (size_t i = 0; i < 90; ++i) {
-    ASSERT_EQ(image[i], i + 5) << i;
+  std::vector<u8> moved = image;
+  armImageCrop<u8, 1, u8, 1, 1>(0, 5, 300, moved.data(), 1, 290, 300, moved.data(), 1.0f);
+  for (size_t i = 0; i < 290; ++i) {
+    ASSERT_EQ(moved[i], image[i + 5]) << i;
+  }
+  moved = image;
+  armImageCrop<u8, 1, u8, 1, 1>(0, 0, 300, moved.data(), 1, 290, 300, moved.data() + 5, 1.0f);
+  for (size_t i = 0; i < 290; ++i) {
+    ASSERT_EQ(moved[i + 5], image[i]) << i;
   }
 }
 

@@ -10,9 +10,9 @@
 // rely on the difference: no group may take pixels of another row, and none may end a row.
 
 #include <cmath>
-#include <cstring>
 #include <type_traits>
 
+#include "copy.h"
 #include "entry.h"
 #include "loop.h"
 
@@ -139,7 +139,9 @@ void copyRows(ptrdiff_t height, ptrdiff_t rowElements, ptrdiff_t inStride, const
     height = 1;
   }
   for (ptrdiff_t row = 0; row < height; ++row) {
-    memmove(out + row * outStride, in + row * inStride, static_cast<size_t>(rowElements) * sizeof(T));
+    copyRow(reinterpret_cast<const unsigned char*>(in + row * inStride),
+            reinterpret_cast<unsigned char*>(out + row * outStride),
+            rowElements * static_cast<ptrdiff_t>(sizeof(T)));
   }
 }
 

@@ -7,9 +7,9 @@
 // width that is plain contiguous I420.
 
 #include <cstdlib>
-#include <cstring>
 #include <memory>
 
+#include "copy.h"
 #include "entry.h"
 #include "kernel_assert.h"
 #include "rotate.h"
@@ -55,7 +55,7 @@ void gather(const Rows<const unsigned char>& rows, ptrdiff_t height, ptrdiff_t w
     height = 1;
   }
   for (ptrdiff_t r = 0; r < height; ++r) {
-    memcpy(packed + r * width, rows.at(r), static_cast<size_t>(width));
+    arm::copyRow(rows.at(r), packed + r * width, width);
   }
 }
 

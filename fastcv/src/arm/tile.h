@@ -12,6 +12,7 @@
 #include <utility>
 
 #include "neon.h"
+#include "registers.h"
 
 /// For what must not be a call: a tile lives in registers, its indices are constants.
 #define TILE_INLINE inline __attribute__((always_inline))
@@ -42,13 +43,6 @@ struct RowPairs {
     }
   }
 };
-
-/// Hides where a value comes from. The compiler then keeps it in its register, where it would otherwise
-/// derive it again from others at every use.
-template <typename T>
-TILE_INLINE void keepInRegister(T& value) {
-  asm("" : "+r"(value));
-}
 
 /// Distances in bytes from the first of `count` equally distant source rows to each.
 template <int count>

@@ -1,0 +1,14 @@
+/// How kernels tell the compiler what it is to keep in registers.
+#pragma once
+
+namespace HPC::fastcv::arm {
+
+/// Hides where a value comes from. The compiler then keeps it in its register, where it would otherwise
+/// derive it again from others at every use, or make it the by-product of a load or store, for which in-order
+/// cores wait.
+template <typename T>
+inline __attribute__((always_inline)) void keepInRegister(T& value) {
+  asm("" : "+r"(value));
+}
+
+}  // namespace HPC::fastcv::arm
