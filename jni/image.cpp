@@ -1,6 +1,8 @@
 // Native methods of FaceLibrary over the frame helpers.
+#include <android/bitmap.h>
 #include <jni.h>
 
+#include "bridge_log.h"
 #include "frame.h"
 #include "pinned.h"
 
@@ -8,6 +10,31 @@ namespace {
 
 /// The `format` argument of the frame helpers.
 enum FrameFormat { kNv12 = 2, kNv21 = 3 };
+
+/// Converts the pixels of an RGBA bitmap into `out`. Rows are taken as packed, whatever the bitmap's stride.
+/// Both methods over it deliberately write the messages of the first.
+void read_bitmap(JNIEnv* env, jobject bitmap, jbyteArray out, decltype(BGR2RGB)* convert) {
+  if (bitmap == nullptr) {
+    FACE_LOG(ANDROID_LOG_ERROR, "getBGRADataFromBitmap image is null ");
+    return;
+  }
+  AndroidBitmapInfo info = {};
+  AndroidBitmap_getInfo(env, bitmap, &info);
+  if (info.width == 0 || info.height == 0 || info.format != ANDROID_BITMAP_FORMAT_RGBA_8888) {
+    FACE_LOG(ANDROID_LOG_ERROR, "getBGRADataFromBitmap image is not  RGBA_8888");
+    return;
+  }
+  void* pixels = nullptr;
+  AndroidBitmap_lockPixels(env, bitmap, &pixels);
+  if (pixels == nullptr) {
+    return;
+  }
+  if (kyface::PinnedArray pinned_out(env, out); pinned_out) {
+    convert(static_cast<unsigned char*>(pixels), static_cast<int>(info.width), static_cast<int>(info.height),
+            pinned_out.bytes());
+  }
+  AndroidBitmap_unlockPixels(env, bitmap);
+}
 
 }  // namespace
 
@@ -41,6 +68,10 @@ JNIEXPORT void JNICALL Java_com_vantrel_faceapi_FaceLibrary_convertColorSpace(JN
     case 5:
       nv2BGR(in.bytes(), kNv12, width, height, out.bytes());
       break;
+    case 14:
+    case 101:
+      BGR2RGB(in.bytes(), width, height, out.bytes());
+      break;
     case 20:
       RGB2nv(in.bytes(), kNv12, width, height, out.bytes());
       break;
@@ -52,6 +83,20 @@ JNIEXPORT void JNICALL Java_com_vantrel_faceapi_FaceLibrary_convertColorSpace(JN
   }
   in.release();
   out.release();
+}
+
+JNIEXPORT void JNICALL Java_com_vantrel_faceapi_FaceLibrary_getBGRADataFromBitmap(JNIEnv* env,
+                                                                                  jobject /*thiz*/,
+                                                                                  jobject bitmap,
+                                                                                  jbyteArray out) {
+  read_bitmap(env, bitmap, out, BGR2RGB);
+}
+
+JNIEXPORT void JNICALL Java_com_vantrel_faceapi_FaceLibrary_getBGRDataFromBitmap(JNIEnv* env,
+                                                                                 jobject /*thiz*/,
+                                                                                 jobject bitmap,
+                                                                                 jbyteArray out) {
+  read_bitmap(env, bitmap, out, BGRA2RGB);
 }
 
 JNIEXPORT void JNICALL Java_com_vantrel_faceapi_FaceLibrary_cropNv21Data(JNIEnv* env, jobject /*thiz*/,

@@ -60,3 +60,17 @@ void BGR2nv(unsigned char* in, int format, int width, int height, unsigned char*
                                                                     &dst);
   FACE_LOG_ALWAYS(ANDROID_LOG_INFO, "BGR2nv end");
 }
+
+void BGR2RGB(unsigned char* in, int width, int height, unsigned char* out) {
+  FACE_LOG_ALWAYS(ANDROID_LOG_INFO, "BGR2RGB start");
+  Image<4> dst(width, height, out);
+  kyface::convert<HPC::fastcv::CVT_BGR2RGB>(Image<4>(width, height, in), &dst);
+  FACE_LOG_ALWAYS(ANDROID_LOG_INFO, "BGR2RGB end");
+}
+
+void BGRA2RGB(unsigned char* in, int width, int height, unsigned char* out) {
+  FACE_LOG_ALWAYS(ANDROID_LOG_INFO, "BGRA2RGB start");
+  Image<3> dst(width, height, out);
+  kyface::convert<HPC::fastcv::CVT_BGR2RGB>(Image<4>(width, height, in), &dst);
+  FACE_LOG_ALWAYS(ANDROID_LOG_INFO, "BGRA2RGB end");
+}

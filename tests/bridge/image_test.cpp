@@ -37,6 +37,18 @@ using testing::ElementsAre;
 
 constexpr unsigned char kUntouched = 0xA5;
 
+/// 4-byte pixels with their first and third byte exchanged; the fourth stays or goes.
+Bytes swap_red_and_blue(const Bytes& from, int channels) {
+  Bytes to;
+  for (size_t i = 0; i < from.size(); i += 4) {
+    to.insert(to.end(), {from[i + 2], from[i + 1], from[i]});
+    if (channels == 4) {
+      to.push_back(from[i + 3]);
+    }
+  }
+  return to;
+}
+
 size_t pixels(int width, int height) { return static_cast<size_t>(width) * height; }
 
 class ImageTest : public BridgeTest {
@@ -95,6 +107,18 @@ TEST_F(ImageTest, ConvertsPixelsToFrames) {
   EXPECT_EQ(convert(colours, kWidth, kHeight, frame.size(), 20),
             to_frame(colours, kWidth, kHeight, reference::kNv12, reference::kRgba));
   expect_conversion({"RGB2nv "});
+}
+
+TEST_F(ImageTest, SwapsRedAndBlue) {
+  for (int code : {14, 101}) {
+    EXPECT_EQ(convert(colours, kWidth, kHeight, colours.size(), code), swap_red_and_blue(colours, 4)) << code;
+    expect_conversion({"BGR2RGB start", "BGR2RGB end"});
+  }
+}
+
+TEST_F(ImageTest, SwapsInImagesOfOddSizes) {
+  const Bytes input(colours.begin(), colours.begin() + 21 * 5 * 4);
+  EXPECT_EQ(convert(input, 21, 5, input.size(), 14), swap_red_and_blue(input, 4));
 }
 
 TEST_F(ImageTest, LeavesTheOutputOfAnUnknownCode) {
@@ -161,6 +185,120 @@ TEST_F(ImageTest, HelpersWriteNothingForAnOddPictureHeight) {
   Bytes out(pixels(kWidth, 481) * 4, kUntouched);
   nv2BGR(in.data(), 3, kWidth, 481, out.data());
   EXPECT_EQ(out, Bytes(out.size(), kUntouched));
+}
+
+// ---- bitmaps
+
+class BitmapTest : public ImageTest {
+ protected:
+  BitmapTest() {
+    fake::bitmap().info = {kWidth, kHeight, kWidth * 4, ANDROID_BITMAP_FORMAT_RGBA_8888, 0};
+    fake::bitmap().pixels = colours;
+    begin();
+  }
+
+  /// Both methods, with what they are to write.
+  struct Method {
+    void (*call)(JNIEnv*, jobject, jobject, jbyteArray);
+    int channels;
+    const char* helper;
+  };
+  static constexpr Method kMethods[] = {
+      {Java_com_vantrel_faceapi_FaceLibrary_getBGRADataFromBitmap, 4, "BGR2RGB"},
+      {Java_com_vantrel_faceapi_FaceLibrary_getBGRDataFromBitmap, 3, "BGRA2RGB"},
+  };
+
+  /// Calls a method and returns the output array.
+  Bytes read(const Method& method) {
+    jbyteArray out = vm.byte_array("out", Bytes(pixels(kWidth, kHeight) * method.channels, kUntouched));
+    method.call(vm.env(), nullptr, bitmap, out);
+    return vm.bytes(out);
+  }
+
+  static Bytes untouched(const Method& method) {
+    return Bytes(pixels(kWidth, kHeight) * method.channels, kUntouched);
+  }
+
+  jobject bitmap = vm.object("bitmap", "android/graphics/Bitmap");
+};
+
+TEST_F(BitmapTest, ReadsAnRgbaBitmap) {
+  for (bool debug : {true, false}) {
+    CALL(setDebug, debug ? JNI_TRUE : JNI_FALSE);
+    for (const Method& method : kMethods) {
+      EXPECT_EQ(read(method), swap_red_and_blue(colours, method.channels));
+      expect_journal({"AndroidBitmap_getInfo()", "AndroidBitmap_lockPixels()", "GetByteArrayElements(out)",
+                      std::string("log 4 FaceAPI: ") + method.helper + " start",
+                      std::string("log 4 FaceAPI: ") + method.helper + " end",
+                      "ReleaseByteArrayElements(out, 0)", "AndroidBitmap_unlockPixels()"});
+    }
+  }
+}
+
+TEST_F(BitmapTest, TakesRowsAsPackedWhateverTheStride) {
+  fake::bitmap().info.stride = kWidth * 4 + 64;
+  for (const Method& method : kMethods) {
+    EXPECT_EQ(read(method), swap_red_and_blue(colours, method.channels));
+  }
+}
+
+TEST_F(BitmapTest, RefusesANullBitmap) {
+  bitmap = nullptr;
+  for (const Method& method : kMethods) {
+    CALL(setDebug, JNI_TRUE);
+    EXPECT_EQ(read(method), untouched(method));
+    expect_journal({"log 6 FaceAPI: getBGRADataFromBitmap image is null "});
+    CALL(setDebug, JNI_FALSE);
+    read(method);
+    expect_journal({});
+  }
+}
+
+TEST_F(BitmapTest, RefusesWhatIsNotRgba8888) {
+  const auto good = fake::bitmap().info;
+  auto no_width = good;
+  no_width.width = 0;
+  auto no_height = good;
+  no_height.height = 0;
+  auto rgb_565 = good;
+  rgb_565.format = ANDROID_BITMAP_FORMAT_RGB_565;
+  auto none = good;
+  none.format = ANDROID_BITMAP_FORMAT_NONE;
+  for (const auto& info : {no_width, no_height, rgb_565, none}) {
+    fake::bitmap().info = info;
+    for (const Method& method : kMethods) {
+      CALL(setDebug, JNI_TRUE);
+      EXPECT_EQ(read(method), untouched(method));
+      expect_journal(
+          {"AndroidBitmap_getInfo()", "log 6 FaceAPI: getBGRADataFromBitmap image is not  RGBA_8888"});
+      CALL(setDebug, JNI_FALSE);
+      read(method);
+      expect_journal({"AndroidBitmap_getInfo()"});
+    }
+  }
+}
+
+TEST_F(BitmapTest, RefusesABitmapThatDoesNotTellItsFormat) {
+  fake::bitmap().info_result = ANDROID_BITMAP_RESULT_JNI_EXCEPTION;
+  for (const Method& method : kMethods) {
+    EXPECT_EQ(read(method), untouched(method));
+    expect_journal(
+        {"AndroidBitmap_getInfo()", "log 6 FaceAPI: getBGRADataFromBitmap image is not  RGBA_8888"});
+  }
+}
+
+TEST_F(BitmapTest, DoesNotUnlockWhatItCouldNotLock) {
+  fake::bitmap().pixels.clear();
+  fake::bitmap().lock_result = ANDROID_BITMAP_RESULT_ALLOCATION_FAILED;
+  for (const Method& method : kMethods) {
+    EXPECT_EQ(read(method), untouched(method));
+    expect_journal({"AndroidBitmap_getInfo()", "AndroidBitmap_lockPixels()"});
+  }
+}
+
+TEST_F(BitmapTest, GoesByThePixelsAndNotByTheResultOfTheLock) {
+  fake::bitmap().lock_result = ANDROID_BITMAP_RESULT_JNI_EXCEPTION;
+  EXPECT_EQ(read(kMethods[0]), swap_red_and_blue(colours, 4));
 }
 
 // ---- crop
@@ -327,6 +465,18 @@ TEST_F(RotationTest, LeavesTheOutputOfOtherAnglesButReportsASize) {
   for (int degree : {0, 45, 89, 91, 360, 450, -90, -270}) {
     EXPECT_EQ(rotate(degree, kWidth, kHeight), Bytes(picture.size(), kUntouched)) << degree;
   }
+}
+
+TEST_F(ImageTest, HelpersSwapRedAndBlue) {
+  Bytes in = colours;
+  Bytes four(colours.size());
+  BGR2RGB(in.data(), kWidth, kHeight, four.data());
+  EXPECT_EQ(four, swap_red_and_blue(colours, 4));
+  expect_journal({"log 4 FaceAPI: BGR2RGB start", "log 4 FaceAPI: BGR2RGB end"});
+  Bytes three(pixels(kWidth, kHeight) * 3);
+  BGRA2RGB(in.data(), kWidth, kHeight, three.data());
+  EXPECT_EQ(three, swap_red_and_blue(colours, 3));
+  expect_journal({"log 4 FaceAPI: BGRA2RGB start", "log 4 FaceAPI: BGRA2RGB end"});
 }
 
 }  // namespace

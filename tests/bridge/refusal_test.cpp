@@ -150,12 +150,20 @@ TEST_F(RefusalTest, Features) {
 }
 
 TEST_F(RefusalTest, Images) {
-  for (int code : {1, 2, 3, 5, 20, 1001, 4}) {
+  for (int code : {1, 2, 3, 5, 14, 20, 101, 1001, 4}) {
     refuse_everything({"-convertColorSpace", [&, code] {
                          CALL(convertColorSpace, bytes, 2, 2, more_bytes, code);
                          return true;
                        }});
   }
+  refuse_everything({"-getBGRADataFromBitmap", [&] {
+                       CALL(getBGRADataFromBitmap, bitmap, bytes);
+                       return true;
+                     }});
+  refuse_everything({"-getBGRDataFromBitmap", [&] {
+                       CALL(getBGRDataFromBitmap, bitmap, bytes);
+                       return true;
+                     }});
   refuse_everything({"-cropNv21Data", [&] {
                        CALL(cropNv21Data, bytes, 4, 4, 0, 0, 2, 2, more_bytes);
                        return true;
