@@ -15,6 +15,7 @@ packages_host=(
   libsimde-dev                 # NEON intrinsics on x86-64
   libdlib-dev                  # the open engine
   googletest                   # sources; the tests are built from them for both presets
+  libopencv-imgproc-dev        # the conformity test's second opinion
   openjdk-17-jdk-headless      # javac, JNI headers and the virtual machine
   junit4                       # the tests in the virtual machine
   libjetbrains-annotations-java # nullability annotations, for the compiler only
