@@ -1,8 +1,8 @@
 /// A face engine that costs nothing and counts what it has handed out.
 ///
-/// Detection and tracking find as many faces as the image's first byte says, each with as many points as its second
-/// byte says. A feature has as many bytes as the image's first byte says. `ky_face_algorithm_info` returns how many
-/// result arrays and features are out.
+/// Detection and tracking find as many faces as the image's first byte says, each with as many points as its
+/// second byte says. A feature has as many bytes as the image's first byte says. `ky_face_algorithm_info`
+/// returns how many result arrays and features are out.
 #include <atomic>
 #include <cstdlib>
 #include <cstring>
@@ -62,7 +62,8 @@ int ky_face_algorithm_info() { return handed_out; }
 
 int ky_face_create_tracker(ky_handle_t* handle, const char*, int) { return create(handle); }
 void ky_face_destroy_tracker(ky_handle_t) {}
-int ky_face_track(ky_handle_t, const unsigned char* image, int, int, int, int, int, ky_face_t** faces, int* count) {
+int ky_face_track(ky_handle_t, const unsigned char* image, int, int, int, int, int, ky_face_t** faces,
+                  int* count) {
   return find(image, faces, count);
 }
 void ky_face_release_tracker_result(ky_face_t* faces, int) { takeBack(faces); }

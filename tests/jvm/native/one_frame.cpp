@@ -1,5 +1,6 @@
-/// Calls native methods again and again from one native frame. A method called from Java drops whatever references it
-/// leaves behind; called from here they would pile up, and the virtual machine's checks complain.
+/// Calls native methods again and again from one native frame. A method called from Java drops whatever
+/// references it leaves behind; called from here they would pile up, and the virtual machine's checks
+/// complain.
 #include <jni.h>
 
 extern "C" {
@@ -9,13 +10,13 @@ jobjectArray Java_com_vantrel_faceapi_FaceLibrary_kyFaceTrackBytes(JNIEnv* env, 
                                                                    jint height, jint stride, jint orientation,
                                                                    jintArray status);
 
-JNIEXPORT jint JNICALL Java_com_vantrel_faceapi_LeakTest_trackInOneFrame(JNIEnv* env, jclass type, jlong handle,
-                                                                         jbyteArray image, jintArray status,
-                                                                         jint calls) {
+JNIEXPORT jint JNICALL Java_com_vantrel_faceapi_LeakTest_trackInOneFrame(JNIEnv* env, jclass type,
+                                                                         jlong handle, jbyteArray image,
+                                                                         jintArray status, jint calls) {
   jint faces = 0;
   for (jint i = 0; i < calls; ++i) {
-    jobjectArray found = Java_com_vantrel_faceapi_FaceLibrary_kyFaceTrackBytes(env, type, handle, image, 0, 4, 4, 4,
-                                                                               0, status);
+    jobjectArray found = Java_com_vantrel_faceapi_FaceLibrary_kyFaceTrackBytes(env, type, handle, image, 0, 4,
+                                                                               4, 4, 0, status);
     if (found == nullptr) {
       return -1;
     }
