@@ -282,6 +282,21 @@ TEST_P(RotateYuv420, NothingToWrite) {
   EXPECT_TRUE(to.holds(before));
 }
 
+// Sizes and strides below 0, whose products are not: nothing is read either.
+TEST_P(RotateYuv420, NothingToRead) {
+  GuardedImage<u8> from(1, 4, 4), to(1, 4, 4);
+  const std::vector<u8> before = to.contents();
+  for (const int degree : kAngles) {
+    for (const int width : {-2, -3, -4, -8}) {
+      for (const int rows : {-3, -6, -12}) {
+        armRotateNx90degree_YUV420<u8>(rows, width, width, from.data(), rows, width, width, to.data(), degree,
+                                       GetParam());
+      }
+    }
+  }
+  EXPECT_TRUE(to.holds(before));
+}
+
 // Planes that begin further than 2^31 bytes into both frames.
 TEST_P(RotateYuv420, OffsetsBeyond32Bits) {
   constexpr int kStride = 1 << 20;

@@ -50,6 +50,9 @@ using Scratch = std::unique_ptr<unsigned char, Free>;
 
 // Copies `height` rows of `width` bytes to `packed`, with nothing between them.
 void gather(const Rows<const unsigned char>& rows, ptrdiff_t height, ptrdiff_t width, unsigned char* packed) {
+  if (height < 1 || width < 1) {
+    return;
+  }
   if (rows.afterEven == width && rows.afterOdd == width) {
     width *= height;
     height = 1;
