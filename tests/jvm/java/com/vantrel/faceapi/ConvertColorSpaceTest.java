@@ -89,6 +89,22 @@ public class ConvertColorSpaceTest {
     }
 
     @Test
+    public void redAndBlueChangePlaces() {
+        for (int code : new int[] {ColorConversion.BGRA_TO_RGBA, ColorConversion.BGRA_TO_RGBA_ALIAS}) {
+            for (int width = 1; width <= 70; width++) { // pixels of their own need no even size
+                byte[] src = randomBytes(width * 3 * 4);
+                byte[] expected = src.clone();
+                for (int i = 0; i < src.length; i += 4) {
+                    expected[i] = src[i + 2];
+                    expected[i + 2] = src[i];
+                }
+                assertArrayEquals("code " + code + ", width " + width, expected,
+                        convert(src, width, 3, src.length, code));
+            }
+        }
+    }
+
+    @Test
     public void framesSurviveTheWayThroughPixels() {
         int width = 128;
         int height = 96;

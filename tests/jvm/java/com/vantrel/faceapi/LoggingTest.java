@@ -3,6 +3,7 @@ package com.vantrel.faceapi;
 import static org.junit.Assert.assertEquals;
 import static org.junit.Assert.assertFalse;
 
+import android.graphics.Bitmap;
 import java.io.IOException;
 import java.util.ArrayList;
 import java.util.Arrays;
@@ -21,6 +22,12 @@ public class LoggingTest {
             "E/FaceAPI: kyFaceDetect detect handle is null",
             "E/FaceAPI: kyFaceDestroyDetector destroy detect handle is null");
 
+    private static final List<String> BITMAP = Arrays.asList(
+            "E/FaceAPI: getBGRADataFromBitmap image is null ",
+            "E/FaceAPI: getBGRADataFromBitmap image is null ",
+            "E/FaceAPI: getBGRADataFromBitmap image is not  RGBA_8888",
+            "E/FaceAPI: getBGRADataFromBitmap image is not  RGBA_8888");
+
     private static final List<String> BRIGHTNESS = Arrays.asList(
             "E/FaceAPI: IMAGE IS NULL",
             "V/FaceAPI: width:4,width_stride:16,height:3,height_stride:7,rect_x:1,rect_y:0,rect_w:2,rect_h:3",
@@ -38,6 +45,14 @@ public class LoggingTest {
             "I/FaceAPI: RGB2nv ",
             "I/FaceAPI: nv212BGR start",
             "I/FaceAPI: nv212BGR end",
+            "I/FaceAPI: BGR2RGB start",
+            "I/FaceAPI: BGR2RGB end",
+            "I/FaceAPI: BGR2RGB start",
+            "I/FaceAPI: BGR2RGB end",
+            "I/FaceAPI: BGR2RGB start",
+            "I/FaceAPI: BGR2RGB end",
+            "I/FaceAPI: BGRA2RGB start",
+            "I/FaceAPI: BGRA2RGB end",
             "D/FaceAPI: rotateBGR degree: 270",
             "D/FaceAPI: rotateBGR degree: 45");
 
@@ -59,12 +74,12 @@ public class LoggingTest {
 
     @Test
     public void everythingAtFirst() throws IOException, InterruptedException {
-        assertLogs("untouched", Arrays.asList(DETECTOR, BRIGHTNESS, CONVERSIONS));
+        assertLogs("untouched", Arrays.asList(DETECTOR, BITMAP, BRIGHTNESS, CONVERSIONS));
     }
 
     @Test
     public void everythingWhenOn() throws IOException, InterruptedException {
-        assertLogs("on", Arrays.asList(DETECTOR, BRIGHTNESS, CONVERSIONS));
+        assertLogs("on", Arrays.asList(DETECTOR, BITMAP, BRIGHTNESS, CONVERSIONS));
     }
 
     @Test
@@ -83,10 +98,12 @@ public class LoggingTest {
             }
             detector();
             byte[] bytes = new byte[16 * 16 * 4];
+            bitmap(bytes);
             brightness(bytes);
-            for (int code : new int[] {1, 2, 3, 5, 20, 1001}) {
+            for (int code : new int[] {1, 2, 3, 5, 20, 1001, 14, 101}) {
                 FaceLibrary.convertColorSpace(bytes, 16, 16, new byte[bytes.length], code);
             }
+            rgbaBitmap(bytes);
             FaceLibrary.rotateBGR(bytes, 4, 4, new byte[bytes.length], 270, new int[2]);
             FaceLibrary.rotateBGR(bytes, 4, 4, new byte[bytes.length], 45, new int[2]);
             FaceLibrary.cropNv21Data(bytes, 4, 4, 0, 0, 4, 4, new byte[bytes.length]); // says nothing
@@ -105,6 +122,20 @@ public class LoggingTest {
             FaceLibrary.kyFaceDestroyDetector(detector);
             FaceLibrary.kyFaceDetectBytes(0, new byte[16], 0, 4, 4, 4, 0, status);
             FaceLibrary.kyFaceDestroyDetector(0);
+        }
+
+        private static void bitmap(byte[] bytes) {
+            FaceLibrary.getBGRADataFromBitmap(null, bytes);
+            FaceLibrary.getBGRDataFromBitmap(null, bytes);
+            Bitmap bitmap = Bitmap.createBitmap(4, 4, Bitmap.Config.RGB_565);
+            FaceLibrary.getBGRADataFromBitmap(bitmap, bytes);
+            FaceLibrary.getBGRDataFromBitmap(bitmap, bytes);
+        }
+
+        private static void rgbaBitmap(byte[] bytes) {
+            Bitmap bitmap = Bitmap.createBitmap(4, 4, Bitmap.Config.ARGB_8888);
+            FaceLibrary.getBGRADataFromBitmap(bitmap, bytes);
+            FaceLibrary.getBGRDataFromBitmap(bitmap, bytes);
         }
 
         private static void brightness(byte[] bytes) {
