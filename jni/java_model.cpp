@@ -14,7 +14,8 @@ constexpr char kRectClass[] = "android/graphics/Rect";
 constexpr char kPointFClass[] = "android/graphics/PointF";
 constexpr char kFaceInfoClass[] = "com/vantrel/faceapi/model/FaceInfo";
 
-/// Everything that is looked up at load.
+/// Everything that is looked up at load. What a failed look-up leaves null is deliberately used as it is by
+/// later conversions: the virtual machine has its say.
 struct Registry {
   struct {
     jfieldID left, top, right, bottom;

@@ -19,6 +19,11 @@ import com.vantrel.faceapi.model.FaceInfo;
  * {@code status} array. A null or 0 result with an untouched status array means that an argument was refused before
  * the engine was asked, so set the element to something of your own before the call.
  *
+ * <p><b>Shrinking.</b> Native code looks up {@code Rect}, {@code PointF}, {@link FaceInfo}, their fields and no-argument
+ * constructors by name when the library is loaded. Where one is missing the library loads all the same and logs "Can't
+ * find" with its name. Everything that neither returns nor takes a {@link FaceInfo} works then; a call that finds a face,
+ * or reads one, ends the process.
+ *
  * <p><b>Threads.</b> Calls run on the calling thread. Two threads must not use one handle at the same time. The image
  * and brightness methods keep no state and may run concurrently on arrays of their own.
  *
