@@ -251,44 +251,6 @@ TEST_F(DetectorTest, AZeroHandleIsRefused) {
   EXPECT_THAT(vm.at(status).words, ElementsAre(-77, 5));
 }
 
-// ---- an engine that does not keep to its contract
-
-TEST_F(DetectorTest, ANegativeCountIsNoFace) {
-  engine.faces = {make_face(1, 1)};
-  engine.count = -3;
-  EXPECT_EQ(detect(), nullptr);
-  EXPECT_THAT(fake::entries("ky_face_release"), ElementsAre("ky_face_release_detector_result(faces, -3)"));
-}
-
-TEST_F(DetectorTest, ACountWithoutFacesIsNoFace) {
-  engine.null_faces = true;
-  engine.count = 3;
-  EXPECT_EQ(detect(), nullptr);
-  EXPECT_THAT(vm.at(status).words, ElementsAre(0, 5));
-  EXPECT_THAT(fake::entries("ky_face_release"), ElementsAre("ky_face_release_detector_result(null, 3)"));
-  EXPECT_EQ(vm.calls("NewObjectArray"), 0);
-}
-
-TEST_F(DetectorTest, ACountThatTheMachineHasNoMemoryForIsNoFace) {
-  engine.faces = {make_face(1, 1)};
-  engine.count = std::numeric_limits<int>::max();
-  EXPECT_EQ(detect(), nullptr);
-  EXPECT_TRUE(vm.exception_pending());
-  EXPECT_THAT(fake::entries("ky_face_release"),
-              ElementsAre("ky_face_release_detector_result(faces, 2147483647)"));
-}
-
-TEST_F(DetectorTest, APointsCountBeyondTheRecordIsCutOff) {
-  engine.faces = {make_face(1, 257), make_face(2, std::numeric_limits<int>::max()), make_face(3, -1),
-                  make_face(4, std::numeric_limits<int>::min())};
-  jobjectArray faces = detect();
-  ASSERT_EQ(vm.at(faces).elements.size(), 4U);
-  const size_t sizes[] = {256, 256, 0, 0};
-  for (size_t i = 0; i < 4; ++i) {
-    EXPECT_EQ(face(faces, i).objects.at("facePoints")->elements.size(), sizes[i]);
-  }
-}
-
 // ---- model information
 
 TEST_F(DetectorTest, ShowsTheInsideModel) {

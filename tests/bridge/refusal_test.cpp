@@ -195,9 +195,28 @@ TEST_F(RefusalTest, Brightness) {
                          return CALL(faceBrightEvaluate, bytes, format, 4, 16, 4, 4, 0, 0, 4, 4) == 255;
                        }});
   }
+  refuse_everything({"-faceBrightEvaluate, without a metric",
+                     [&] { return CALL(faceBrightEvaluate, bytes, 2, 4, 16, 4, 4, 0, 0, 4, 4) == -1; }});
   refuse_everything(
       {"averageBrightness", [&] { return CALL(averageBrightness, bytes, 8, 8, 0, 0, 8, 8) == 0.0F; }});
   testing::internal::GetCapturedStdout();
+}
+
+// Every other native method has nothing that could be refused.
+TEST_F(RefusalTest, TheOthersAskTheMachineForNothing) {
+  begin();
+  CALL(setDebug, JNI_TRUE);
+  CALL(kyFaceDestroyDetector, 0x77);
+  CALL(kyFaceDestroyTracker, 0x77);
+  CALL(kyFaceDestroyVerify, 0x77);
+  CALL(kyFaceShowInsideModel);
+  CALL(kyFaceResetTracker, 0x77);
+  CALL(kyFaceTrackSetDetectFaceCntLimit, 0x77, 1);
+  CALL(kyFaceTrackSetDetectInterval, 0x77, 1);
+  CALL(kyFaceTrackSetAlignmentThreshold, 0x77, 1);
+  CALL(kyFaceGetVerifyVersion, 0x77);
+  CALL(kyFaceGetVerifyLength, 0x77);
+  EXPECT_TRUE(vm.all_calls().empty());
 }
 
 }  // namespace

@@ -1,6 +1,4 @@
 // The verifier's native methods, and the conversion of faces from Java.
-#include <limits>
-
 #include "bridge_test.h"
 
 namespace {
@@ -277,26 +275,6 @@ TEST_F(VerifierTest, KeepsTheFeatureWhenThereIsNoArrayForItsText) {
               ElementsAre("GetIntArrayElements(status)", "NewByteArray(5)",
                           "log 6 FaceAPI: kyFaceVerify new Feature Failed !! maybe out of memory!!",
                           "ReleaseIntArrayElements(status, 0)", "ReleaseByteArrayElements(image, 0)"));
-}
-
-TEST_F(VerifierTest, ALengthBelowZeroIsSizedInUnsignedArithmetic) {
-  const struct {
-    int length;
-    const char* call;
-  } cases[] = {{-1, "NewByteArray(1)"},
-               {-2, "NewByteArray(1)"},
-               {-3, "NewByteArray(1431655765)"},
-               {std::numeric_limits<int>::min(), "NewByteArray(-1431655763)"},
-               {std::numeric_limits<int>::max(), "NewByteArray(-1431655763)"}};
-  engine.text = "";
-  for (const auto& one : cases) {
-    jobject face = make_java_face(0);
-    engine.feature_length = one.length;
-    jbyteArray text = get_feature(face);
-    EXPECT_THAT(fake::entries("NewByteArray"), ElementsAre(one.call)) << one.length;
-    EXPECT_EQ(text == nullptr, vm.exception_pending());
-    EXPECT_EQ(text == nullptr, one.length != -1 && one.length != -2);
-  }
 }
 
 // ---- comparison

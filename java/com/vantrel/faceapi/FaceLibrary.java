@@ -19,10 +19,10 @@ import com.vantrel.faceapi.model.FaceInfo;
  * {@code status} array. A null or 0 result with an untouched status array means that an argument was refused before
  * the engine was asked, so set the element to something of your own before the call.
  *
- * <p><b>Shrinking.</b> Native code looks up {@code Rect}, {@code PointF}, {@link FaceInfo}, their fields and no-argument
- * constructors by name when the library is loaded. Where one is missing the library loads all the same and logs "Can't
- * find" with its name. Everything that neither returns nor takes a {@link FaceInfo} works then; a call that finds a face,
- * or reads one, ends the process.
+ * <p><b>Shrinking.</b> When the library is loaded it looks up {@code Rect}, {@code PointF} and {@link FaceInfo}, their
+ * fields and their no-argument constructors by name. Where one is missing the library loads all the same and logs
+ * "Can't find" with its name. Whatever neither returns nor takes a {@link FaceInfo} works then; a call that finds a
+ * face, or reads one, ends the process.
  *
  * <p><b>Threads.</b> Calls run on the calling thread. Two threads must not use one handle at the same time. The image
  * and brightness methods keep no state and may run concurrently on arrays of their own.
@@ -251,7 +251,8 @@ public final class FaceLibrary {
      * @param width image width in pixels
      * @param height image height in pixels
      * @param stride bytes from one row to the next
-     * @param face the face in the image's coordinates, of which 256 points at most are read; null gives null
+     * @param face the face in the image's coordinates; its first 256 points are read, and null parts of it as zeros
+     *     (see {@link FaceInfo}); null gives null
      * @param status at least one element; set to 0 on success and left as it is on any failure; null gives null
      * @return the serialized feature, {@code (n + 2) / 3 * 4 + 1} bytes for a feature of {@code n}: text with a
      *     terminating zero, to be kept and compared as it is; null on any failure

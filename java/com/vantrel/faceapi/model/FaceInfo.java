@@ -14,8 +14,9 @@ public class FaceInfo {
     public Rect faceRect;
 
     /**
-     * The landmark points; an empty array when the engine gives none, never null in a result. Feature extraction reads
-     * the first 256 points and ignores any further ones, reads null as no points, and a null point as (0, 0).
+     * The landmark points; an empty array when the engine gives none, never null in a result, and at most 256. Feature
+     * extraction reads the first 256 points and ignores any further ones, reads null as no points, and a null point as
+     * (0, 0).
      */
     public PointF[] facePoints;
 

@@ -10,6 +10,7 @@ import static org.junit.Assert.assertTrue;
 import android.graphics.PointF;
 import android.graphics.Rect;
 import com.vantrel.faceapi.model.FaceInfo;
+import java.io.IOException;
 import java.util.Arrays;
 import java.util.Base64;
 import org.junit.After;
@@ -124,6 +125,47 @@ public class VerifierTest {
                 verifier, portrait.nv21(), 99, Portrait.WIDTH, Portrait.HEIGHT, Portrait.WIDTH, portraitsFace(),
                 status));
         assertEquals(UNTOUCHED, status[0]);
+    }
+
+    @Test
+    public void nullPartsOfAFaceAreReadAsZeros() {
+        FaceInfo zeros = portraitsFace();
+        zeros.facePoints = new PointF[] {new PointF(3, 4), new PointF(), new PointF(5, 6)};
+        FaceInfo face = portraitsFace();
+        face.facePoints = new PointF[] {new PointF(3, 4), null, new PointF(5, 6)};
+        assertArrayEquals(feature(portrait, zeros), feature(portrait, face));
+        face.facePoints = null;
+        assertArrayEquals(feature(portrait, portraitsFace()), feature(portrait, face));
+        face.faceRect = null;
+        status[0] = UNTOUCHED;
+        assertNull("an empty rectangle has no feature", feature(portrait, face));
+        assertEquals(UNTOUCHED, status[0]);
+    }
+
+    /** In a virtual machine of its own: its checks complain of as many references as there are points. */
+    @Test
+    public void pointsBeyond256AreNotRead() throws IOException, InterruptedException {
+        Child child = Child.run(ManyPoints.class);
+        assertEquals(child.output + child.errors, 0, child.exitStatus);
+        assertTrue(child.output, child.output.endsWith("the same feature\n"));
+    }
+
+    static final class ManyPoints {
+        public static void main(String[] args) {
+            VerifierTest test = new VerifierTest();
+            test.create();
+            PointF[] points = new PointF[1000];
+            for (int i = 0; i < points.length; i++) {
+                points[i] = new PointF(Portrait.FACE.left + i % 16, Portrait.FACE.top + i / 16 % 16);
+            }
+            FaceInfo face = portraitsFace();
+            face.facePoints = Arrays.copyOf(points, 256);
+            byte[] feature = test.feature(test.portrait, face);
+            face.facePoints = points;
+            if (feature != null && Arrays.equals(feature, test.feature(test.portrait, face))) {
+                System.out.println("the same feature");
+            }
+        }
     }
 
     @Test
