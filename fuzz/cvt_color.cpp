@@ -7,6 +7,7 @@
 #include <vector>
 
 #include "assertion.h"
+#include "cvt_families.h"
 #include "fastcv.h"
 #include "fuzz_input.h"
 #include "guarded_image.h"
@@ -16,18 +17,12 @@ namespace {
 using namespace HPC::fastcv;
 using kyface::fuzz::Input;
 using kyface::test::GuardedImage;
+using kyface::test::isFrom420;
+using kyface::test::isTo420;
 
 template <typename T, int nc>
 using Image = Mat<T, nc, ECO_ENV_ARM>;
 
-constexpr bool isTo420(ColorCvtType t) {
-  return t == CVT_BGR2NV21 || t == CVT_RGB2NV21 || t == CVT_BGR2NV12 || t == CVT_BGR2I420 ||
-         t == CVT_RGB2NV12;
-}
-constexpr bool isFrom420(ColorCvtType t) {
-  return t == CVT_NV212BGR || t == CVT_NV212RGB || t == CVT_NV122BGR || t == CVT_I4202BGR ||
-         t == CVT_YUV2GRAY || t == CVT_NV122RGB;
-}
 constexpr bool isPlanar(ColorCvtType t) {
   return t == CVT_BGR2I420 || t == CVT_I4202BGR || t == CVT_YUV2GRAY;
 }

@@ -62,6 +62,24 @@ class BridgeTest : public testing::Test {
   fake::Engine& engine = fake::engine();
 };
 
+/// A FaceInfo with every field distinct and `count` points (i + 0.5, -i).
+inline jobject make_java_face(fake::Vm& vm, int count) {
+  jobject face = vm.object("face", kFaceInfoClass);
+  fake::Object& rect = vm.at(vm.object("rect", kRectClass));
+  rect.ints = {{"left", 1}, {"top", -2}, {"right", 3}, {"bottom", -4}};
+  std::vector<fake::Object*> points;
+  for (int i = 0; i < count; ++i) {
+    fake::Object& point = vm.at(vm.object("point" + std::to_string(i), kPointFClass));
+    point.floats = {{"x", static_cast<float>(i) + 0.5F}, {"y", static_cast<float>(-i)}};
+    points.push_back(&point);
+  }
+  vm.at(face).objects = {{"faceRect", &rect},
+                         {"facePoints", &vm.at(vm.object_array("points", kPointFClass, points))}};
+  vm.at(face).floats = {{"score", 5.5F}, {"yaw", 6.5F}, {"pitch", 7.5F}, {"roll", 8.5F}, {"eyeDist", 9.5F}};
+  vm.at(face).ints = {{"id", 10}};
+  return face;
+}
+
 /// A record with every field distinct; its points are (seed + i, -i).
 inline ky_face_t make_face(int seed, int points_count) {
   ky_face_t face = {};

@@ -9,7 +9,7 @@
 namespace fake {
 
 Engine& engine() {
-  static Engine instance;
+  static thread_local Engine instance;
   return instance;
 }
 

@@ -43,7 +43,7 @@ struct Engine {
   static constexpr int kAsMany = -1000000;
 };
 
-/// The engine that the `ky_*` functions of this program speak for.
+/// The engine that the `ky_*` functions of this program speak for on this thread.
 Engine& engine();
 
 }  // namespace fake

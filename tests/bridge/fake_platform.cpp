@@ -10,7 +10,7 @@
 namespace fake {
 
 Bitmap& bitmap() {
-  static Bitmap instance;
+  static thread_local Bitmap instance;
   return instance;
 }
 

@@ -8,7 +8,7 @@
 
 namespace fake {
 
-/// The one bitmap there is.
+/// The one bitmap that a thread has.
 struct Bitmap {
   AndroidBitmapInfo info = {};
   /// Results of the calls; `getInfo` stores nothing when its result is a failure.

@@ -286,20 +286,23 @@ struct Functions {
   }
 };
 
-Vm::Vm() {
+namespace {
+
+JNINativeInterface_ makeFunctions() {
+  JNINativeInterface_ table = {};
 #define KY_UNEXPECTED(function)                                 \
   Unexpected<&JNINativeInterface_::function>::name = #function; \
-  table_.function = Unexpected<&JNINativeInterface_::function>::call;
+  table.function = Unexpected<&JNINativeInterface_::function>::call;
   KY_JNI_FUNCTIONS(KY_UNEXPECTED)
 #undef KY_UNEXPECTED
   // All but the four reserved entries are set: whatever the bridge calls, the test says which it was.
-  void* entries[sizeof table_ / sizeof(void*)];
-  std::memcpy(entries, &table_, sizeof table_);
+  void* entries[sizeof table / sizeof(void*)];
+  std::memcpy(entries, &table, sizeof table);
   for (size_t i = 4; i < std::size(entries); ++i) {
     EXPECT_NE(entries[i], nullptr) << "JNI function " << i << " is missing in the list of functions";
   }
 
-#define KY_MODELLED(function) table_.function = Functions::function;
+#define KY_MODELLED(function) table.function = Functions::function;
   KY_MODELLED(FindClass)
   KY_MODELLED(GetFieldID)
   KY_MODELLED(GetMethodID)
@@ -325,10 +328,24 @@ Vm::Vm() {
   KY_MODELLED(ReleaseIntArrayElements)
   KY_MODELLED(ReleaseStringUTFChars)
 #undef KY_MODELLED
-  env_.functions = &table_;
+  return table;
+}
+
+JNIInvokeInterface_ makeInvokeFunctions() {
+  JNIInvokeInterface_ table = {};
+  table.GetEnv = Functions::GetEnv;
+  return table;
+}
+
+}  // namespace
+
+Vm::Vm() {
+  // Shared by the machines of all threads.
+  static const JNINativeInterface_ functions = makeFunctions();
+  static const JNIInvokeInterface_ invokeFunctions = makeInvokeFunctions();
+  env_.functions = &functions;
   env_.vm = this;
-  invoke_table_.GetEnv = Functions::GetEnv;
-  invoke_.functions = &invoke_table_;
+  invoke_.functions = &invokeFunctions;
   invoke_.vm = this;
 
   classes_["android/graphics/Rect"].members = {"left:I", "top:I", "right:I", "bottom:I", "<init>:()V"};

@@ -1,5 +1,5 @@
-/// A virtual machine for tests: it records every call in the journal, models the few classes that the bridge
-/// uses, counts what is borrowed and not given back, and can refuse any call.
+/// A virtual machine for tests, as one thread sees it: it records every call in the journal, models the few
+/// classes that the bridge uses, counts what is borrowed and not given back, and can refuse any call.
 #pragma once
 
 #include <jni.h>
@@ -117,8 +117,6 @@ class Vm {
   void* pin(jobject reference, const char* kind, const char* function);
   void unpin(jobject reference, const void* elements, int mode, const char* kind, const char* function);
 
-  JNINativeInterface_ table_ = {};
-  JNIInvokeInterface_ invoke_table_ = {};
   Env env_;
   Invoke invoke_;
   std::deque<Object> objects_;

@@ -6,7 +6,7 @@
 namespace fake {
 
 std::vector<std::string>& journal() {
-  static std::vector<std::string> lines;
+  static thread_local std::vector<std::string> lines;
   return lines;
 }
 

@@ -7,7 +7,7 @@
 
 namespace fake {
 
-/// All entries since the last `clear`, one line each.
+/// All entries of this thread since the last `clear`, one line each.
 std::vector<std::string>& journal();
 
 /// Adds an entry, formatted as by printf.

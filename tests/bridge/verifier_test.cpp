@@ -13,21 +13,8 @@ class VerifierTest : public BridgeTest {
     begin();
   }
 
-  /// A FaceInfo with every field distinct and `count` points (i + 0.5, -i).
   jobject make_java_face(int count) {
-    jobject face = vm.object("face", kFaceInfoClass);
-    fake::Object& rect = vm.at(vm.object("rect", kRectClass));
-    rect.ints = {{"left", 1}, {"top", -2}, {"right", 3}, {"bottom", -4}};
-    std::vector<fake::Object*> points;
-    for (int i = 0; i < count; ++i) {
-      fake::Object& point = vm.at(vm.object("point" + std::to_string(i), kPointFClass));
-      point.floats = {{"x", static_cast<float>(i) + 0.5F}, {"y", static_cast<float>(-i)}};
-      points.push_back(&point);
-    }
-    vm.at(face).objects = {{"faceRect", &rect},
-                           {"facePoints", &vm.at(vm.object_array("points", kPointFClass, points))}};
-    vm.at(face).floats = {{"score", 5.5F}, {"yaw", 6.5F}, {"pitch", 7.5F}, {"roll", 8.5F}, {"eyeDist", 9.5F}};
-    vm.at(face).ints = {{"id", 10}};
+    jobject face = ::make_java_face(vm, count);
     begin();
     return face;
   }
