@@ -2,7 +2,9 @@
 
 # Checks built into everything, tests included: what -fsanitize takes.
 set(KYFACE_SANITIZE "" CACHE STRING "Sanitizers to build with")
+set(kyface_instrumented OFF)
 if(KYFACE_SANITIZE)
+  set(kyface_instrumented ON)
   add_compile_options(-fsanitize=${KYFACE_SANITIZE} -fno-sanitize-recover=all -fno-omit-frame-pointer -g1)
   add_link_options(-fsanitize=${KYFACE_SANITIZE})
 endif()
