@@ -12,23 +12,8 @@
 #include <cstring>
 #include <string>
 
+#include "lap.h"
 #include "operation.h"
-
-namespace {
-
-void mark() {
-#if defined(__aarch64__)
-  asm volatile("hint #112" : : : "memory");
-#endif
-}
-
-void repeat(const std::function<void()>& call, int times) {
-  for (int i = 0; i < times; ++i) {
-    call();
-  }
-}
-
-}  // namespace
 
 int main(int argc, char** argv) {
   if (argc < 5) {
@@ -41,13 +26,7 @@ int main(int argc, char** argv) {
   for (int i = 4; i < argc; ++i) {
     const bench::Size size = bench::sizeOf(argv[i]);
     for (const bench::Operation& operation : operations) {
-      const std::function<void()> call = operation.prepare(size);
-      call();
-      mark();
-      repeat(call, repeats);
-      mark();
-      repeat(call, 3 * repeats);
-      mark();
+      bench::measure(operation.prepare(size), repeats);
       std::printf("%s\t%s\t%s\t%g\t%zu\n", operation.name.c_str(), operation.library.c_str(), argv[i],
                   operation.traffic, 2 * static_cast<size_t>(repeats) * size.pixels());
     }

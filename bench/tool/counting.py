@@ -1,4 +1,4 @@
-"""Instructions of the arm64 build, exact: bench_count under the emulator's counting plugin."""
+"""Instructions of the arm64 build, exact: its programs under the emulator's counting plugin."""
 
 import collections
 import dataclasses
@@ -56,32 +56,63 @@ class Counts:
     blocks: dict  # Block by id
 
 
+@dataclasses.dataclass
+class CallCount:
+    """What a call of a native method needs."""
+
+    machine_calls: int  # calls into the virtual machine
+    instructions: float  # of the shared library alone
+
+
 def count(build, root, own, pattern, sizes, repeats=1):
     """Runs bench_count of the folder `build` and returns the Counts of the operations matching `pattern`."""
+    arguments = ["bench_count", "own" if own else "all", str(repeats), pattern, *sizes]
+    lines, laps, blocks = _run(build, root, arguments)
+    counts = {}
+    for index, line in enumerate(lines):
+        operation, library, size, traffic, pixels = line.split("\t")
+        instructions, executions = _difference(laps, index)
+        counts[Key(operation, library, size)] = Count(float(traffic), int(pixels), instructions, executions)
+    return Counts(counts, blocks)
+
+
+def count_bridge(build, root, repeats=10):
+    """Runs bench_bridge of the folder `build` and returns {call: CallCount}."""
+    lines, laps, blocks = _run(build, root, ["bench_bridge", str(repeats)])
+    begin, end = (int(address, 16) for address in lines[0].split("\t"))
+    counts = {}
+    for index, line in enumerate(lines[1:]):
+        name, machine_calls, calls = line.split("\t")
+        _, executions = _difference(laps, index)
+        own = sum(
+            len(blocks[block].words) * number
+            for block, number in executions.items()
+            if begin <= blocks[block].address < end
+        )
+        counts[name] = CallCount(int(machine_calls), own / int(calls))
+    return counts
+
+
+def _run(build, root, arguments):
+    """Runs a program of `build` under the plugin: the lines it prints, its laps, its blocks by id."""
     with tempfile.NamedTemporaryFile(suffix=".laps") as laps_file:
         command = ["qemu-aarch64", "-cpu", "cortex-a76", "-L", str(root)]
         command += ["-E", f"LD_LIBRARY_PATH={EXTRA_LIBRARY_PATH}"]
         command += ["-plugin", f"{build}/lib/libcount.so,out={laps_file.name}"]
-        command += [f"{build}/bin/bench_count", "own" if own else "all", str(repeats), pattern, *sizes]
+        command += [f"{build}/bin/{arguments[0]}", *arguments[1:]]
         run = subprocess.run(command, stdout=subprocess.PIPE, text=True, check=False)
         if run.returncode != 0:
-            sys.exit(f"bench: bench_count failed with status {run.returncode}")
-        laps, blocks = _read_laps(Path(laps_file.name))
+            sys.exit(f"bench: {arguments[0]} failed with status {run.returncode}")
+        return run.stdout.splitlines(), *_read_laps(Path(laps_file.name))
 
-    counts = {}
-    for index, line in enumerate(run.stdout.splitlines()):
-        operation, library, size, traffic, pixels = line.split("\t")
-        # Three laps each: what went before, the short run, the long one.
-        short, long = laps[3 * index + 1], laps[3 * index + 2]
-        executions = collections.Counter(long[1])
-        executions.subtract(short[1])
-        counts[Key(operation, library, size)] = Count(
-            traffic=float(traffic),
-            pixels=int(pixels),
-            instructions=long[0] - short[0],
-            blocks={block: number for block, number in executions.items() if number > 0},
-        )
-    return Counts(counts, blocks)
+
+def _difference(laps, index):
+    """Instructions and executions by block of what was measured as the `index`th. It has three laps: what went before,
+    the short run, the long one."""
+    short, long = laps[3 * index + 1], laps[3 * index + 2]
+    executions = collections.Counter(long[1])
+    executions.subtract(short[1])
+    return long[0] - short[0], {block: number for block, number in executions.items() if number > 0}
 
 
 def _read_laps(path):

@@ -1,79 +1,198 @@
-"""The table that scripts/bench prints."""
+"""The tables that scripts/bench prints and writes."""
+
+import dataclasses
 
 from .counting import Key
 from .model import CORES
 
 OWN = "fastcv"
 PEERS = ["libyuv", "opencv"]
-
-
 FLOOR = "memcpy"
 
+# What an operation may cost more at another size, and on this machine more than the better peer.
+TAIL_FACTOR = 1.15
+HOST_FACTOR = 1.5
+# Goals and the figures of others are written with two or three digits.
+ROUNDING_FACTOR = 1.005
 
-def table(sizes, counts, cycles, times, markdown=False):
-    """Everything about the first size, and of this project's operations the instructions at the others too. `counts`
-    and `cycles` are as counting and model return them, `times` holds counting.Time. Columns without a figure are left
-    out."""
-    size = sizes[0]
-    measured = {**times, **counts}
-    operations = list(dict.fromkeys(key.operation for key in measured if key.library != FLOOR))
-    # A floor belongs to all operations of a traffic.
-    floors = {figure.traffic: key.operation for key, figure in measured.items() if key.library == FLOOR}
-    floor_of = {key.operation: floors.get(figure.traffic, "") for key, figure in measured.items()}
 
-    def instructions(operation, library, at=size):
-        count = counts.get(Key(operation, library, at))
-        return f"{count.per_pixel:.3f}" if count else ""
+@dataclasses.dataclass
+class Figures:
+    """All that was measured, and what it is compared with. Figures are per pixel."""
 
-    def model(operation, library, core):
-        figures = cycles.get(Key(operation, library, size))
-        return f"{figures[core]:.3f}" if figures else ""
+    sizes: list  # at the first everything is measured, at the others this project's own operations
+    counts: dict  # counting.Count by counting.Key
+    cycles: dict  # {core: cycles} by Key
+    times: dict  # counting.Time by Key
+    known: dict  # {operation: {"by": library, "instructions" or core: figure}} of libraries that no package brings
+    goals: dict  # {operation: {"instructions" or core: figure}}
 
-    def milliseconds(operation, library):
-        time = times.get(Key(operation, library, size))
-        return f"{time.milliseconds:.3f}" if time else ""
+    def __post_init__(self):
+        measured = {**self.times, **self.counts}
+        self.operations = list(dict.fromkeys(key.operation for key in measured if key.library != FLOOR))
+        # A floor belongs to all operations of a traffic.
+        floors = {figure.traffic: key.operation for key, figure in measured.items() if key.library == FLOOR}
+        self._floor_of = {key.operation: floors.get(figure.traffic) for key, figure in measured.items()}
 
+    def _key(self, operation, library, size):
+        return Key(self._floor_of[operation] if library == FLOOR else operation, library, size or self.sizes[0])
+
+    def cost(self, what, operation, library, size=None):
+        """Instructions, or the cycles of a core; None where there is no figure."""
+        key = self._key(operation, library, size)
+        if what in CORES:
+            return self.cycles.get(key, {}).get(what)
+        return self.counts[key].per_pixel if key in self.counts else None
+
+    def milliseconds(self, operation, library):
+        time = self.times.get(self._key(operation, library, None))
+        return time.milliseconds if time else None
+
+    def best_known(self, what, operation):
+        return self.known.get(operation, {}).get(what) if self.counts else None
+
+    def goal(self, what, operation):
+        return self.goals.get(operation, {}).get(what) if self.counts else None
+
+    def best_peer(self, what, operation):
+        """(figure, library) of the peer that needs least, or None."""
+        costs = [(self.cost(what, operation, library), library) for library in PEERS]
+        costs.append((self.best_known(what, operation), self.known.get(operation, {}).get("by")))
+        return min((cost for cost in costs if cost[0] is not None), default=None)
+
+    def better_time(self, operation):
+        """(milliseconds, library) of the faster peer on this machine, or None."""
+        times = [(self.milliseconds(operation, library), library) for library in PEERS]
+        return min((time for time in times if time[0] is not None), default=None)
+
+    def host_ratio(self, operation):
+        """This project's time as a multiple of the faster peer's, or None."""
+        own, peer = self.milliseconds(operation, OWN), self.better_time(operation)
+        return own / peer[0] if own is not None and peer else None
+
+
+@dataclasses.dataclass
+class Table:
+    """Columns of names and cells, as text; those without any figure are left out."""
+
+    names: list
+    rows: list
+
+    def __post_init__(self):
+        filled = [index for index in range(len(self.names)) if any(row[index] for row in self.rows)]
+        self.names = [self.names[index] for index in filled]
+        self.rows = [[row[index] for index in filled] for row in self.rows]
+
+    def markdown(self):
+        lines = [self.names, ["---"] + ["--:"] * (len(self.names) - 1), *self.rows]
+        return "\n".join("| " + " | ".join(line) + " |" for line in lines)
+
+    def plain(self):
+        """Columns as wide as their figures; the names above them word by word."""
+        heads = [name.split() for name in self.names]
+        height = max((len(words) for words in heads), default=0)
+        lines = [[([""] * (height - len(words)) + words)[line] for words in heads] for line in range(height)]
+        lines += self.rows
+        widths = [max(len(line[index]) for line in lines) for index in range(len(self.names))]
+
+        def line_of(cells):
+            cells = [cell.rjust(width) if index else cell.ljust(width)
+                     for index, (cell, width) in enumerate(zip(cells, widths))]
+            return "  ".join(cells).rstrip()
+
+        text = [line_of(line) for line in lines]
+        text.insert(height, "-" * max(len(line) for line in text))
+        return "\n".join(text)
+
+
+def _text(figure):
+    return "" if figure is None else f"{figure:.3f}"
+
+
+def _cost_columns(figures, what, unit):
+    """[(name, cell of an operation)] of the instructions, or of a core's cycles."""
+
+    def of(library, size=None):
+        return lambda operation: _text(figures.cost(what, operation, library, size))
+
+    columns = [(f"{unit} {OWN}", of(OWN))]
+    columns += [(f"{unit} at {size}", of(OWN, size)) for size in figures.sizes[1:]]
+    columns += [(f"{unit} {peer}", of(peer)) for peer in PEERS]
+    columns.append((f"{unit} best known", lambda operation: _text(figures.best_known(what, operation))))
+    columns.append((f"{unit} {FLOOR}", of(FLOOR)))
+    columns.append((f"{unit} goal", lambda operation: _text(figures.goal(what, operation))))
+    return columns
+
+
+def instruction_columns(figures):
+    return _cost_columns(figures, "instructions", "instr/px")
+
+
+def cycle_columns(figures):
+    return [column for core in CORES for column in _cost_columns(figures, core, f"{core} cycles/px")]
+
+
+def host_columns(figures):
+    columns = [
+        (f"host ms {library}", lambda operation, of=library: _text(figures.milliseconds(operation, of)))
+        for library in [OWN, *PEERS, FLOOR]
+    ]
+    columns.append(("times the better peer's", lambda operation: _ratio(figures.host_ratio(operation))))
+    return columns
+
+
+def _ratio(factor):
+    return "" if factor is None else f"{factor:.2f}"
+
+
+def operations_table(figures, *column_groups):
+    """The operations, with the columns that the groups give."""
     columns = [("operation", lambda operation: operation)]
-    for library in [OWN, *PEERS]:
-        columns.append((f"instr/px {library}", lambda operation, of=library: instructions(operation, of)))
-        if library == OWN:
-            for other in sizes[1:]:
-                columns.append((f"at {other}", lambda operation, at=other: instructions(operation, OWN, at)))
-    columns.append((f"instr/px {FLOOR}", lambda operation: instructions(floor_of[operation], FLOOR)))
-    for core in CORES:
-        for library in [OWN, *PEERS]:
-            columns.append(
-                (f"{core} cycles/px {library}", lambda operation, of=library, on=core: model(operation, of, on))
-            )
-    for library in [OWN, *PEERS]:
-        columns.append((f"host ms {library}", lambda operation, of=library: milliseconds(operation, of)))
-    columns.append((f"host ms {FLOOR}", lambda operation: milliseconds(floor_of[operation], FLOOR)))
-
-    names = [name for name, _ in columns]
-    rows = [[cell(operation) for _, cell in columns] for operation in operations]
-    filled = [index for index in range(len(names)) if any(row[index] for row in rows)]
-    names = [names[index] for index in filled]
-    rows = [[row[index] for index in filled] for row in rows]
-    return _markdown(names, rows) if markdown else _plain(names, rows)
+    for group in column_groups:
+        columns += group(figures)
+    return Table([name for name, _ in columns], [[cell(operation) for _, cell in columns] for operation in figures.operations])
 
 
-def _markdown(names, rows):
-    lines = [names, ["---"] + ["--:"] * (len(names) - 1), *rows]
-    return "\n".join("| " + " | ".join(line) + " |" for line in lines)
+def shortfall_table(figures):
+    """Where the operations miss a goal, a peer is ahead, or a tail or this machine's build costs too much."""
+    rows = []
+
+    def compare(operation, what, own, mark, whose, factor=ROUNDING_FACTOR):
+        if own is not None and mark is not None and own > mark * factor:
+            rows.append([operation, what, f"{own:.3f}", f"{mark:.3f}", f"{own / mark:.2f}", whose])
+
+    for operation in figures.operations:
+        for what in ["instructions", *CORES]:
+            own = figures.cost(what, operation, OWN)
+            unit = f"{what} cycles/px" if what in CORES else "instr/px"
+            compare(operation, unit, own, figures.goal(what, operation), "goal")
+            peer = figures.best_peer(what, operation)
+            if what in CORES and peer:
+                compare(operation, unit, own, *peer)
+            for size in figures.sizes[1:]:
+                compare(operation, f"{unit} at {size}", figures.cost(what, operation, OWN, size), own,
+                        f"at {figures.sizes[0]}", TAIL_FACTOR)
+        peer = figures.better_time(operation)
+        if peer:
+            compare(operation, "host ms", figures.milliseconds(operation, OWN), *peer, HOST_FACTOR)
+    return Table(["operation", "unit", OWN, "to compare with", "times", "whose"], rows)
 
 
-def _plain(names, rows):
-    """Columns as wide as their figures; the names above them word by word."""
-    heads = [name.split() for name in names]
-    height = max(len(words) for words in heads)
-    lines = [[([""] * (height - len(words)) + words)[line] for words in heads] for line in range(height)] + rows
-    widths = [max(len(line[index]) for line in lines) for index in range(len(names))]
+def small_call_table(small, size, figures):
+    """What a call costs for a picture of `size`, of the Figures `small`: in all, and beyond its pixels."""
+    width, height = map(int, size.split("x"))
+    pixels = width * height
+    rows = []
+    for operation in small.operations:
+        each = small.cost("instructions", operation, OWN)
+        beyond = pixels * (each - figures.cost("instructions", operation, OWN))
+        rows.append([operation, f"{pixels * each:.0f}", f"{beyond:.0f}"]
+                    + [f"{pixels * small.cost(core, operation, OWN):.0f}" for core in CORES])
+    return Table([f"a call for {width} x {height}", "instructions", "of them beyond the pixels"]
+                 + [f"{core} cycles" for core in CORES], rows)
 
-    def line_of(cells):
-        return "  ".join(
-            cell.rjust(width) if index else cell.ljust(width) for index, (cell, width) in enumerate(zip(cells, widths))
-        ).rstrip()
 
-    text = [line_of(line) for line in lines]
-    text.insert(height, "-" * max(len(line) for line in text))
-    return "\n".join(text)
+def bridge_table(counts):
+    """What a call of a native method needs, of counting.CallCount by name."""
+    names = ["native method", "instructions in the library", "calls into the virtual machine"]
+    return Table(names, [[name, f"{count.instructions:.0f}", str(count.machine_calls)] for name, count in counts.items()])

@@ -1,0 +1,30 @@
+"""The counts that are kept, and how new ones compare with them."""
+
+# What an operation may need beyond its record, as a part of it.
+TOLERANCE = 0.02
+
+
+def figures(counts, bridge):
+    """What is kept: {operation: {size: instructions per pixel}}, and of native methods {name: {"call": instructions}}."""
+    result = {}
+    for key, count in counts.items():
+        result.setdefault(key.operation, {})[key.size] = round(count.per_pixel, 4)
+    for name, count in bridge.items():
+        result[name] = {"call": round(count.instructions, 1)}
+    return result
+
+
+def complaints(recorded, measured):
+    """Why `measured` is not as good as `recorded`, a line for each figure; nothing when it is."""
+    lines = []
+    for operation in sorted({*recorded, *measured}):
+        before, now = recorded.get(operation, {}), measured.get(operation, {})
+        for per in sorted({*before, *now}):
+            if per not in now:
+                lines.append(f"{operation}, {per}: recorded, but not measured")
+            elif per not in before:
+                lines.append(f"{operation}, {per}: {now[per]} instructions, none recorded")
+            elif now[per] > before[per] * (1 + TOLERANCE):
+                more = 100 * (now[per] / before[per] - 1)
+                lines.append(f"{operation}, {per}: {now[per]} instructions, {before[per]} recorded (+{more:.1f} %)")
+    return lines

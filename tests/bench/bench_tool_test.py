@@ -1,0 +1,109 @@
+"""Tests what scripts/bench makes of its measurements. Takes the folder of the package `tool`."""
+
+import sys
+import unittest
+
+sys.path.insert(0, sys.argv.pop(1))
+
+from tool import record, table  # noqa: E402  (found through the line above)
+from tool.counting import CallCount, Count, Key, Time  # noqa: E402
+
+SIZE, ODD_SIZE = "1280x720", "1278x718"
+PIXELS = 1000
+
+
+def count_of(per_pixel, traffic=4):
+    return Count(traffic, PIXELS, per_pixel * PIXELS, {})
+
+
+class Record(unittest.TestCase):
+    RECORDED = {"gray": {SIZE: 0.7, ODD_SIZE: 0.71}, "track": {"call": 100}}
+
+    def complaints(self, gray=0.7, track=100):
+        return record.complaints(self.RECORDED, {"gray": {SIZE: gray, ODD_SIZE: 0.71}, "track": {"call": track}})
+
+    def test_what_is_as_recorded_or_better_passes(self):
+        self.assertEqual(self.complaints(), [])
+        self.assertEqual(self.complaints(gray=0.3, track=1), [])
+
+    def test_up_to_two_percent_more_pass(self):
+        self.assertEqual(self.complaints(gray=0.7 * 1.019), [])
+        self.assertEqual(self.complaints(track=101.9), [])
+
+    def test_over_two_percent_more_fail(self):
+        (line,) = self.complaints(gray=0.7 * 1.021)
+        self.assertRegex(line, r"^gray, 1280x720: .*\+2\.1 %")
+        (line,) = self.complaints(track=102.1)
+        self.assertRegex(line, r"^track, call: .*\+2\.1 %")
+
+    def test_every_size_is_compared(self):
+        slow = {"gray": {SIZE: 0.7, ODD_SIZE: 0.8}, "track": {"call": 100}}
+        (line,) = record.complaints(self.RECORDED, slow)
+        self.assertIn(ODD_SIZE, line)
+
+    def test_what_is_missing_on_either_side_fails(self):
+        (line,) = record.complaints(self.RECORDED, {"gray": {SIZE: 0.7, ODD_SIZE: 0.71}})
+        self.assertIn("not measured", line)
+        (line,) = record.complaints(self.RECORDED, {**self.RECORDED, "new": {SIZE: 1}})
+        self.assertIn("none recorded", line)
+        (line,) = record.complaints(self.RECORDED, {**self.RECORDED, "gray": {SIZE: 0.7}})
+        self.assertIn("not measured", line)
+
+    def test_figures_are_per_pixel_and_per_call(self):
+        counts = {Key("gray", "fastcv", SIZE): count_of(0.7), Key("gray", "fastcv", ODD_SIZE): count_of(0.75)}
+        kept = record.figures(counts, {"track": CallCount(machine_calls=4, instructions=130)})
+        self.assertEqual(kept, {"gray": {SIZE: 0.7, ODD_SIZE: 0.75}, "track": {"call": 130}})
+
+
+class Tables(unittest.TestCase):
+    def figures(self, own=0.7, odd=0.7, goal=0.7, own_cycles=0.5, own_time=1.0):
+        counts = {
+            Key("gray", "fastcv", SIZE): count_of(own),
+            Key("gray", "fastcv", ODD_SIZE): count_of(odd),
+            Key("gray", "libyuv", SIZE): count_of(0.9),
+            Key("floor4", "memcpy", SIZE): count_of(0.25),
+        }
+        cycles = {
+            Key("gray", "fastcv", SIZE): {"A55": own_cycles, "N1": own_cycles},
+            Key("gray", "libyuv", SIZE): {"A55": 2.0, "N1": 0.5},
+        }
+        times = {Key("gray", "fastcv", SIZE): Time(4, own_time), Key("gray", "libyuv", SIZE): Time(4, 1.2),
+                 Key("gray", "opencv", SIZE): Time(4, 1.0)}
+        known = {"gray": {"by": "Another", "instructions": 0.8, "A55": 1.0}}
+        return table.Figures([SIZE, ODD_SIZE], counts, cycles, times, known, {"gray": {"instructions": goal}})
+
+    def shortfalls(self, **changes):
+        return [(row[1], row[-1]) for row in table.shortfall_table(self.figures(**changes)).rows]
+
+    def test_the_floor_is_that_of_the_same_traffic(self):
+        self.assertEqual(self.figures().operations, ["gray"])
+        self.assertEqual(self.figures().cost("instructions", "gray", table.FLOOR), 0.25)
+
+    def test_the_best_peer_may_be_one_that_was_not_run(self):
+        self.assertEqual(self.figures().best_peer("A55", "gray"), (1.0, "Another"))
+        self.assertEqual(self.figures().best_peer("N1", "gray"), (0.5, "libyuv"))
+
+    def test_nothing_falls_short_at_the_marks(self):
+        self.assertEqual(self.shortfalls(odd=0.7 * 1.14, own_time=1.49), [])
+
+    def test_each_mark_that_is_passed_is_listed(self):
+        self.assertEqual(self.shortfalls(own=0.71, odd=0.71), [("instr/px", "goal")])
+        self.assertEqual(self.shortfalls(odd=0.7 * 1.16), [(f"instr/px at {ODD_SIZE}", f"at {SIZE}")])
+        self.assertEqual(self.shortfalls(own_cycles=0.6), [("N1 cycles/px", "libyuv")])
+        self.assertEqual(self.shortfalls(own_cycles=1.1), [("A55 cycles/px", "Another"), ("N1 cycles/px", "libyuv")])
+        self.assertEqual(self.shortfalls(own_time=1.51), [("host ms", "opencv")])
+
+    def test_columns_without_figures_are_left_out(self):
+        names = table.operations_table(self.figures(), table.instruction_columns).names
+        self.assertIn("instr/px libyuv", names)
+        self.assertNotIn("instr/px opencv", names)
+
+    def test_a_small_call_is_compared_with_the_pixels_of_a_large_one(self):
+        key = Key("gray", "fastcv", "10x10")
+        small = table.Figures(["10x10"], {key: count_of(1.7)}, {key: {"A55": 2, "N1": 1}}, {}, {}, {})
+        (row,) = table.small_call_table(small, "10x10", self.figures()).rows
+        self.assertEqual(row, ["gray", "170", "100", "200", "100"])
+
+
+if __name__ == "__main__":
+    unittest.main()
