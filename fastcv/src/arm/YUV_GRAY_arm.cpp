@@ -1,8 +1,8 @@
 // The gray image of a YUV 4:2:0 buffer: its luma plane, which every layout has first.
 
 #include <cstddef>
-#include <cstring>
 
+#include "copy.h"
 #include "entry.h"
 #include "kernel_assert.h"
 
@@ -13,12 +13,10 @@ constexpr char kSource[] = "fastcv/src/arm/YUV_GRAY_arm";
 
 void YUV2Gray(int height, int width, ptrdiff_t srcStride, const unsigned char* src, ptrdiff_t dstStride,
               unsigned char* dst) {
-  if (width < 1) {
+  if (height < 1 || width < 1) {
     return;
   }
-  for (ptrdiff_t row = 0; row < height; ++row) {
-    memcpy(dst + row * dstStride, src + row * srcStride, static_cast<size_t>(width));
-  }
+  arm::copyRows(height, width, src, srcStride, dst, dstStride);
 }
 
 }  // namespace

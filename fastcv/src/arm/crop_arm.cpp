@@ -128,23 +128,6 @@ void scaleImage(float ratio, int height, int width, int inStride, const float* i
   forEachPixel(ScaleFloats{ratio}, height, width * nc, inStride, in, outStride, out);
 }
 
-// ---- any sample
-
-// Copies rows as they are, also over themselves; all at once where nothing lies between them.
-template <typename T>
-void copyRows(ptrdiff_t height, ptrdiff_t rowElements, ptrdiff_t inStride, const T* in, ptrdiff_t outStride,
-              T* out) {
-  if (inStride == rowElements && outStride == rowElements) {
-    rowElements *= height;
-    height = 1;
-  }
-  for (ptrdiff_t row = 0; row < height; ++row) {
-    copyRow(reinterpret_cast<const unsigned char*>(in + row * inStride),
-            reinterpret_cast<unsigned char*>(out + row * outStride),
-            rowElements * static_cast<ptrdiff_t>(sizeof(T)));
-  }
-}
-
 }  // namespace
 
 template <typename T, int ncSrc, typename TDst, int ncDst, int nc>
@@ -157,8 +140,9 @@ void armImageCrop(int top, int left, int inWidthStride, const T* inData, int out
   const T* const first =
       inData + static_cast<ptrdiff_t>(top) * inWidthStride + static_cast<ptrdiff_t>(left) * nc;
   if (ratio == 1.0f) {
-    copyRows<T>(outHeight, static_cast<ptrdiff_t>(outWidth) * nc, inWidthStride, first, outWidthStride,
-                outData);
+    constexpr ptrdiff_t kSize = sizeof(T);
+    copyRows(outHeight, kSize * nc * outWidth, reinterpret_cast<const unsigned char*>(first),
+             kSize * inWidthStride, reinterpret_cast<unsigned char*>(outData), kSize * outWidthStride);
   } else {
     scaleImage<nc>(ratio, outHeight, outWidth, inWidthStride, first, outWidthStride, outData);
   }
