@@ -15,6 +15,7 @@
 #include "kernels.h"
 #include "lab_reference.h"
 #include "lab_tables.h"
+#include "roots.h"
 
 namespace {
 
@@ -475,6 +476,44 @@ TEST(LabF32, ManyColours) {
   }
   checkValues(kForward32, colours);
   checkValues(kBack32, labs);
+}
+
+// The roots are powf's own, to the last bit: every float of the range that colours reach, many of those
+// beyond. Few of them have to be asked for.
+TEST(LabF32, RootsArePowf) {
+  using namespace HPC::fastcv::arm;
+#if defined(__x86_64__)
+  constexpr uint32_t kStep = 1;
+#else
+  constexpr uint32_t kStep = 101;  // the emulator is slow
+#endif
+  const RootFactors factors;
+  const auto bitsOf = [](float v) {
+    uint32_t bits;
+    memcpy(&bits, &v, sizeof(bits));
+    return bits;
+  };
+  long blocks = 0, asked = 0;
+  const auto check = [&](uint32_t from, uint32_t to, uint32_t step) {
+    for (uint32_t bits = from; bits < to; bits += 4 * step) {
+      const uint32_t all[4] = {bits, bits + step, bits + 2 * step, bits + 3 * step};
+      float t[4], actual[4];
+      memcpy(t, all, sizeof(t));
+      const Roots roots(vld1q_f32(t), factors);
+      const bool doubtful = vminvq_u32(roots.clear()) == 0;
+      vst1q_f32(actual, doubtful ? roots.settled() : roots.rounded());
+      ++blocks;
+      asked += doubtful ? 1 : 0;
+      for (int i = 0; i < 4; ++i) {
+        ASSERT_TRUE(same(actual[i], std::pow(t[i], 0.33333334f))) << std::hexfloat << t[i];
+      }
+    }
+  };
+  check(bitsOf(0.008856f), bitsOf(8.0f), kStep);
+  EXPECT_LT(asked, blocks / 50);
+  check(bitsOf(8.0f), bitsOf(std::numeric_limits<float>::max()) - 5000, kStep * 997);
+  const Roots infinite(vdupq_n_f32(std::numeric_limits<float>::infinity()), factors);
+  EXPECT_TRUE(std::isinf(vgetq_lane_f32(infinite.settled(), 0)));
 }
 
 std::vector<float> neighbours(std::initializer_list<float> values) {

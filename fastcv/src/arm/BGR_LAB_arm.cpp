@@ -7,19 +7,20 @@
 //   a = (500 (f(X) - f(Y)) + 4210688) >> 15, clamped to a byte: 4210688 is 128.5 * 32768
 //   b = (200 (f(Y) - f(Z)) + 4210688) >> 15, clamped
 //
-// The others are in float, over the splines. Every multiplication that is followed by an addition is fused
-// with it, sums of products from left to right but for X, Y, Z, which are R c + (B c + G c) with the outer
-// product rounded last.
+// The others are in float, over the splines. A multiplication that an addition follows is fused with it. X,
+// Y, Z are R c + (B c + G c), from the bracket outward; blue, green, red are sums of X c, Y c, Z c from left
+// to right.
 
-#include <cmath>
 #include <cstddef>
 #include <cstdint>
 #include <cstring>
 
 #include "entry.h"
+#include "factors.h"
 #include "gamma_planes.h"
 #include "lab_tables.h"
 #include "loop.h"
+#include "roots.h"
 
 namespace HPC::fastcv {
 namespace {
@@ -57,16 +58,6 @@ inline const Entry* highEntry(const Entry* table, uint64_t pair) {
 
 inline uint64_t lowPair(uint32x4_t index) { return vgetq_lane_u64(vreinterpretq_u64_u32(index), 0); }
 inline uint64_t highPair(uint32x4_t index) { return vgetq_lane_u64(vreinterpretq_u64_u32(index), 1); }
-
-// Hides how a vector was made. The compiler would make parts of it a second time where only those are used,
-// and constants one to a register.
-template <typename V>
-inline V opaque(V v) {
-#if defined(__ARM_NEON)
-  asm("" : "+w"(v));
-#endif
-  return v;
-}
 
 inline uint16x8_t gather(const CubeRootTable& table, uint32x4_t low, uint32x4_t high) {
   const uint16_t* entries = table.data();
@@ -200,6 +191,11 @@ inline float32x4_t valueIn(const Spline& spline, float32x4_t t, uint32x4_t k) {
   return vfmaq_f32(a.val[0], u, vfmaq_f32(a.val[1], u, vfmaq_f32(a.val[2], u, a.val[3])));
 }
 
+// v0 w0 + v1 w1 + v2 w2, from left to right.
+inline float32x4_t weighted(float32x4_t v0, float32x4_t v1, float32x4_t v2, const Factors& w) {
+  return vfmaq_f32(vfmaq_f32(vmulq_f32(v0, w.at<0>()), v1, w.at<1>()), v2, w.at<2>());
+}
+
 // One pixel through the vector form of `op`.
 template <typename Op>
 inline void pixelByVector(const Op& op, const typename Op::Src* in, typename Op::Dst* out) {
@@ -223,6 +219,13 @@ constexpr float kToeOffset = 0.13793103f;
 
 // ---- float BGR to Lab
 
+// The roots with powf where it is needed. What has been computed of them is computed again: it would cost
+// more to keep it ready, every time, for the few calls.
+[[gnu::noinline, gnu::cold]] Pixels<float, 3> settledRoots(float32x4_t x, float32x4_t y, float32x4_t z,
+                                                           const RootFactors& factors) {
+  return {{Roots(x, factors).settled(), Roots(y, factors).settled(), Roots(z, factors).settled()}};
+}
+
 template <int nc>
 struct BgrToLabF32 {
   using Src = float;
@@ -236,15 +239,24 @@ struct BgrToLabF32 {
     const float32x4_t b = linear(p.c[0]);
     const float32x4_t g = linear(p.c[1]);
     const float32x4_t r = linear(p.c[2]);
-    const float32x4_t x = weighted(b, g, r, 0.18982783f, 0.37621942f, 0.43395275f);
-    const float32x4_t y = weighted(b, g, r, 0.072169f, 0.71516f, 0.212671f);
-    const float32x4_t z = weighted(b, g, r, 0.87276554f, 0.109476514f, 0.017757913f);
-    const float32x4_t fx = root(x);
-    const float32x4_t fy = root(y);
-    const float32x4_t fz = root(z);
-    const float32x4_t l = vbslq_f32(vcgtq_f32(y, splat(kToe)), vfmaq_f32(splat(-16.0f), fy, splat(116.0f)),
-                                    vmulq_f32(y, splat(903.3f)));
-    return {{l, vmulq_f32(vsubq_f32(fx, fy), splat(500.0f)), vmulq_f32(vsubq_f32(fy, fz), splat(200.0f))}};
+    const float32x4_t x = weighted(g, b, r, x_);
+    const float32x4_t y = weighted(g, b, r, y_);
+    const float32x4_t z = weighted(g, b, r, z_);
+    const uint32x4_t aboveX = aboveToe(x), aboveY = aboveToe(y), aboveZ = aboveToe(z);
+    const Roots rootX(x, root_), rootY(y, root_), rootZ(z, root_);
+    Pixels<float, 3> roots = {{rootX.rounded(), rootY.rounded(), rootZ.rounded()}};
+    const uint32x4_t unclear =
+        vorrq_u32(vorrq_u32(vbicq_u32(aboveX, rootX.clear()), vbicq_u32(aboveY, rootY.clear())),
+                  vbicq_u32(aboveZ, rootZ.clear()));
+    if (vmaxvq_u32(unclear) != 0) {
+      roots = settledRoots(x, y, z, root_);
+    }
+    const float32x4_t fx = rootOrToe(aboveX, x, roots.c[0]);
+    const float32x4_t fy = rootOrToe(aboveY, y, roots.c[1]);
+    const float32x4_t fz = rootOrToe(aboveZ, z, roots.c[2]);
+    const float32x4_t l =
+        vbslq_f32(aboveY, vfmaq_f32(splat(-16.0f), fy, lab_.at<0>()), vmulq_f32(y, lab_.at<1>()));
+    return {{l, vmulq_f32(vsubq_f32(fx, fy), lab_.at<2>()), vmulq_f32(vsubq_f32(fy, fz), lab_.at<3>())}};
   }
 
   void scalar(const float* in, float* out) const { pixelByVector(*this, in, out); }
@@ -258,24 +270,24 @@ struct BgrToLabF32 {
     return valueIn(kExpansionSpline, t, vcvtq_u32_f32(piece));
   }
 
-  static float32x4_t weighted(float32x4_t b, float32x4_t g, float32x4_t r, float wb, float wg, float wr) {
-    return vfmaq_f32(vfmaq_f32(vmulq_f32(g, splat(wg)), b, splat(wb)), r, splat(wr));
+  static uint32x4_t aboveToe(float32x4_t t) { return vcgtq_f32(t, splat(kToe)); }
+
+  float32x4_t rootOrToe(uint32x4_t above, float32x4_t t, float32x4_t root) const {
+    return vbslq_f32(above, root, vfmaq_f32(splat(kToeOffset), t, x_.at<3>()));
   }
 
-  static float32x4_t root(float32x4_t t) {
-    float roots[4];
-    vst1q_f32(roots, t);
-    for (float& value : roots) {
-      value = value > kToe ? std::pow(value, 0.33333334f) : std::fma(value, kToeSlope, kToeOffset);
-    }
-    return vld1q_f32(roots);
-  }
+  // Weights of G, B, R in X, Y and Z, and the slope of the toe.
+  Factors x_{0.37621942f, 0.18982783f, 0.43395275f, kToeSlope};
+  Factors y_{0.71516f, 0.072169f, 0.212671f, 0};
+  Factors z_{0.109476514f, 0.87276554f, 0.017757913f, 0};
+  // Of L above and in the toe, of a and of b.
+  Factors lab_{116.0f, 903.3f, 500.0f, 200.0f};
+  RootFactors root_;
 };
 
 // ---- Lab to BGR
 
-// Lab to linear light, both kernels' first half. The factors stand four to a register; a multiplication takes
-// one from its lane.
+// Lab to linear light, both kernels' first half.
 class LabToLinear {
  public:
   // Linear blue, green and red of four pixels.
@@ -286,48 +298,31 @@ class LabToLinear {
   Linear operator()(float32x4_t l, float32x4_t a, float32x4_t b) const {
     const float32x4_t toeOffset = splat(kToeOffset);
     const uint32x4_t dark = vcleq_f32(l, splat(7.999625f));
-    const float32x4_t darkY = times<3>(l, blue_);
-    const float32x4_t darkRoot = plus<3>(toeOffset, darkY, green_);
-    const float32x4_t brightRoot = plus<3>(toeOffset, l, red_);
+    const float32x4_t darkY = vmulq_f32(l, blue_.at<3>());
+    const float32x4_t darkRoot = vfmaq_f32(toeOffset, darkY, green_.at<3>());
+    const float32x4_t brightRoot = vfmaq_f32(toeOffset, l, red_.at<3>());
     const float32x4_t fy = vbslq_f32(dark, darkRoot, brightRoot);
     const float32x4_t y = vbslq_f32(dark, darkY, cubed(brightRoot));
-    const float32x4_t x = unrooted(plus<0>(fy, a, others_));
-    const float32x4_t z = unrooted(plus<1>(fy, b, others_));
+    const float32x4_t x = unrooted(vfmaq_f32(fy, a, others_.at<0>()));
+    const float32x4_t z = unrooted(vfmaq_f32(fy, b, others_.at<1>()));
     return {{weighted(x, y, z, blue_), weighted(x, y, z, green_), weighted(x, y, z, red_)}};
   }
 
  private:
-  static float32x4_t factors(float f0, float f1, float f2, float f3) {
-    const float all[4] = {f0, f1, f2, f3};
-    return opaque(vld1q_f32(all));
-  }
-
-  template <int lane>
-  static float32x4_t times(float32x4_t v, float32x4_t factors) {
-    return vmulq_f32(v, vdupq_laneq_f32(factors, lane));
-  }
-  template <int lane>
-  static float32x4_t plus(float32x4_t sum, float32x4_t v, float32x4_t factors) {
-    return vfmaq_f32(sum, v, vdupq_laneq_f32(factors, lane));
-  }
-  static float32x4_t weighted(float32x4_t x, float32x4_t y, float32x4_t z, float32x4_t weights) {
-    return plus<2>(plus<1>(times<0>(x, weights), y, weights), z, weights);
-  }
-
   static float32x4_t cubed(float32x4_t v) { return vmulq_f32(vmulq_f32(v, v), v); }
 
   // The inverse of f.
   float32x4_t unrooted(float32x4_t f) const {
     return vbslq_f32(vcgtq_f32(f, splat(kToeRoot)), cubed(f),
-                     times<2>(vsubq_f32(f, splat(kToeOffset)), others_));
+                     vmulq_f32(vsubq_f32(f, splat(kToeOffset)), others_.at<2>()));
   }
 
   // Weights of X, Y, Z in a colour, and one of: Y of a dark L, its root, a bright L's root.
-  float32x4_t blue_ = factors(0.052890975f, -0.204043f, 1.1511517f, 0.001107052f);
-  float32x4_t green_ = factors(-0.9212352f, 1.875991f, 0.045244265f, kToeSlope);
-  float32x4_t red_ = factors(3.0799327f, -1.53715f, -0.542782f, 0.00862069f);
+  Factors blue_{0.052890975f, -0.204043f, 1.1511517f, 0.001107052f};
+  Factors green_{-0.9212352f, 1.875991f, 0.045244265f, kToeSlope};
+  Factors red_{3.0799327f, -1.53715f, -0.542782f, 0.00862069f};
   // A fx of a, fz of b, the inverse toe's slope.
-  float32x4_t others_ = factors(0.002f, -0.005f, 0.12841916f, 0);
+  Factors others_{0.002f, -0.005f, 0.12841916f, 0};
 };
 
 template <int nc>

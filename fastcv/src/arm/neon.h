@@ -11,6 +11,9 @@
 #ifndef vdivq_f32
 inline float32x4_t vdivq_f32(float32x4_t a, float32x4_t b) { return a / b; }
 #endif
+#ifndef vfmsq_f32
+inline float32x4_t vfmsq_f32(float32x4_t a, float32x4_t b, float32x4_t c) { return vfmaq_f32(a, -b, c); }
+#endif
 #endif
 
 namespace HPC::fastcv::arm {
