@@ -1,7 +1,6 @@
 // The five metrics against the formulas, written out per pixel.
 
 #include <gtest/gtest.h>
-#include <sys/mman.h>
 
 #include <algorithm>
 #include <climits>
@@ -12,12 +11,14 @@
 #include "brightness.h"
 #include "guarded_image.h"
 #include "lab_reference.h"
+#include "sparse_memory.h"
 
 namespace {
 
 using kyface::test::ByteSource;
 using kyface::test::GuardedImage;
 using kyface::test::LightnessReference;
+using kyface::test::SparseMemory;
 using u8 = unsigned char;
 
 using Metric = unsigned char (*)(const u8*, int, int, int, int, int, int, int, int);
@@ -236,10 +237,8 @@ TEST(Metrics, CountsWrap) {
 TEST_P(Metrics, DistantRows) {
   constexpr int kStride = INT_MAX - 3, kRows = 4;
   const size_t size = static_cast<size_t>(kStride) * (kRows - 1) + 4096;
-  void* mapping =
-      mmap(nullptr, size, PROT_READ | PROT_WRITE, MAP_PRIVATE | MAP_ANONYMOUS | MAP_NORESERVE, -1, 0);
-  ASSERT_NE(mapping, MAP_FAILED);
-  u8* data = static_cast<u8*>(mapping);
+  const SparseMemory memory(size);
+  u8* data = memory.as<u8>();
   for (int row = 0; row < kRows; ++row) {
     memset(data + static_cast<ptrdiff_t>(row) * kStride, 60 * (row + 1), 40);
   }
@@ -247,7 +246,6 @@ TEST_P(Metrics, DistantRows) {
             expectedMean(GetParam(), data, 10, kStride, kRows, 0, 0, 10, kRows));
   EXPECT_EQ(measure(data, 10, kStride, kRows, 3, 3, 1, 1),
             expectedMean(GetParam(), data, 10, kStride, kRows, 3, 3, 1, 1));
-  munmap(mapping, size);
 }
 
 // One pixel at a time, whose mean is its value: a lattice through all colours with the extremes.

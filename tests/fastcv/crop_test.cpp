@@ -1,7 +1,6 @@
 // The crop kernel against its formulas: copies, 8-bit samples in groups of 8 pixels and one by one, floats.
 
 #include <gtest/gtest.h>
-#include <sys/mman.h>
 
 #include <algorithm>
 #include <cmath>
@@ -14,12 +13,14 @@
 
 #include "guarded_image.h"
 #include "kernels.h"
+#include "sparse_memory.h"
 
 namespace {
 
 using HPC::fastcv::armImageCrop;
 using kyface::test::ByteSource;
 using kyface::test::GuardedImage;
+using kyface::test::SparseMemory;
 using u8 = unsigned char;
 
 constexpr float kInfinity = std::numeric_limits<float>::infinity();
@@ -164,13 +165,9 @@ TYPED_TEST(Crop, OffsetsBeyond32Bits) {
   constexpr int kRows = 140, kTop = 133, kWidth = 19;
   constexpr int kRowElements = kWidth * TypeParam::kChannels;
   constexpr size_t kSize = static_cast<size_t>(kRows) << 24;
-  void* const from =
-      mmap(nullptr, kSize, PROT_READ | PROT_WRITE, MAP_PRIVATE | MAP_ANONYMOUS | MAP_NORESERVE, -1, 0);
-  void* const to =
-      mmap(nullptr, kSize, PROT_READ | PROT_WRITE, MAP_PRIVATE | MAP_ANONYMOUS | MAP_NORESERVE, -1, 0);
-  ASSERT_TRUE(from != MAP_FAILED && to != MAP_FAILED);
-  Element* const in = static_cast<Element*>(from);
-  Element* const out = static_cast<Element*>(to);
+  const SparseMemory from(kSize), to(kSize);
+  Element* const in = from.as<Element>();
+  Element* const out = to.as<Element>();
   const auto row = [](Element* image, int r) { return image + static_cast<ptrdiff_t>(r) * kStride; };
   ByteSource bytes(1);
   for (int r = 0; r < kRows; ++r) {
@@ -197,8 +194,6 @@ TYPED_TEST(Crop, OffsetsBeyond32Bits) {
       ASSERT_TRUE(holds(0, r)) << "row " << r << ", times " << ratio;
     }
   }
-  munmap(from, kSize);
-  munmap(to, kSize);
 }
 
 template <typename I>

@@ -1,7 +1,6 @@
 // Rotation of whole 4:2:0 frames against the layouts, sample by sample.
 
 #include <gtest/gtest.h>
-#include <sys/mman.h>
 
 #include <atomic>
 #include <cstdint>
@@ -12,6 +11,7 @@
 #include "death.h"
 #include "guarded_image.h"
 #include "kernels.h"
+#include "sparse_memory.h"
 
 // Refusing memory takes an allocator of one's own, which a sanitizer already is.
 #if defined(__has_feature)
@@ -67,6 +67,7 @@ using HPC::fastcv::imgRotate_I420;
 using kyface::test::ByteSource;
 using kyface::test::GuardedImage;
 using kyface::test::literally;
+using kyface::test::SparseMemory;
 using u8 = unsigned char;
 using Offset = ptrdiff_t;
 
@@ -302,15 +303,10 @@ TEST_P(RotateYuv420, OffsetsBeyond32Bits) {
   constexpr int kStride = 1 << 20;
   const Size in = {3300, 10};  // 2200 luma rows
   const Size half = {15, 2200};
-  const auto bytesOf = [](int rows) { return static_cast<size_t>(rows) * kStride; };
-  const auto sparse = [](size_t bytes) {
-    void* memory =
-        mmap(nullptr, bytes, PROT_READ | PROT_WRITE, MAP_PRIVATE | MAP_ANONYMOUS | MAP_NORESERVE, -1, 0);
-    return memory == MAP_FAILED ? nullptr : static_cast<u8*>(memory);
-  };
-  u8* const tall = sparse(bytesOf(in.rows));
-  u8* const other = sparse(bytesOf(in.rows));
-  ASSERT_TRUE(tall != nullptr && other != nullptr);
+  const size_t size = static_cast<size_t>(in.rows) * kStride;
+  const SparseMemory tallMemory(size), otherMemory(size);
+  u8* const tall = tallMemory.as<u8>();
+  u8* const other = otherMemory.as<u8>();
   ByteSource bytes(5);
   for (int r = 0; r < in.rows; ++r) {
     for (int c = 0; c < in.width; ++c) {
@@ -332,8 +328,6 @@ TEST_P(RotateYuv420, OffsetsBeyond32Bits) {
     expect(degree, half, flat.data(), half.width, in, other, kStride);
   }
   expect(180, in, tall, kStride, in, other, kStride);
-  munmap(tall, bytesOf(in.rows));
-  munmap(other, bytesOf(in.rows));
 }
 
 INSTANTIATE_TEST_SUITE_P(Layouts, RotateYuv420, testing::Values(kSemiPlanar, kPlanar),
