@@ -178,7 +178,7 @@ std::vector<Call> calls() {
        }},
   };
   for (const int count : {0, 1, 10}) {
-    result.push_back({"kyFaceTrackBytes, " + std::to_string(count) + " faces of 106 points", [=] {
+    result.push_back({"kyFaceTrackBytes, faces of 106 points: " + std::to_string(count), [=] {
                         faces.resize(static_cast<size_t>(count));
                         for (ky_face_t& face : faces) {
                           face.points_count = kPoints;

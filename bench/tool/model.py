@@ -12,6 +12,9 @@ CORES = {"A55": "cortex-a55", "N1": "neoverse-n1"}
 
 # Hot blocks are those that make up this share of the instructions.
 HOT_SHARE = 0.99
+# Two neighbouring blocks belong to one loop when the one runs at least this part as often as the other: the first turn
+# of a loop may enter in a block that begins before it.
+SAME_LOOP = 0.9
 ITERATIONS = 100
 WORD_BYTES = 4
 
@@ -34,14 +37,14 @@ def cycles(counts):
 
 
 def _hot_stretches(count, blocks):
-    """[(words, executions)] of the hot code. Blocks that follow one another and run equally often are one stretch: a
-    loop's body is cut where a page of memory ends, or by a branch that is never taken."""
+    """[(words, executions)] of the hot code. Blocks that follow one another and run as often are one stretch: a loop's
+    body is cut where a page of memory ends, or by a branch that is never taken."""
     stretches = []
     end = before = None
     for block, executions in sorted(count.blocks.items(), key=lambda item: blocks[item[0]].address):
         code = blocks[block]
-        if code.address == end and executions == before:
-            stretches[-1] = (stretches[-1][0] + code.words, executions)
+        if code.address == end and min(executions, before) >= SAME_LOOP * max(executions, before):
+            stretches[-1] = (stretches[-1][0] + code.words, max(executions, before))
         else:
             stretches.append((code.words, executions))
         end = code.address + WORD_BYTES * len(code.words)

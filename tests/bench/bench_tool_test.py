@@ -5,8 +5,8 @@ import unittest
 
 sys.path.insert(0, sys.argv.pop(1))
 
-from tool import record, table  # noqa: E402  (found through the line above)
-from tool.counting import CallCount, Count, Key, Time  # noqa: E402
+from tool import model, record, table  # noqa: E402  (found through the line above)
+from tool.counting import Block, CallCount, Count, Key, Time  # noqa: E402
 
 SIZE, ODD_SIZE = "1280x720", "1278x718"
 PIXELS = 1000
@@ -55,6 +55,28 @@ class Record(unittest.TestCase):
         self.assertEqual(kept, {"gray": {SIZE: 0.7, ODD_SIZE: 0.75}, "track": {"call": 130}})
 
 
+class HotStretches(unittest.TestCase):
+    BEFORE, HEAD, REST, AFTER = "before", "head", "rest", "after"
+
+    def stretches(self, executions):
+        """Of a loop whose head begins in the block before it and whose rest is on the next page."""
+        blocks = {
+            1: Block(0x0ff0, (self.BEFORE, self.HEAD, self.HEAD, self.HEAD)),
+            2: Block(0x0ff4, (self.HEAD, self.HEAD, self.HEAD)),
+            3: Block(0x1000, (self.REST, self.REST)),
+            4: Block(0x1008, (self.AFTER,)),
+        }
+        instructions = sum(len(blocks[block].words) * times for block, times in executions.items())
+        return model._hot_stretches(Count(4, PIXELS, instructions, executions), blocks)
+
+    def test_a_loop_that_a_page_cuts_is_one_stretch(self):
+        self.assertEqual(self.stretches({1: 1, 2: 999, 3: 1000, 4: 1}), [((self.HEAD,) * 3 + (self.REST,) * 2, 1000)])
+
+    def test_neighbours_that_run_less_often_are_not_part_of_it(self):
+        hot = self.stretches({2: 1000, 3: 500})
+        self.assertEqual(hot, [((self.HEAD,) * 3, 1000), ((self.REST,) * 2, 500)])
+
+
 class Tables(unittest.TestCase):
     def figures(self, own=0.7, odd=0.7, goal=0.7, own_cycles=0.5, own_time=1.0):
         counts = {
@@ -87,7 +109,7 @@ class Tables(unittest.TestCase):
         self.assertEqual(self.shortfalls(odd=0.7 * 1.14, own_time=1.49), [])
 
     def test_each_mark_that_is_passed_is_listed(self):
-        self.assertEqual(self.shortfalls(own=0.71, odd=0.71), [("instr/px", "goal")])
+        self.assertEqual(self.shortfalls(own=0.72, odd=0.72), [("instr/px", "goal")])
         self.assertEqual(self.shortfalls(odd=0.7 * 1.16), [(f"instr/px at {ODD_SIZE}", f"at {SIZE}")])
         self.assertEqual(self.shortfalls(own_cycles=0.6), [("N1 cycles/px", "libyuv")])
         self.assertEqual(self.shortfalls(own_cycles=1.1), [("A55 cycles/px", "Another"), ("N1 cycles/px", "libyuv")])
