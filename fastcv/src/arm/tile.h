@@ -14,9 +14,12 @@
 #include "neon.h"
 #include "registers.h"
 
-/// For what must not be a call: a tile lives in registers, its indices are constants.
+/// For what must not be a call: a tile lives in registers, its indices are constants. An instrumented build,
+/// which is in no hurry, defines them as nothing.
+#ifndef TILE_INLINE
 #define TILE_INLINE inline __attribute__((always_inline))
 #define TILE_LAMBDA __attribute__((always_inline))
+#endif
 
 namespace HPC::fastcv::arm {
 
