@@ -3,6 +3,7 @@
 #include <gtest/gtest.h>
 
 #include <array>
+#include <cmath>
 #include <cstring>
 #include <random>
 #include <type_traits>
@@ -368,5 +369,39 @@ TRANSPOSES(s16, int16x8_t)
 TRANSPOSES(u32, uint32x4_t)
 TRANSPOSES(s32, int32x4_t)
 TRANSPOSES(f32, float32x4_t)
+
+// What neon.h has on every platform.
+
+TEST(WeightedBytes, AreRoundedSums) {
+  using HPC::fastcv::arm::weightedBytes;
+  constexpr int kShift = 8;
+  constexpr uint8_t kWeights[][3] = {{29, 150, 77}, {1, 0, 255}, {0, 0, 0}, {85, 86, 85}};
+  for (int i = 0; i < kTimes; ++i) {
+    const auto a = random<uint8x16_t>();
+    const auto b = random<uint8x16_t>();
+    const auto c = random<uint8x16_t>();
+    for (const auto& w : kWeights) {
+      const uint8x16_t sums = weightedBytes<kShift>(a, w[0], b, w[1], c, w[2]);
+      for (int lane = 0; lane < 16; ++lane) {
+        ASSERT_EQ(sums[lane], (a[lane] * w[0] + b[lane] * w[1] + c[lane] * w[2] + 128) >> kShift);
+      }
+    }
+  }
+}
+
+TEST(Products, FusedAndSubtracted) {
+  for (int i = 0; i < kTimes; ++i) {
+    float32x4_t a, b, c;
+    for (int lane = 0; lane < 4; ++lane) {
+      a[lane] = static_cast<float>(generator()) - 0x1p31f;
+      b[lane] = static_cast<float>(generator() >> 16) - 0x1p15f;
+      c[lane] = static_cast<float>(generator() >> 16);
+    }
+    const float32x4_t difference = vfmsq_f32(a, b, c);
+    for (int lane = 0; lane < 4; ++lane) {
+      ASSERT_EQ(difference[lane], std::fma(-b[lane], c[lane], a[lane]));
+    }
+  }
+}
 
 }  // namespace

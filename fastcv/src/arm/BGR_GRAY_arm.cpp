@@ -22,28 +22,19 @@ struct ToGray<unsigned char, ncSrc> {
   using Dst = unsigned char;
   static constexpr int kSrcChannels = ncSrc;
   static constexpr int kDstChannels = 1;
-  static constexpr int kInFlight = 4;
+  // Loads of four channels crowd out each other on cores that run ahead.
+  static constexpr int kInFlight = ncSrc == 3 ? 4 : 2;
   static constexpr bool kUniform = true;
 
   static constexpr int kB = 29, kG = 150, kR = 77;
   static constexpr int kShift = 8;
 
   Pixels<unsigned char, 1> vector(const Pixels<unsigned char, ncSrc>& p) const {
-    return {{vcombine_u8(half(vget_low_u8(p.c[0]), vget_low_u8(p.c[1]), vget_low_u8(p.c[2])),
-                         half(vget_high_u8(p.c[0]), vget_high_u8(p.c[1]), vget_high_u8(p.c[2])))}};
+    return {{weightedBytes<kShift>(p.c[0], kB, p.c[1], kG, p.c[2], kR)}};
   }
 
   void scalar(const unsigned char* in, unsigned char* out) const {
     *out = static_cast<unsigned char>((kB * in[0] + kG * in[1] + kR * in[2] + (1 << (kShift - 1))) >> kShift);
-  }
-
- private:
-  // The weights sum to 256: the sum is at most 65280, and with the rounding half added still a 16-bit number.
-  static uint8x8_t half(uint8x8_t b, uint8x8_t g, uint8x8_t r) {
-    uint16x8_t sum = vmull_u8(b, vdup_n_u8(kB));
-    sum = vmlal_u8(sum, g, vdup_n_u8(kG));
-    sum = vmlal_u8(sum, r, vdup_n_u8(kR));
-    return vrshrn_n_u16(sum, kShift);
   }
 };
 
@@ -74,7 +65,7 @@ struct FromGray {
   using Dst = T;
   static constexpr int kSrcChannels = 1;
   static constexpr int kDstChannels = ncDst;
-  static constexpr int kInFlight = ncDst == 3 ? 8 : 4;
+  static constexpr int kInFlight = 8;
   static constexpr bool kUniform = true;
 
   Pixels<T, 3> vector(const Pixels<T, 1>& p) const { return {{p.c[0], p.c[0], p.c[0]}}; }

@@ -48,9 +48,11 @@ struct BgrToYCrCb8 {
   static constexpr bool kUniform = true;
 
   Pixels<unsigned char, 3> vector(const Pixels<unsigned char, ncSrc>& p) const {
-    uint8x16_t y = vcombine_u8(lumaOf(vget_low_u8(p.c[0]), vget_low_u8(p.c[1]), vget_low_u8(p.c[2])),
-                               lumaOf(vget_high_u8(p.c[0]), vget_high_u8(p.c[1]), vget_high_u8(p.c[2])));
-    forget(y);
+    // The rounding half, 8192, is a multiple of 256: it is the rounding half of what remains to be shifted.
+    uint8x16_t y = roundingShiftToBytes<kShift - 8>(
+        lumaSum(vget_low_u8(p.c[0]), vget_low_u8(p.c[1]), vget_low_u8(p.c[2])),
+        lumaSum(vget_high_u8(p.c[0]), vget_high_u8(p.c[1]), vget_high_u8(p.c[2])));
+    forget(y);  // made of two halves, it would be taken apart again below
     return {{y, chromaOf(p.c[2], y, kCrR), chromaOf(p.c[0], y, kCbB)}};
   }
 
@@ -64,16 +66,16 @@ struct BgrToYCrCb8 {
   }
 
  private:
-  // Unsigned parts: the low sum is at most 256 * 255, the high one with the carried 255 at most 16320.
-  static uint8x8_t lumaOf(uint8x8_t b, uint8x8_t g, uint8x8_t r) {
+  // floor(sum / 256). With unsigned parts the low sum is at most 256 * 255, the high one with the carried 255
+  // at most 16320.
+  static uint16x8_t lumaSum(uint8x8_t b, uint8x8_t g, uint8x8_t r) {
     uint16x8_t low = vmull_u8(b, vdup_n_u8(kYB % 256));
     low = vmlal_u8(low, g, vdup_n_u8(kYG % 256));
     low = vmlal_u8(low, r, vdup_n_u8(kYR % 256));
     uint16x8_t high = vmull_u8(b, vdup_n_u8(kYB / 256));
     high = vmlal_u8(high, g, vdup_n_u8(kYG / 256));
     high = vmlal_u8(high, r, vdup_n_u8(kYR / 256));
-    // The rounding half, 8192, is a multiple of 256: it is the rounding half of what remains to be shifted.
-    return vrshrn_n_u16(vsraq_n_u16(high, low, 8), kShift - 8);
+    return vsraq_n_u16(high, low, 8);
   }
 
   // vqrdmulh gives (2 a b + 2^15) >> 16: with b = 2 weight that is (a weight + 2^13) >> 14. The result, -211
@@ -103,7 +105,8 @@ struct YCrCbToBgr8 {
     const int8x16_t cb = centred(p.c[2]);
     const Half low = half(vget_low_u8(p.c[0]), vget_low_s8(cr), vget_low_s8(cb));
     const Half high = half(vget_high_u8(p.c[0]), vget_high_s8(cr), vget_high_s8(cb));
-    return {{vcombine_u8(low.b, high.b), vcombine_u8(low.g, high.g), vcombine_u8(low.r, high.r)}};
+    return {{vcombine_u8(low.b, high.b), roundingShiftToBytes<kShift - 8>(low.greenSum, high.greenSum),
+             vcombine_u8(low.r, high.r)}};
   }
 
   void scalar(const unsigned char* in, unsigned char* out) const {
@@ -117,7 +120,8 @@ struct YCrCbToBgr8 {
 
  private:
   struct Half {
-    uint8x8_t b, g, r;
+    uint8x8_t b, r;
+    int16x8_t greenSum;
   };
 
   static int8x16_t centred(uint8x16_t stored) {
@@ -125,7 +129,7 @@ struct YCrCbToBgr8 {
   }
 
   static Half half(uint8x8_t y, int8x8_t cr, int8x8_t cb) {
-    return {blueOrRed(y, cb, kBCb), green(y, cr, cb), blueOrRed(y, cr, kRCr)};
+    return {blueOrRed(y, cb, kBCb), blueOrRed(y, cr, kRCr), greenSum(y, cr, cb)};
   }
 
   // vqrdmulh gives (2 a b + 2^15) >> 16: with a = 2 chroma that is (chroma b + 2^13) >> 14.
@@ -136,12 +140,12 @@ struct YCrCbToBgr8 {
 
   // Green's two terms are rounded together, so their weights are split. Y joins as 64 Y, which leaves the
   // shift by 14 - 8 to round and clamp the whole: 64 * 255 + 68 * 128 + 41 is still a 16-bit number.
-  static uint8x8_t green(uint8x8_t y, int8x8_t cr, int8x8_t cb) {
+  static int16x8_t greenSum(uint8x8_t y, int8x8_t cr, int8x8_t cb) {
     const int16x8_t low = vmlal_s8(vmull_s8(cr, vdup_n_s8(lowByte(kGCr))), cb, vdup_n_s8(lowByte(kGCb)));
     const int16x8_t luma = vreinterpretq_s16_u16(vshll_n_u8(y, kShift - 8));
     const int16x8_t high =
         vmlal_s8(vmlal_s8(luma, cr, vdup_n_s8(highByte(kGCr))), cb, vdup_n_s8(highByte(kGCb)));
-    return vqrshrun_n_s16(vsraq_n_s16(high, low, 8), kShift - 8);
+    return vsraq_n_s16(high, low, 8);
   }
 };
 

@@ -4,6 +4,7 @@
 /// tails, strides and 64-bit addressing.
 #pragma once
 
+#include <algorithm>
 #include <cstddef>
 #include <type_traits>
 #include <utility>
@@ -157,8 +158,9 @@ class PixelRow {
   static constexpr int kSrc = Op::kSrcChannels;
   static constexpr int kDst = Op::kDstChannels;
   static constexpr int kBlock = kBlockPixels<Src>;
-  static constexpr int kTurn = kBlock * Op::kInFlight;
   static constexpr int kGroup = Op::kUniform ? kBlock : 8;
+  static constexpr int kInFlight = kBlocksInFlightPay ? Op::kInFlight : std::max(kGroup / kBlock, 1);
+  static constexpr int kTurn = kBlock * kInFlight;
   static_assert(kBlock == kBlockPixels<Dst>);
   static_assert(kTurn % kGroup == 0);
 
@@ -166,17 +168,17 @@ class PixelRow {
     if (turns == 0) {
       return;
     }
-    Cursor<const Src, kSrc, Op::kInFlight> from(src);
-    Cursor<Dst, kDst, Op::kInFlight> to(dst);
+    Cursor<const Src, kSrc, kInFlight> from(src);
+    Cursor<Dst, kDst, kInFlight> to(dst);
     // An alpha for each block in flight: one register cannot stand behind several blocks' colour registers.
-    VectorOf<Dst> alpha[Op::kInFlight];
+    VectorOf<Dst> alpha[kInFlight];
     VectorOf<Dst> opaque = splat(kOpaque<Dst>);
     for (VectorOf<Dst>& a : alpha) {
       forget(opaque);
       a = opaque;
     }
     for (; turns != 0; --turns) {
-      convertBlocks<Op::kInFlight>(op, from, to, [&](int i) { return alpha[i]; });
+      convertBlocks<kInFlight>(op, from, to, [&](int i) { return alpha[i]; });
       from.next();
       to.next();
     }

@@ -38,4 +38,22 @@ inline uint8x16_t roundingShiftToBytes(uint16x8_t low, uint16x8_t high) {
 #endif
 }
 
+/// (a wa + b wb + c wc + 2^(n-1)) >> n of each lane, for weights whose sum is at most 2^8 and n of 8: whole
+/// sums are 16-bit numbers.
+template <int n>
+inline uint8x16_t weightedBytes(uint8x16_t a, uint8_t wa, uint8x16_t b, uint8_t wb, uint8x16_t c,
+                                uint8_t wc) {
+#if defined(__ARM_NEON)
+  uint16x8_t low = vmull_u8(vget_low_u8(a), vdup_n_u8(wa));
+  uint16x8_t high = vmull_high_u8(a, vdupq_n_u8(wa));
+  low = vmlal_u8(low, vget_low_u8(b), vdup_n_u8(wb));
+  high = vmlal_high_u8(high, b, vdupq_n_u8(wb));
+  low = vmlal_u8(low, vget_low_u8(c), vdup_n_u8(wc));
+  high = vmlal_high_u8(high, c, vdupq_n_u8(wc));
+  return roundingShiftToBytes<n>(low, high);
+#else
+  return neon_x86::weightedBytes<n>(a, wa, b, wb, c, wc);
+#endif
+}
+
 }  // namespace HPC::fastcv::arm

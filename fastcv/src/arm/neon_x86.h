@@ -235,6 +235,19 @@ inline uint8x16_t packedBytes(V low, V high) {
   return as<uint8x16_t>(_mm_packus_epi16(m(low), m(high)));
 }
 
+// (a wa + b wb + c wc + 2^(n-1)) >> n, in lanes of twice the width all at once.
+template <int n>
+inline uint8x16_t weightedBytes(uint8x16_t a, uint8_t wa, uint8x16_t b, uint8_t wb, uint8x16_t c,
+                                uint8_t wc) {
+  const auto product = [](uint8x16_t v, int16_t weight) {
+    return _mm256_mullo_epi16(_mm256_cvtepu8_epi16(m(v)), _mm256_set1_epi16(weight));
+  };
+  const __m256i sum = _mm256_add_epi16(_mm256_add_epi16(product(a, wa), product(b, wb)), product(c, wc));
+  const __m256i rounded = _mm256_srli_epi16(_mm256_add_epi16(sum, _mm256_set1_epi16(1 << (n - 1))), n);
+  return as<uint8x16_t>(
+      _mm_packus_epi16(_mm256_castsi256_si128(rounded), _mm256_extracti128_si256(rounded, 1)));
+}
+
 // A narrowed vector behind a lower half: what the "high" forms do.
 template <typename H>
 inline Whole<H> joined(H low, H narrowed) {
