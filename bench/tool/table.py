@@ -9,6 +9,8 @@ OWN = "fastcv"
 PEERS = ["libyuv", "opencv"]
 FLOOR = "memcpy"
 
+NO_ROWS = "none"
+
 # What an operation may cost more at another size, and on this machine more than the better peer.
 TAIL_FACTOR = 1.15
 HOST_FACTOR = 1.5
@@ -73,7 +75,7 @@ class Figures:
 
 @dataclasses.dataclass
 class Table:
-    """Columns of names and cells, as text; those without any figure are left out."""
+    """Columns of names and cells, as text; those without any figure are left out. Without rows it is "none"."""
 
     names: list
     rows: list
@@ -84,13 +86,17 @@ class Table:
         self.rows = [[row[index] for index in filled] for row in self.rows]
 
     def markdown(self):
+        if not self.rows:
+            return NO_ROWS
         lines = [self.names, ["---"] + ["--:"] * (len(self.names) - 1), *self.rows]
         return "\n".join("| " + " | ".join(line) + " |" for line in lines)
 
     def plain(self):
         """Columns as wide as their figures; the names above them word by word."""
+        if not self.rows:
+            return NO_ROWS
         heads = [name.split() for name in self.names]
-        height = max((len(words) for words in heads), default=0)
+        height = max(len(words) for words in heads)
         lines = [[([""] * (height - len(words)) + words)[line] for words in heads] for line in range(height)]
         lines += self.rows
         widths = [max(len(line[index]) for line in lines) for index in range(len(self.names))]
@@ -125,19 +131,19 @@ def _cost_columns(figures, what, unit):
 
 
 def instruction_columns(figures):
-    return _cost_columns(figures, "instructions", "instr/px")
+    return _cost_columns(figures, "instructions", "instr")
 
 
 def cycle_columns(figures):
-    return [column for core in CORES for column in _cost_columns(figures, core, f"{core} cycles/px")]
+    return [column for core in CORES for column in _cost_columns(figures, core, core)]
 
 
 def host_columns(figures):
     columns = [
-        (f"host ms {library}", lambda operation, of=library: _text(figures.milliseconds(operation, of)))
+        (f"ms {library}", lambda operation, of=library: _text(figures.milliseconds(operation, of)))
         for library in [OWN, *PEERS, FLOOR]
     ]
-    columns.append(("times the better peer's", lambda operation: _ratio(figures.host_ratio(operation))))
+    columns.append(("times the better peer", lambda operation: _ratio(figures.host_ratio(operation))))
     return columns
 
 
@@ -145,8 +151,11 @@ def _ratio(factor):
     return "" if factor is None else f"{factor:.2f}"
 
 
+LEGEND = "instr: instructions per pixel; A55, N1: model cycles per pixel; ms: milliseconds on this machine"
+
+
 def operations_table(figures, *column_groups):
-    """The operations, with the columns that the groups give."""
+    """The operations, with the columns that the groups give; LEGEND says what they are."""
     columns = [("operation", lambda operation: operation)]
     for group in column_groups:
         columns += group(figures)

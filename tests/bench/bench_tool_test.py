@@ -107,6 +107,8 @@ class Tables(unittest.TestCase):
 
     def test_nothing_falls_short_at_the_marks(self):
         self.assertEqual(self.shortfalls(odd=0.7 * 1.14, own_time=1.49), [])
+        nothing = table.shortfall_table(self.figures())
+        self.assertEqual((nothing.plain(), nothing.markdown()), ("none", "none"))
 
     def test_each_mark_that_is_passed_is_listed(self):
         self.assertEqual(self.shortfalls(own=0.72, odd=0.72), [("instr/px", "goal")])
@@ -117,8 +119,18 @@ class Tables(unittest.TestCase):
 
     def test_columns_without_figures_are_left_out(self):
         names = table.operations_table(self.figures(), table.instruction_columns).names
-        self.assertIn("instr/px libyuv", names)
-        self.assertNotIn("instr/px opencv", names)
+        self.assertIn("instr libyuv", names)
+        self.assertNotIn("instr opencv", names)
+
+    def test_plain_columns_are_as_wide_as_what_is_in_them(self):
+        text = table.Table(["operation", "instr of", "empty"], [["gray", "0.7", ""], ["a long name", "12.25", ""]]).plain()
+        self.assertEqual(text.splitlines(), [
+            "             instr",
+            "operation       of",
+            "------------------",
+            "gray           0.7",
+            "a long name  12.25",
+        ])
 
     def test_a_small_call_is_compared_with_the_pixels_of_a_large_one(self):
         key = Key("gray", "fastcv", "10x10")
