@@ -271,6 +271,21 @@ TEST(CropExamples, GroupsAndTailsDifferAboveAFactorOf128) {
   }
 }
 
+// In place every sample is scaled once, whatever the width.
+TEST(CropExamples, ScalesInPlace) {
+  for (int width = 1; width <= 70; ++width) {
+    for (const float ratio : {2.0f, 0.5f}) {
+      std::vector<u8> samples(static_cast<size_t>(2) * width), expected;
+      for (size_t i = 0; i < samples.size(); ++i) {
+        samples[i] = static_cast<u8>(7 * i);
+        expected.push_back(singly(ratio, samples[i]));
+      }
+      armImageCrop<u8, 1, u8, 1, 1>(0, 0, width, samples.data(), 2, width, width, samples.data(), ratio);
+      ASSERT_EQ(samples, expected) << width << ", times " << ratio;
+    }
+  }
+}
+
 // A copy moves bits: what is no number keeps its payload.
 TEST(CropExamples, FloatsAreCopiedBitByBit) {
   std::vector<uint32_t> bits;

@@ -7,7 +7,7 @@
 // which rounds halves up. Rows of 8-bit pixels are worked on in groups of 8 pixels and the rest one by one.
 // The groups truncate to 32 bits and keep the low 16 of them before they saturate to a byte, so that from
 // 32768 on, which takes a factor above 128, their result wraps where that of a single pixel is 255. Callers
-// rely on the difference: no group may take pixels of another row, and none may end a row.
+// rely on the difference: no group may take pixels of another row, and with such a factor none may end a row.
 
 #include <cmath>
 #include <type_traits>
@@ -80,16 +80,18 @@ inline void scaleSamples(const Scale& scale, const unsigned char* src, unsigned 
   }
 }
 
+// `alike` says that a group gives what its pixels would give singly.
 template <int nc, typename Scale>
-inline void scaleRows(const Scale& scale, float ratio, ptrdiff_t height, ptrdiff_t width, ptrdiff_t inStride,
-                      const unsigned char* in, ptrdiff_t outStride, unsigned char* out) {
+inline void scaleRows(const Scale& scale, float ratio, bool alike, ptrdiff_t height, ptrdiff_t width,
+                      ptrdiff_t inStride, const unsigned char* in, ptrdiff_t outStride, unsigned char* out) {
   constexpr int kGroup = kGroupPixels * nc;
   constexpr int kInFlight = nc == 1 ? 4 : 2;
   for (ptrdiff_t row = 0; row < height; ++row) {
     const unsigned char* src = in + row * inStride;
     unsigned char* dst = out + row * outStride;
+    const bool apart = src + width * nc <= dst || dst + width * nc <= src;
     walk<kGroup, kInFlight, 1>(
-        width * nc, Tail::kSteps,
+        width * nc, alike && apart ? Tail::kOverlap : Tail::kSteps,
         [&](ptrdiff_t x, auto groups) { scaleSamples<groups * kGroup>(scale, src + x, dst + x); },
         [&](ptrdiff_t x) { dst[x] = scaleSample(src[x], ratio); });
   }
@@ -100,9 +102,9 @@ void scaleImage(float ratio, ptrdiff_t height, ptrdiff_t width, ptrdiff_t inStri
                 ptrdiff_t outStride, unsigned char* out) {
   if (ratio >= 0 && ratio <= 255 && ratio == std::floor(ratio)) {
     const ScaleByByte scale = {vdup_n_u8(static_cast<unsigned char>(ratio))};
-    scaleRows<nc>(scale, ratio, height, width, inStride, in, outStride, out);
+    scaleRows<nc>(scale, ratio, ratio <= 128, height, width, inStride, in, outStride, out);
   } else {
-    scaleRows<nc>(ScaleByFloat{ratio}, ratio, height, width, inStride, in, outStride, out);
+    scaleRows<nc>(ScaleByFloat{ratio}, ratio, false, height, width, inStride, in, outStride, out);
   }
 }
 
