@@ -92,10 +92,10 @@ class Table:
         return "\n".join("| " + " | ".join(line) + " |" for line in lines)
 
     def plain(self):
-        """Columns as wide as their figures; the names above them word by word."""
+        """Columns as wide as their figures; the names above them word by word, but for the first."""
         if not self.rows:
             return NO_ROWS
-        heads = [name.split() for name in self.names]
+        heads = [self.names[:1], *(name.split() for name in self.names[1:])]
         height = max(len(words) for words in heads)
         lines = [[([""] * (height - len(words)) + words)[line] for words in heads] for line in range(height)]
         lines += self.rows
