@@ -123,6 +123,23 @@ STORE_ROW(vst1q_f32_x2, float, float32x4x2_t)
 STORE_ROW(vst1q_f32_x3, float, float32x4x3_t)
 STORE_ROW(vst1q_f32_x4, float, float32x4x4_t)
 
+// SIMDe's own stores of a lane want an aligned address.
+#define STORE_LANE(name, T, Vectors, lane)                                      \
+  TEST(Stores, name##_##lane) {                                                 \
+    alignas(64) auto ours = randomBits<Memory>();                               \
+    alignas(64) Memory theirs = ours;                                           \
+    const auto v = randomBits<Vectors>();                                       \
+    name(reinterpret_cast<T*>(ours.data() + 1), v, lane);                       \
+    std::memmove(theirs.data(), theirs.data() + 1, theirs.size() - 1);          \
+    simde_##name(reinterpret_cast<T*>(theirs.data()), v, lane);                 \
+    EXPECT_EQ(0, std::memcmp(ours.data() + 1, theirs.data(), ours.size() - 1)); \
+  }
+
+STORE_LANE(vst2q_lane_u64, uint64_t, uint64x2x2_t, 0)
+STORE_LANE(vst2q_lane_u64, uint64_t, uint64x2x2_t, 1)
+STORE_LANE(vst3q_lane_u32, uint32_t, uint32x4x3_t, 0)
+STORE_LANE(vst3q_lane_u32, uint32_t, uint32x4x3_t, 3)
+
 #define WIDENING(t, V, H, W)                                               \
   TEST(Widening, t) {                                                      \
     for (int i = 0; i < kTimes; ++i) {                                     \

@@ -1,6 +1,7 @@
 /// NEON intrinsics in SSE and AVX: those that SIMDe emulates lane by lane (with GCC all that widen or
-/// narrow), and those that it lacks. Included by neon.h after SIMDe; the table at the end says which names
-/// are taken over. SIMDe's own stay reachable with their prefix, and the tests compare with them.
+/// narrow) or for aligned memory only, and those that it lacks. Included by neon.h after SIMDe; the table at
+/// the end says which names are taken over. SIMDe's own stay reachable with their prefix, and the tests
+/// compare with them.
 #pragma once
 
 #include <immintrin.h>
@@ -8,6 +9,7 @@
 #include <array>
 #include <bit>
 #include <cstdint>
+#include <cstring>
 #include <type_traits>
 #include <utility>
 
@@ -497,6 +499,17 @@ inline void storeRow(T* p, const Vectors& v) {
   }
 }
 
+// One lane of each register, one behind the other, at any address.
+template <int lane, typename T, typename Vectors>
+inline void storeLanes(T* p, const Vectors& v) {
+  auto* bytes = reinterpret_cast<unsigned char*>(p);
+  for (const auto& vector : v.val) {
+    const T element = vector[lane];
+    std::memcpy(bytes, &element, sizeof(T));
+    bytes += sizeof(T);
+  }
+}
+
 }  // namespace neon_x86
 
 // ---- the names taken over
@@ -528,6 +541,10 @@ inline void storeRow(T* p, const Vectors& v) {
 #define vst3q_u8(p, ...) neon_x86::storeThree<8>(p, __VA_ARGS__)
 #undef vst3q_f32
 #define vst3q_f32(p, ...) neon_x86::storeThree<32>(p, __VA_ARGS__)
+#undef vst2q_lane_u64
+#define vst2q_lane_u64(p, v, lane) neon_x86::storeLanes<lane>(p, v)
+#undef vst3q_lane_u32
+#define vst3q_lane_u32(p, v, lane) neon_x86::storeLanes<lane>(p, v)
 #undef vst4_u8
 #define vst4_u8(p, ...) neon_x86::storeFour8(p, __VA_ARGS__)
 #undef vst4q_u8
