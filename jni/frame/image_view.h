@@ -1,6 +1,8 @@
 /// Packed caller memory seen as the image library's matrices.
 #pragma once
 
+#include <algorithm>
+#include <climits>
 #include <cstdint>
 
 #include "fastcv.h"
@@ -11,8 +13,12 @@ namespace kyface {
 template <int channels>
 using Image = HPC::fastcv::Mat<unsigned char, channels, HPC::fastcv::ECO_ENV_ARM>;
 
-/// Rows of a semi-planar 4:2:0 frame, luma and chroma together, for a picture of `height` rows.
-inline int rows_420(int height) { return static_cast<int>(std::int64_t{3} * height / 2); }
+/// Rows of a semi-planar 4:2:0 frame, luma and chroma together, for a picture of `height` rows. More than
+/// there can be are as many as there can be, which no height agrees with; wrapped, a negative height would
+/// have rows.
+inline int rows_420(int height) {
+  return static_cast<int>(std::clamp<std::int64_t>(std::int64_t{3} * height / 2, INT_MIN, INT_MAX));
+}
 
 /// A semi-planar 4:2:0 frame.
 inline Image<1> view_420(unsigned char* frame, int width, int height) {

@@ -392,6 +392,19 @@ TEST_F(CropTest, ARectangleThatLeavesTheFrameConvertsWhatIsThere) {
   }
 }
 
+// A frame without rows is not looked at, not even where 3/2 of its height is more than 32 bits hold.
+TEST_F(CropTest, ReadsNothingOfAFrameOfNegativeHeight) {
+  for (const int height : {-1, -2, -1431655766, -2147483647 - 1}) {
+    for (const int y : {0, 2, 2147483647, -2147483647 - 1}) {
+      Bytes out(2 * 2 * 4, kUntouched);
+      cropNv21(nullptr, kWidth, height, 0, y, 2, 2, out.data());
+      for (size_t i = 3; i < out.size(); i += 4) {
+        EXPECT_EQ(out[i], 255);  // converted, whatever its colour
+      }
+    }
+  }
+}
+
 TEST_F(CropTest, TakesAnAlignedTemporaryFrame) {
   const struct {
     Rectangle r;
