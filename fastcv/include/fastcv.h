@@ -6,9 +6,19 @@
 /// destination as it was whenever it returns anything but `HPC_SUCCESS`. Threads may call it on distinct
 /// destinations.
 ///
-/// The checks are those of each front-end's comment and no more. The data pointers in particular are the
-/// caller's word (except in `rotate`), and so is that a buffer really holds what `width`, `height` and `step`
-/// say.
+/// The checks are those of each front-end's comment and no more. Past all of them go, to every kernel,
+/// matrices
+/// - whose `data` is null (except to `rotate`) or has less room than the other fields say;
+/// - of negative sizes, of which nothing is read or written, and of sizes of 0, where it is the same but for
+///   conversions 17, 18 and 19 and `rotate`, which end the process by assertion;
+/// - whose `step` is no whole number of elements and is rounded down, or is beyond 2^31 elements, where its
+///   low 32 bits count.
+///
+/// Where a front-end does not look at a step, or lets a short one pass, its kernel takes the step as it is:
+/// row r begins r steps behind the first and is as long as the width says. Rows of a step that is too short
+/// overlap, and the last one ends behind `step * height`; with 0 all rows are one (17, 18, 19 and, in the
+/// source, `rotate` end the process); with a negative step they lie before `data`. Nothing outside these rows
+/// is touched (but see CVT_LAB2BGR). What else a front-end lets through, its comment says under "Malformed".
 #pragma once
 
 #include <malloc.h>
@@ -176,6 +186,18 @@ inline constexpr bool kNever = false;
 ///
 /// The second rules of the packed and the "from 4:2:0" families can describe no valid image. They decide
 /// which malformed calls still reach a kernel, and are kept for callers that rely on it.
+///
+/// Malformed:
+/// - packed: a step that is shorter than a row, on either side or both, when the destination is 3/2 as high
+///   as the source, or one or two rows more. H(src) rows are read, and as many written.
+/// - to 4:2:0: any steps. The destination may have one or two rows too many, which stay as they are.
+/// - from 4:2:0: a source with one or two rows too many, which are not read. And, with a step shorter than a
+///   row on either side, a destination 3/2 as high as the source, or one or two rows more: its height is then
+///   taken for the picture's, so that H(dst) * 3/2 rows are read of a source that says it has 2/3 H(dst),
+///   even when its own step is in order. Of an odd height the last row is neither read nor written, but
+///   CVT_YUV2GRAY copies it, and CVT_I4202BGR ends the process by assertion.
+/// - all but "to 4:2:0": a width that times the channels is beyond 2^31, where the product wraps and a step
+///   that is shorter than the row can count as holding it.
 template <ColorCvtType type, typename Tsrc, int ncSrc, typename Tdst, int ncDst, EcoEnv_t env>
 HPCStatus_t cvtColor(const Mat<Tsrc, ncSrc, env>& /*src*/, Mat<Tdst, ncDst, env>* /*dst*/) {
   static_assert(
@@ -191,6 +213,9 @@ HPCStatus_t cvtColor(const Mat<Tsrc, ncSrc, env>& /*src*/, Mat<Tdst, ncDst, env>
 ///
 /// Checks, in order: `src`, then `*dst` empty: HPC_MAT_EMPTY; the rectangle not wholly inside `src` (touching
 /// the right and bottom edges is inside): HPC_INVALID_ARGS.
+///
+/// Malformed: any steps. A rectangle so large that its right or bottom edge, formed in 32 bits, wraps to a
+/// negative number counts as inside.
 template <typename T, int ncSrc, typename TDst, int ncDst, int nc, EcoEnv_t env>
 HPCStatus_t crop(const Mat<T, ncSrc, env>& /*src*/, Point2_<int> /*p*/, TDst /*ratio*/,
                  Mat<TDst, ncDst, env>* /*dst*/) {
@@ -204,6 +229,8 @@ HPCStatus_t crop(const Mat<T, ncSrc, env>& /*src*/, Point2_<int> /*p*/, TDst /*r
 /// Checks, in order: `src.data`, then `dst->data` null: HPC_POINTER_NULL; `src`, then `*dst` empty:
 /// HPC_MAT_EMPTY; any other angle, or a destination whose size is not that of the rotated source:
 /// HPC_INVALID_ARGS. A size or source step of 0 that passes them ends the process by assertion.
+///
+/// Malformed: any other steps.
 template <typename T, int ncSrc, int ncDst, int nc, EcoEnv_t env>
 HPCStatus_t rotate(const Mat<T, ncSrc, env>& /*src*/, Mat<T, ncDst, env>* /*dst*/, float /*degree*/) {
   static_assert(detail::kNever<ncSrc, ncDst, nc, env>,
@@ -217,6 +244,9 @@ HPCStatus_t rotate(const Mat<T, ncSrc, env>& /*src*/, Mat<T, ncDst, env>* /*dst*
 ///
 /// Checks, in order: `dst` null: HPC_POINTER_NULL; `src`, then `*dst` empty: HPC_MAT_EMPTY; any other angle,
 /// or a destination whose width and luma height are not those of the rotated source: HPC_INVALID_ARGS.
+///
+/// Malformed: any steps, odd sizes, and a height that is 3/2 of the luma height and one row more, which stays
+/// as it is. The luma height is formed in 32 bits: twice a height beyond 2^30 wraps.
 template <YUV420Type type, typename T, EcoEnv_t env>
 HPCStatus_t rotate_YUV420(const Mat<unsigned char, 1, env>& /*src*/, Mat<unsigned char, 1, env>* /*dst*/,
                           float /*degree*/) {
