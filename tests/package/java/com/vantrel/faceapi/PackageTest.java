@@ -75,8 +75,8 @@ public final class PackageTest {
         try (ZipFile zip = new ZipFile(aar())) {
             entries = zip.stream().map(ZipEntry::getName).collect(Collectors.toCollection(TreeSet::new));
         }
-        assertEquals(new TreeSet<>(Arrays.asList("AndroidManifest.xml", "LICENSE", "R.txt", "README.txt", "classes.jar",
-                LIBRARY, "prefab/prefab.json", MODULE + "module.json", MODULE + "include/fastcv.h",
+        assertEquals(new TreeSet<>(Arrays.asList("AndroidManifest.xml", "LICENSE", "NOTICE.txt", "R.txt",
+                "README.txt", "classes.jar", LIBRARY, "prefab/prefab.json", MODULE + "module.json", MODULE + "include/fastcv.h",
                 MODULE + "libs/android.arm64-v8a/abi.json", MODULE + "libs/android.arm64-v8a/libjni_kyface_api.so",
                 "proguard.txt")), entries);
         for (String beside : new String[] {"-sources.jar", "-javadoc.jar", ".pom"}) {
