@@ -53,8 +53,9 @@ HPCStatus_t expected(ColorCvtType type, size_t elementSize, const Scalars& src, 
   if (src.dims == 0 || dst.dims == 0) {
     return HPC_MAT_EMPTY;
   }
-  const int srcStride = wrap(src.step / static_cast<int64_t>(elementSize));
-  const int dstStride = wrap(dst.step / static_cast<int64_t>(elementSize));
+  const int shift = elementSize == 4 ? 2 : 0;  // rounds down, below 0 too
+  const int srcStride = wrap(src.step >> shift);
+  const int dstStride = wrap(dst.step >> shift);
   const bool fits =
       srcStride >= wrap(int64_t{src.width} * ncSrc) && dstStride >= wrap(int64_t{dst.width} * ncDst);
   bool good = false;

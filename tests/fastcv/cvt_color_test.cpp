@@ -151,10 +151,16 @@ int32_t low(int64_t value) {
   return static_cast<int32_t>(static_cast<uint32_t>(static_cast<uint64_t>(value)));
 }
 
+/// A step in elements, rounded down.
+int32_t elements(int64_t step, int elementSize) {
+  const int64_t rest = (step % elementSize + elementSize) % elementSize;
+  return low((step - rest) / elementSize);
+}
+
 /// Whether the sizes pass, said once more.
 bool sizesPass(const Instance& instance, const Fields& src, const Fields& dst) {
-  const int32_t srcStride = low(src.step / instance.elementSize);
-  const int32_t dstStride = low(dst.step / instance.elementSize);
+  const int32_t srcStride = elements(src.step, instance.elementSize);
+  const int32_t dstStride = elements(dst.step, instance.elementSize);
   const bool fit = srcStride >= low(int64_t{src.width} * instance.ncSrc) &&
                    dstStride >= low(int64_t{dst.width} * instance.ncDst);
   switch (familyOf(instance.type)) {
@@ -202,8 +208,8 @@ class CvtColor : public testing::TestWithParam<Instance> {
     ASSERT_EQ(instance().convert(src, &after), HPC_SUCCESS) << describe(src, dst);
     EXPECT_TRUE(after == dst) << describe(src, dst);
     const Call expected = {instance().kernel, family() == Family::kFrom420 ? dst.height : src.height,
-                           src.width,         low(src.step / instance().elementSize),
-                           src.data,          low(dst.step / instance().elementSize),
+                           src.width,         elements(src.step, instance().elementSize),
+                           src.data,          elements(dst.step, instance().elementSize),
                            dst.data};
     EXPECT_EQ(calls, std::vector<Call>{expected}) << describe(src, dst);
     calls.clear();
@@ -401,6 +407,26 @@ TEST_P(CvtColor, EverySmallSize) {
         }
       }
     }
+  }
+}
+
+// Bytes that make no whole element do not count, in steps below 0 either.
+TEST_P(CvtColor, StepsAreRoundedDown) {
+  for (int bytes = 1; bytes < instance().elementSize; ++bytes) {
+    for (const int64_t step : {int64_t{4096}, int64_t{0}, int64_t{-4}, int64_t{-4096}}) {
+      Fields src = source(64, 48);
+      Fields dst = destination(64, 72);
+      src.step = step + bytes;
+      dst.step = step + bytes;
+      if (step > 0) {
+        dst.height = 48;
+      }
+      expectCall(src, dst);
+    }
+    // One byte less than a row is too short.
+    Fields src = source(64, 48);
+    src.step -= bytes;
+    expectRefusal(HPC_INVALID_ARGS, src, destination(64, 48));
   }
 }
 
