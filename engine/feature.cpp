@@ -32,7 +32,8 @@ static_assert(kChecksumAt + 4 == KY_FEATURE_LENGTH);
 static_assert(KY_FEATURE_LENGTH % 3 == 0, "the text needs no padding");
 static_assert(KY_FEATURE_TEXT_LENGTH == KY_FEATURE_LENGTH / 3 * 4 + 1);
 
-using Patch = std::array<std::array<int, kCropSide>, kCropSide>;
+/// Grays in 256ths. A multiple of one by up to 65536 still fits.
+using Patch = std::array<std::array<uint32_t, kCropSide>, kCropSide>;
 
 constexpr std::array<uint8_t, 256> kBinOf = [] {
   std::array<uint8_t, 256> bins = {};
@@ -60,7 +61,7 @@ Patch Smoothed(const GrayImage& picture, const FaceCrop& crop) {
   Patch smoothed = {};
   for (int y = 0; y < kCropSide; ++y) {
     for (int x = 2; x < kCropSide - 2; ++x) {
-      across[y][x] = filter([&](int d) { return static_cast<int>(chip[y][x + d]); });
+      across[y][x] = filter([&](int d) { return static_cast<uint32_t>(chip[y][x + d]); });
     }
   }
   for (int y = 2; y < kCropSide - 2; ++y) {
@@ -76,15 +77,15 @@ unsigned PatternAt(const Patch& p, int y, int x) {
   // A diagonal neighbour lies sqrt(2) away in both directions, 106 / 256 of the way from the first pixel to
   // the second; in 65536ths.
   const auto diagonal = [&](int dy, int dx) {
-    constexpr int kFar = 106;
-    constexpr int kNear = 256 - kFar;
+    constexpr uint32_t kFar = 106;
+    constexpr uint32_t kNear = 256 - kFar;
     return kNear * (kNear * p[y + dy][x + dx] + kFar * p[y + dy][x + 2 * dx]) +
            kFar * (kNear * p[y + 2 * dy][x + dx] + kFar * p[y + 2 * dy][x + 2 * dx]);
   };
-  constexpr int kOne = 256 * 256;
-  const std::array<int, 8> circle = {kOne * p[y][x + 2], diagonal(-1, 1),    kOne * p[y - 2][x],
-                                     diagonal(-1, -1),   kOne * p[y][x - 2], diagonal(1, -1),
-                                     kOne * p[y + 2][x], diagonal(1, 1)};
+  constexpr uint32_t kOne = 256 * 256;
+  const std::array<uint32_t, 8> circle = {kOne * p[y][x + 2], diagonal(-1, 1),    kOne * p[y - 2][x],
+                                          diagonal(-1, -1),   kOne * p[y][x - 2], diagonal(1, -1),
+                                          kOne * p[y + 2][x], diagonal(1, 1)};
   unsigned pattern = 0;
   for (size_t i = 0; i < circle.size(); ++i) {
     pattern |= static_cast<unsigned>(circle[i] >= kOne * p[y][x]) << i;

@@ -16,6 +16,7 @@ namespace {
 
 using namespace HPC::fastcv;
 using kyface::fuzz::Input;
+using kyface::fuzz::wrap;
 using kyface::test::GuardedImage;
 using kyface::test::isFrom420;
 using kyface::test::isTo420;
@@ -45,8 +46,6 @@ void set(Image<T, nc>& mat, const Scalars& s, T* data) {
   mat.step = s.step;
   mat.data = data;
 }
-
-int wrap(int64_t value) { return static_cast<int>(static_cast<uint32_t>(value)); }
 
 HPCStatus_t expected(ColorCvtType type, size_t elementSize, const Scalars& src, int ncSrc, const Scalars& dst,
                      int ncDst) {

@@ -12,6 +12,7 @@
 namespace {
 
 using kyface::fuzz::Input;
+using kyface::fuzz::wrap;
 using kyface::test::GuardedImage;
 
 struct Image {
@@ -44,8 +45,9 @@ Image someImage(Input& input) {
   image.format = scalar(-1, 7);
   image.width = scalar(0, 130);
   image.height = scalar(0, 130);
-  image.stride = input.seldom(6) ? input.any() : image.width * image.bytesPerPixel() + input.in(0, 4);
-  image.orientation = scalar(0, 3) * 90;
+  image.stride =
+      input.seldom(6) ? input.any() : wrap(int64_t{image.width} * image.bytesPerPixel() + input.in(0, 4));
+  image.orientation = wrap(int64_t{scalar(0, 3)} * 90);
   return image;
 }
 

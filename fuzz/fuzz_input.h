@@ -8,6 +8,9 @@
 
 namespace kyface::fuzz {
 
+/// The low 32 bits of a result, as sums and products of ints give them that wrap.
+inline int wrap(int64_t value) { return static_cast<int>(static_cast<uint32_t>(value)); }
+
 class Input {
  public:
   Input(const uint8_t* data, size_t size) : data_(data), size_(size) {}

@@ -16,12 +16,11 @@ namespace {
 using namespace HPC::fastcv;
 using kyface::fuzz::asserted;
 using kyface::fuzz::Input;
+using kyface::fuzz::wrap;
 using kyface::test::GuardedImage;
 
 template <typename T, int nc>
 using Image = Mat<T, nc, ECO_ENV_ARM>;
-
-int wrap(int64_t value) { return static_cast<int>(static_cast<uint32_t>(value)); }
 
 template <typename T>
 T sample(Input& input) {

@@ -13,11 +13,10 @@
 namespace {
 
 using kyface::fuzz::Input;
+using kyface::fuzz::wrap;
 using kyface::test::GuardedImage;
 
 using Metric = unsigned char (*)(const unsigned char*, int, int, int, int, int, int, int, int);
-
-int wrap(int64_t value) { return static_cast<int>(static_cast<uint32_t>(value)); }
 
 unsigned luma(const unsigned char* p) { return p[0]; }
 template <int blue>
@@ -60,7 +59,7 @@ extern "C" int LLVMFuzzerTestOneInput(const uint8_t* data, size_t size) {
     uint32_t sum = 0;
     for (int r = y0; r <= y1; ++r) {
       for (int c = x0; c <= x1; ++c) {
-        const unsigned char* p = image.row(r) + c * target.channels;
+        const unsigned char* p = image.row(r) + ptrdiff_t{c} * target.channels;
         sum += target.value != nullptr ? target.value(p)
                                        : target.metric(p, 1, target.channels, 1, 1, 0, 0, 1, 1);
       }

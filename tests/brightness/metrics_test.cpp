@@ -53,7 +53,8 @@ int64_t wrapped(int64_t value) {
 
 // The rounded mean of a sum over an area of columns by rows.
 int meanOf(int64_t sum, int64_t columns, int64_t rows) {
-  const int64_t n = wrapped(columns * rows);
+  const int64_t n =
+      wrapped(static_cast<int64_t>(static_cast<uint64_t>(columns) * static_cast<uint64_t>(rows)));
   return n == 0 ? 0 : static_cast<int>((wrapped(sum + n / 2) / n) & 255);
 }
 

@@ -130,6 +130,21 @@ TEST_F(VerifierTest, LightMattersLittle) {
   EXPECT_GT(Compare(*PortraitFeature(), *FeatureOf(TestFrame(darker), kPortraitFace)), 0.75F);
 }
 
+TEST_F(VerifierTest, BrightnessAloneDoesNotMatter) {
+  // Half the contrast, from as dark as can be to as bright as can be.
+  const auto lit = [&](int offset) {
+    Picture picture = Portrait();
+    for (uint8_t& value : picture.rgb) {
+      value = static_cast<uint8_t>(value / 2 + offset);
+    }
+    return FeatureOf(TestFrame(picture, KY_PIXEL_RGB), kPortraitFace);
+  };
+  const auto darkest = lit(0);
+  for (const int offset : {32, 64, 96, 128}) {
+    EXPECT_GT(Compare(*darkest, *lit(offset)), 0.99F) << offset;
+  }
+}
+
 TEST_F(VerifierTest, EveryFormatGivesTheSameFeature) {
   const Picture about_face = Part(Portrait(), 140, 40, 168, 168);
   const ky_rect_t rect = {39, 43, 126, 130};

@@ -40,6 +40,7 @@ TEST(Threads, DoNotDisturbEachOther) {
   std::vector<Bytes> results[kRounds][kThreads];
   std::barrier together(kThreads);
   std::vector<std::thread> running;
+  running.reserve(kThreads);
   for (size_t thread = 0; thread < kThreads; ++thread) {
     running.emplace_back([&, thread] {
       std::vector<Bytes>& inStep = results[0][thread];
