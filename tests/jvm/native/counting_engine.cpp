@@ -1,9 +1,11 @@
 /// A face engine that costs nothing and counts what it has handed out.
 ///
 /// Detection and tracking find as many faces as the image's first byte says, each with as many points as its
-/// second byte says. A feature has as many bytes as the image's first byte says. `ky_face_algorithm_info`
-/// returns how many result arrays and features are out.
+/// second byte says. A feature has as many bytes as the image's first byte says. Where the third byte is not
+/// 0 it claims more faces, or bytes, than there can be: the most, or with 2 the least that an int can say.
+/// `ky_face_algorithm_info` returns how many result arrays and features are out.
 #include <atomic>
+#include <climits>
 #include <cstdlib>
 #include <cstring>
 
@@ -30,6 +32,9 @@ void takeBack(void* memory) {
   }
 }
 
+/// What is said of a number, given the byte that asks for a wrong one.
+int claimed(int number, unsigned char lie) { return lie == 0 ? number : lie == 2 ? INT_MIN : INT_MAX; }
+
 int find(const unsigned char* image, ky_face_t** faces, int* count) {
   *count = image[0];
   *faces = *count == 0 ? nullptr : handOut<ky_face_t>(static_cast<size_t>(*count));
@@ -37,6 +42,7 @@ int find(const unsigned char* image, ky_face_t** faces, int* count) {
     (*faces)[i].id = i + 1;
     (*faces)[i].points_count = image[1];
   }
+  *count = claimed(*count, image[2]);
   return 0;
 }
 
@@ -81,7 +87,7 @@ int ky_verify_get_feature(ky_handle_t, const unsigned char* image, int, int, int
   Feature* made = handOut<Feature>(1);
   made->length = image[0];
   *feature = made;
-  *length = made->length;
+  *length = claimed(made->length, image[2]);
   return 0;
 }
 void ky_verify_serialize_feature(ky_feature_t feature, char* text) {

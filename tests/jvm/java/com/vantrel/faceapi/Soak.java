@@ -148,6 +148,7 @@ public final class Soak {
             new Random(seed).nextBytes(frame);
             frame[0] = (byte) (1 + seed % 3); // faces, and points of each, where the counting engine finds them
             frame[1] = (byte) (5 * seed);
+            frame[2] = 0; // and where it tells the truth
             tracker = FaceLibrary.kyFaceCreateTracker(null, 0, 0);
             check("tracker", tracker != 0);
             faces = track();
