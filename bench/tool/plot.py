@@ -57,9 +57,9 @@ def _panel(panel):
         x = x_of(width, height)
         yield f'<text x="{x:.1f}" y="{PANEL_HEIGHT + 18}" text-anchor="middle">{width}</text>'
         yield f'<text x="{x:.1f}" y="{PANEL_HEIGHT + 32}" text-anchor="middle">x {height}</text>'
-    # Names stand at the ends of their lines, moved apart where these are close.
+    # A series has its colour in every panel. Names stand at the ends of their lines, moved apart where these are close.
     last = math.inf
-    for colour, (name, points) in zip(COLOURS, sorted(panel.series, key=lambda series: series[1][-1][2])):
+    for colour, (name, points) in sorted(zip(COLOURS, panel.series), key=lambda series: series[1][1][-1][2]):
         line = " ".join(f"{x_of(width, height):.1f},{y_of(value):.1f}" for width, height, value in points)
         yield f'<polyline points="{line}" fill="none" stroke="{colour}" stroke-width="2"/>'
         for width, height, value in points:
