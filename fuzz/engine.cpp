@@ -113,10 +113,13 @@ extern "C" int LLVMFuzzerTestOneInput(const uint8_t* data, size_t size) {
         face.rect.top = input.any();
       }
       face.points_count = input.seldom(4) ? input.any() : input.in(0, 4);
-      face.roll = static_cast<float>(input.any());
-      face.eye_dist = static_cast<float>(input.in(-3, 100));
+      face.roll = input.anyFloat();
+      face.eye_dist = input.seldom(4) ? input.anyFloat() : static_cast<float>(input.in(-3, 100));
       for (ky_pointf_t& point : face.points_array) {
         point = {static_cast<float>(input.pixel()), static_cast<float>(input.pixel())};
+      }
+      if (input.seldom(4)) {
+        face.points_array[input.in(0, 3)].x = input.anyFloat();
       }
       ky_feature_t feature = nullptr;
       int length = 0;
@@ -145,7 +148,8 @@ extern "C" int LLVMFuzzerTestOneInput(const uint8_t* data, size_t size) {
       break;
     case 6: {
       float threshold = 0;
-      ky_face_detect_set_threshold(detector, static_cast<float>(input.any()) / 128);
+      ky_face_detect_set_threshold(
+          detector, input.seldom(3) ? input.anyFloat() : static_cast<float>(input.any()) / 128);
       FUZZ_CHECK(ky_face_detect_get_threshold(detector, &threshold) == 0);
       FUZZ_CHECK(threshold >= KY_MIN_THRESHOLD && threshold <= KY_MAX_THRESHOLD);
       break;

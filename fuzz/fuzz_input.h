@@ -1,10 +1,13 @@
 /// A fuzzer's bytes, taken as numbers. When they run out everything is 0, so that every input is a whole one.
 #pragma once
 
+#include <bit>
 #include <cstddef>
 #include <cstdint>
 #include <cstdio>
 #include <cstdlib>
+#include <iterator>
+#include <limits>
 
 namespace kyface::fuzz {
 
@@ -47,6 +50,24 @@ class Input {
                                      1 << 30};
     const uint8_t choice = byte();
     return choice < 128 ? kEdges[choice % 16] : choice < 192 ? in(-70, 70) : in(INT32_MIN, INT32_MAX);
+  }
+
+  /// Any float, often a special one.
+  float anyFloat() {
+    using Limits = std::numeric_limits<float>;
+    static constexpr float kSpecial[] = {0,
+                                         -0.0f,
+                                         1,
+                                         Limits::quiet_NaN(),
+                                         Limits::infinity(),
+                                         -Limits::infinity(),
+                                         Limits::max(),
+                                         Limits::lowest(),
+                                         Limits::min(),
+                                         Limits::denorm_min()};
+    const uint8_t choice = byte();
+    return choice < 128 ? kSpecial[choice % std::size(kSpecial)]
+                        : std::bit_cast<float>(in(INT32_MIN, INT32_MAX));
   }
 
   /// True once in `often`.

@@ -4,6 +4,7 @@
 
 #include <algorithm>
 #include <climits>
+#include <ctime>
 #include <vector>
 
 #include "cvt_families.h"
@@ -170,6 +171,33 @@ TEST(Malformed, OddPictureHeights) {
   EXPECT_EQ(gray.contents(), luma.contents());
 
   EXPECT_DEATH((cvtColor<CVT_I4202BGR, u8, 1, u8, 3, ECO_ENV_ARM>(src.matrix(4), &out)), "height % 2 == 0");
+}
+
+// Many rows of nothing: there is nothing to walk.
+template <ColorCvtType type, typename T, int ncSrc, int ncDst>
+void convertNothing() {
+  constexpr int kHeight = 1 << 30, kFrameHeight = kHeight / 2 * 3;
+  for (const int width : {0, -2, -64}) {
+    T none[1] = {};
+    Image<T, ncSrc> src(width, isFrom420(type) ? kFrameHeight : kHeight, none);
+    Image<T, ncDst> dst(width, isTo420(type) ? kFrameHeight : kHeight, none);
+    if (width == 0 && (type == CVT_BGR2I420 || type == CVT_I4202BGR || type == CVT_YUV2GRAY)) {
+      continue;  // an assertion
+    }
+    const clock_t begin = clock();
+    EXPECT_EQ((cvtColor<type, T, ncSrc, T, ncDst, ECO_ENV_ARM>(src, &dst)), HPC_SUCCESS);
+    EXPECT_LT(clock() - begin, CLOCKS_PER_SEC / 5) << "width " << width;
+  }
+}
+
+TEST(Malformed, ManyRowsOfNothing) {
+#define INSTANCE(type, T, ncSrc, ncDst)                                \
+  {                                                                    \
+    SCOPED_TRACE(#type ", " #T ", " #ncSrc " to " #ncDst " channels"); \
+    convertNothing<type, T, ncSrc, ncDst>();                           \
+  }
+  FASTCV_CVT_COLOR_INSTANCES(INSTANCE)
+#undef INSTANCE
 }
 
 // ---- crop and rotate

@@ -441,6 +441,9 @@ template <int nc>
 inline void cvt_color_lab2bgr_uchar(int height, int width, int inWidthStride, const unsigned char* inData,
                                     int outWidthStride, unsigned char* outData) {
   using Row = LabToBgr8Row<nc>;
+  if (width < 1) {
+    return;
+  }
   const ptrdiff_t grouped = width > 3 ? (static_cast<ptrdiff_t>(width) + 4) / Row::kGroup * Row::kGroup : 0;
   const LabToLinear linear;
   const ptrdiff_t length = grouped > width ? grouped : width;

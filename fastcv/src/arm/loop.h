@@ -254,6 +254,9 @@ void convertImage(int height, int width, int inWidthStride, const typename Op::S
 template <int kBlock, int kInFlight, typename Pair>
 inline void forEachRowPair(int height, int width, const Pair& pair) {
   const ptrdiff_t length = width & ~1;
+  if (length < 1) {
+    return;
+  }
   for (ptrdiff_t row = 0; row + 1 < height; row += 2) {
     const auto handler = pair(row);
     walk<kBlock, kInFlight, 2>(
