@@ -9,6 +9,17 @@ if(KYFACE_SANITIZE)
   add_link_options(-fsanitize=${KYFACE_SANITIZE})
 endif()
 
+# Counters of the lines and branches that run. Those of a process that ends by assertion count too: they are kept in
+# the file itself (continuous mode), which takes counters that can be relocated.
+option(KYFACE_COVERAGE "Count the lines and branches of the library that run; takes clang" OFF)
+add_library(kyface_coverage INTERFACE)
+if(KYFACE_COVERAGE)
+  set(kyface_instrumented ON)
+  target_compile_options(kyface_coverage INTERFACE -fprofile-instr-generate -fcoverage-mapping
+                                                   "SHELL:-mllvm -runtime-counter-relocation")
+  target_link_options(kyface_coverage INTERFACE -fprofile-instr-generate)
+endif()
+
 # What every target of the project is compiled with.
 add_library(kyface_warnings INTERFACE)
 target_compile_options(kyface_warnings INTERFACE -Wall -Wextra -Wpedantic -Wshadow -Wcast-qual -Wvla -Werror)
@@ -32,7 +43,7 @@ endif()
 add_library(kyface_options INTERFACE)
 target_compile_options(kyface_options INTERFACE $<$<COMPILE_LANGUAGE:CXX>:-fno-exceptions -fno-rtti
                                                 -fvisibility-inlines-hidden> -fvisibility=hidden)
-target_link_libraries(kyface_options INTERFACE kyface_warnings kyface_simd)
+target_link_libraries(kyface_options INTERFACE kyface_warnings kyface_simd kyface_coverage)
 
 # Hardening of a shared library: read-only relocations, everything bound at load, nothing left undefined.
 add_library(kyface_link INTERFACE)

@@ -4,9 +4,10 @@
 #   scripts/setup.sh [group...]
 #
 # Groups are `host` and `aarch64`, named after the build presets that need them, both without an argument; and `bench`,
-# `lint` and `fuzz`, which add what the scripts of these names need. Packages that are there already are left alone,
-# and nothing is asked when all are. Packages of this machine are installed with apt-get (through sudo when not root).
-# Packages of 64-bit Arm are unpacked into .deps/arm64: installing them would pull this system's own packages along.
+# `coverage`, `fuzz` and `lint`, which add what the scripts of these names need. Packages that are there already are left
+# alone, and nothing is asked when all are. Packages of this machine are installed with apt-get (through sudo when not
+# root). Packages of 64-bit Arm are unpacked into .deps/arm64: installing them would pull this system's own packages
+# along.
 # shellcheck source=scripts/common.sh
 source "$(dirname "${BASH_SOURCE[0]}")/common.sh"
 
@@ -34,8 +35,9 @@ packages_lint=(
 packages_fuzz=(
   "${packages_host[@]}"
   clang-19 lld-19 llvm-19
-  libclang-rt-19-dev           # libFuzzer and the sanitizers
+  libclang-rt-19-dev           # libFuzzer, the sanitizers, coverage
 )
+packages_coverage=("${packages_fuzz[@]}")
 packages_bench=(
   "${packages_aarch64[@]}"
   libbenchmark-dev                  # times on this machine
@@ -151,8 +153,9 @@ for group in "$@"; do
     aarch64) packages+=("${packages_aarch64[@]}") arm64+=("${arm64_aarch64[@]}") ;;
     lint) packages+=("${packages_lint[@]}") arm64+=("${arm64_aarch64[@]}") ;;
     fuzz) packages+=("${packages_fuzz[@]}") ;;
+    coverage) packages+=("${packages_coverage[@]}") ;;
     bench) packages+=("${packages_bench[@]}") arm64+=("${arm64_bench[@]}") ;;
-    *) fail "there is no group \"$group\"; the groups are host, aarch64, bench, lint and fuzz" ;;
+    *) fail "there is no group \"$group\"; the groups are host, aarch64, bench, coverage, fuzz and lint" ;;
   esac
 done
 readarray -t packages < <(printf '%s\n' "${packages[@]}" | awk '!seen[$0]++')
