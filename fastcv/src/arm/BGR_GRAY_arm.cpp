@@ -22,8 +22,7 @@ struct ToGray<unsigned char, ncSrc> {
   using Dst = unsigned char;
   static constexpr int kSrcChannels = ncSrc;
   static constexpr int kDstChannels = 1;
-  // Loads of four channels crowd out each other on cores that run ahead.
-  static constexpr int kInFlight = ncSrc == 3 ? 4 : 2;
+  static constexpr int kInFlight = 4;
   static constexpr bool kUniform = true;
 
   static constexpr int kB = 29, kG = 150, kR = 77;
@@ -65,7 +64,7 @@ struct FromGray {
   using Dst = T;
   static constexpr int kSrcChannels = 1;
   static constexpr int kDstChannels = ncDst;
-  static constexpr int kInFlight = 8;
+  static constexpr int kInFlight = ncDst == 3 ? 8 : 4;
   static constexpr bool kUniform = true;
 
   Pixels<T, 3> vector(const Pixels<T, 1>& p) const { return {{p.c[0], p.c[0], p.c[0]}}; }

@@ -146,7 +146,7 @@ struct BgrToLab8 {
     return veor_u8(vreinterpret_u8_s8(centred), vdup_n_u8(0x80));
   }
 
-  Half half(uint16x8_t b, uint16x8_t g, uint16x8_t r) const {
+  [[gnu::always_inline]] Half half(uint16x8_t b, uint16x8_t g, uint16x8_t r) const {
     const uint16x8_t x = root(x_, b, g, r);
     const uint16x8_t y = root(y_, b, g, r);
     const uint16x8_t z = root(z_, b, g, r);
