@@ -17,11 +17,11 @@
 
 int main(int argc, char** argv) {
   if (argc < 5) {
-    std::fprintf(stderr, "usage: %s own|all REPEATS PATTERN SIZE...\n", argv[0]);
+    (void)std::fprintf(stderr, "usage: %s own|all REPEATS PATTERN SIZE...\n", argv[0]);
     return 2;
   }
   const bool own = std::strcmp(argv[1], "own") == 0;
-  const int repeats = std::atoi(argv[2]);
+  const int repeats = std::stoi(argv[2]);
   const std::vector<bench::Operation> operations = bench::operationsMatching(argv[3], own);
   for (int i = 4; i < argc; ++i) {
     const bench::Size size = bench::sizeOf(argv[i]);

@@ -1,10 +1,13 @@
 #include "operation.h"
 
 #include <algorithm>
+#include <charconv>
 #include <cstdio>
+#include <cstdlib>
 #include <cstring>
 #include <regex>
 #include <set>
+#include <system_error>
 
 namespace bench {
 
@@ -46,12 +49,16 @@ std::vector<Operation> operationsMatching(const std::string& pattern, [[maybe_un
 
 Size sizeOf(const std::string& text) {
   Size size{};
-  if (std::sscanf(text.c_str(), "%dx%d", &size.width, &size.height) != 2 || size.width < 1 ||
-      size.height < 1) {
-    std::fprintf(stderr, "a size is written as 1280x720, not as \"%s\"\n", text.c_str());
-    std::exit(2);
+  const char* const end = text.data() + text.size();
+  const auto width = std::from_chars(text.data(), end, size.width);
+  if (width.ec == std::errc() && width.ptr != end && *width.ptr == 'x') {
+    const auto height = std::from_chars(width.ptr + 1, end, size.height);
+    if (height.ec == std::errc() && height.ptr == end && size.width >= 1 && size.height >= 1) {
+      return size;
+    }
   }
-  return size;
+  (void)std::fprintf(stderr, "a size is written as 1280x720, not as \"%s\"\n", text.c_str());
+  std::exit(2);  // NOLINT(concurrency-mt-unsafe): there is no other thread
 }
 
 }  // namespace bench

@@ -59,7 +59,7 @@ inline void addRow(Sum& sum, const unsigned char* row, ptrdiff_t length) {
       [&](ptrdiff_t x, auto blocks) {
         Block<nc> pixels[blocks];
         for (int i = 0; i < blocks; ++i) {
-          pixels[i] = loadPixels<nc>(row + (x + i * kBlock) * nc);
+          pixels[i] = loadPixels<nc>(row + (x + ptrdiff_t{i} * kBlock) * nc);
         }
         sum.add(pixels);
       },

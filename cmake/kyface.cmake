@@ -20,6 +20,11 @@ if(KYFACE_COVERAGE)
   target_link_options(kyface_coverage INTERFACE -fprofile-instr-generate)
 endif()
 
+# An instrumented build is hardly optimised, and clang would complain of loops that ask to be.
+if(kyface_instrumented)
+  add_compile_options($<$<COMPILE_LANG_AND_ID:CXX,Clang>:-Wno-pass-failed>)
+endif()
+
 # What every target of the project is compiled with.
 add_library(kyface_warnings INTERFACE)
 target_compile_options(kyface_warnings INTERFACE -Wall -Wextra -Wpedantic -Wshadow -Wcast-qual -Wvla -Werror)

@@ -177,9 +177,9 @@ float Similarity(const Feature& a, const Feature& b) {
   int64_t aa = 0;
   int64_t bb = 0;
   for (size_t i = kMark.size(); i < kChecksumAt; ++i) {
-    ab += a[i] * b[i];
-    aa += a[i] * a[i];
-    bb += b[i] * b[i];
+    ab += int64_t{a[i]} * b[i];
+    aa += int64_t{a[i]} * a[i];
+    bb += int64_t{b[i]} * b[i];
   }
   if (aa == 0 || bb == 0) {
     return 0;

@@ -1,5 +1,5 @@
 // The native methods over the open engine: faces and features go through both. What a method deliberately
-// never gives back to the engine is lost here for real; tests/leaks.supp says what that is.
+// never gives back stays in the engine's tables; tests/leaks.supp says what that is.
 #include <gtest/gtest.h>
 
 #include "face_library.h"

@@ -73,6 +73,7 @@ class GuardedImage {
       for (int i = 0; i < (r + 1 < rows_ ? stride_ : rowElements_); ++i) {
         const size_t at = static_cast<size_t>(r) * static_cast<size_t>(stride_) + static_cast<size_t>(i);
         const T want = i < rowElements_ ? expected[next++] : padding(at);
+        // NOLINTNEXTLINE(bugprone-suspicious-memory-comparison,cert-exp42-c,cert-flp37-c): bit for bit
         if (memcmp(&want, &data_[at], sizeof(T)) != 0) {
           return ::testing::AssertionFailure()
                  << (i < rowElements_ ? "row " : "padding of row ") << r << ", element " << i << ": "
