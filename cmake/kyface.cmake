@@ -34,7 +34,8 @@ target_compile_options(kyface_warnings INTERFACE -Wall -Wextra -Wpedantic -Wshad
 add_library(kyface_simd INTERFACE)
 target_compile_options(kyface_simd INTERFACE -ffp-contract=off -fno-math-errno)
 if(CMAKE_SYSTEM_PROCESSOR MATCHES "x86_64|AMD64")
-  target_compile_options(kyface_simd INTERFACE -mavx2 -mfma)
+  # With clang SIMDe takes MMX for 64-bit vectors, after which a caller's long double is NaN.
+  target_compile_options(kyface_simd INTERFACE -mavx2 -mfma $<$<CXX_COMPILER_ID:Clang>:-mno-mmx>)
   if(ANDROID)
     # SIMDe is headers alone and knows Android; only its own folder must be seen of this machine's headers.
     find_path(KYFACE_SIMDE simde/arm/neon.h NO_CMAKE_FIND_ROOT_PATH REQUIRED)
