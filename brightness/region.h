@@ -6,6 +6,7 @@
 #include <cstdint>
 #include <cstdio>
 #include <cstring>
+#include <limits>
 
 #include "loop.h"
 #include "pixel.h"
@@ -33,15 +34,16 @@ struct Region {
 // Sizes and sums are 32-bit and wrap, so that every argument has a defined result.
 inline int wrapped(uint32_t value) { return static_cast<int>(value); }
 
-/// The part of [start, start + extent) inside [0, size): first to last, none if last < first.
+/// The part of [start, start + extent) inside [0, size): first to last, none if last < first. The smallest
+/// size does not wrap: nothing is inside it.
 struct Range {
   int first;
   int last;
 
   Range(int start, int extent, int size)
       : first(std::max(start, 0)),
-        last(std::min(wrapped(static_cast<uint32_t>(start) + static_cast<uint32_t>(extent) - 1u), size - 1)) {
-  }
+        last(std::min(wrapped(static_cast<uint32_t>(start) + static_cast<uint32_t>(extent) - 1u),
+                      std::max(size, std::numeric_limits<int>::min() + 1) - 1)) {}
 
   bool isEmpty() const { return last < first; }
   uint32_t count() const { return static_cast<uint32_t>(last) - static_cast<uint32_t>(first) + 1u; }

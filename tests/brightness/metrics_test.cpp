@@ -64,10 +64,8 @@ int expectedMean(const Variant& variant, const u8* data, int width, int stride, 
     return 255;
   }
   const int64_t x0 = std::max(rectX, 0), y0 = std::max(rectY, 0);
-  const int64_t x1 =
-      std::min<int64_t>(wrapped(static_cast<int64_t>(rectX) + rectW - 1), wrapped(width - 1LL));
-  const int64_t y1 =
-      std::min<int64_t>(wrapped(static_cast<int64_t>(rectY) + rectH - 1), wrapped(height - 1LL));
+  const int64_t x1 = std::min<int64_t>(wrapped(static_cast<int64_t>(rectX) + rectW - 1), width - 1LL);
+  const int64_t y1 = std::min<int64_t>(wrapped(static_cast<int64_t>(rectY) + rectH - 1), height - 1LL);
   int64_t sum = 0;
   for (int64_t y = y0; y <= y1; ++y) {
     for (int64_t x = x0; x <= x1; ++x) {
