@@ -195,10 +195,10 @@ std::vector<Call> calls() {
 
 int main(int argc, char** argv) {
   if (argc != 2) {
-    std::fprintf(stderr, "usage: %s REPEATS\n", argv[0]);
+    (void)std::fprintf(stderr, "usage: %s REPEATS\n", argv[0]);
     return 2;
   }
-  const int repeats = std::atoi(argv[1]);
+  const int repeats = std::stoi(argv[1]);
   JNI_OnLoad(machine(), nullptr);
   const Range code = codeAround(reinterpret_cast<const void*>(&JNI_OnLoad));
   std::printf("%zx\t%zx\n", code.begin, code.end);

@@ -124,11 +124,11 @@ std::array<uint8_t, 4> ChecksumBytes(const Feature& feature) {
 constexpr std::string_view kDigits = "ABCDEFGHIJKLMNOPQRSTUVWXYZabcdefghijklmnopqrstuvwxyz0123456789+/";
 
 /// The value of each character as a base64 digit, -1 for those that are none.
-constexpr std::array<int8_t, 256> kValueOf = [] {
-  std::array<int8_t, 256> values = {};
+constexpr std::array<int16_t, 256> kValueOf = [] {
+  std::array<int16_t, 256> values = {};
   values.fill(-1);
   for (size_t i = 0; i < kDigits.size(); ++i) {
-    values[static_cast<uint8_t>(kDigits[i])] = static_cast<int8_t>(i);
+    values[static_cast<uint8_t>(kDigits[i])] = static_cast<int16_t>(i);
   }
   return values;
 }();
@@ -140,7 +140,8 @@ Feature ExtractFeature(const GrayImage& picture, const FaceCrop& crop) {
   std::vector<int> histograms(kHistograms, 0);
   const auto add = [&histograms](int row, int column, int bin, int weight) {
     if (row >= 0 && row < kCells && column >= 0 && column < kCells) {
-      histograms[static_cast<size_t>((row * kCells + column) * kBins + bin)] += weight;
+      const int index = (row * kCells + column) * kBins + bin;
+      histograms[static_cast<size_t>(index)] += weight;
     }
   };
   for (int y = 0; y < kSide; ++y) {
