@@ -15,7 +15,7 @@
 #include "registers.h"
 
 /// For what must not be a call: a tile lives in registers, its indices are constants. An instrumented build,
-/// which is in no hurry, defines them as nothing.
+/// which is in no hurry, lets them be calls.
 #ifndef TILE_INLINE
 #define TILE_INLINE inline __attribute__((always_inline))
 #define TILE_LAMBDA __attribute__((always_inline))
