@@ -4,7 +4,6 @@
 
 #include <algorithm>
 #include <climits>
-#include <ctime>
 #include <vector>
 
 #include "cvt_families.h"
@@ -173,20 +172,19 @@ TEST(Malformed, OddPictureHeights) {
   EXPECT_DEATH((cvtColor<CVT_I4202BGR, u8, 1, u8, 3, ECO_ENV_ARM>(src.matrix(4), &out)), "height % 2 == 0");
 }
 
-// Many rows of nothing: there is nothing to walk.
+// Many rows of nothing: there is nothing to walk. Walked, so many of so many widths would take minutes, which
+// the program is not given.
 template <ColorCvtType type, typename T, int ncSrc, int ncDst>
 void convertNothing() {
   constexpr int kHeight = 1 << 30, kFrameHeight = kHeight / 2 * 3;
-  for (const int width : {0, -2, -64}) {
+  for (int width = 0; width >= -64; width -= 2) {
     T none[1] = {};
     Image<T, ncSrc> src(width, isFrom420(type) ? kFrameHeight : kHeight, none);
     Image<T, ncDst> dst(width, isTo420(type) ? kFrameHeight : kHeight, none);
     if (width == 0 && (type == CVT_BGR2I420 || type == CVT_I4202BGR || type == CVT_YUV2GRAY)) {
       continue;  // an assertion
     }
-    const clock_t begin = clock();
-    EXPECT_EQ((cvtColor<type, T, ncSrc, T, ncDst, ECO_ENV_ARM>(src, &dst)), HPC_SUCCESS);
-    EXPECT_LT(clock() - begin, CLOCKS_PER_SEC / 5) << "width " << width;
+    EXPECT_EQ((cvtColor<type, T, ncSrc, T, ncDst, ECO_ENV_ARM>(src, &dst)), HPC_SUCCESS) << "width " << width;
   }
 }
 
