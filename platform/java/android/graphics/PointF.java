@@ -12,9 +12,27 @@ public class PointF {
         this.y = y;
     }
 
+    public final void set(float newX, float newY) {
+        x = newX;
+        y = newY;
+    }
+
+    public final void set(PointF p) {
+        x = p.x;
+        y = p.y;
+    }
+
+    public final void offset(float dx, float dy) {
+        x += dx;
+        y += dy;
+    }
+
     @Override
     public boolean equals(Object other) {
-        if (!(other instanceof PointF)) {
+        if (this == other) {
+            return true;
+        }
+        if (other == null || getClass() != other.getClass()) {
             return false;
         }
         PointF p = (PointF) other;
@@ -23,7 +41,12 @@ public class PointF {
 
     @Override
     public int hashCode() {
-        return Float.floatToIntBits(x) * 31 + Float.floatToIntBits(y);
+        return bits(x) * 31 + bits(y);
+    }
+
+    /** Both zeros hash alike, though they are not equal. */
+    private static int bits(float value) {
+        return value == 0 ? 0 : Float.floatToIntBits(value);
     }
 
     @Override
