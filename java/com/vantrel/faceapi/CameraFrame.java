@@ -15,14 +15,21 @@ import org.jetbrains.annotations.Nullable;
  * frame.fill(width, height, y, yRowStride, u, uRowStride, uPixelStride, v, vRowStride, vPixelStride, rotation);
  * }</pre>
  *
- * <p>Filling and reading are not for several threads at once; the other classes of this package hold the frame's
- * monitor while native code reads it.
+ * <p>A frame keeps its chroma order for life: NV21 unless it was made for NV12, however the planes that fill it lie in
+ * memory.
+ *
+ * <p>Any thread may use a frame: its methods, and those of this package that read it, wait for one another. They do so
+ * on a lock of the frame's own, so that holding the frame's monitor is neither needed nor of any effect. What an
+ * app writes to {@link #data()} itself is its own to order.
  */
 public final class CameraFrame {
     private static final byte[] NOTHING = {};
 
+    /** Held while the frame is read or filled. Who needs an {@link EngineHandle} too takes the handle first. */
+    final Object lock = new Object();
+
+    private final PixelFormat format;
     private byte[] data = NOTHING;
-    private PixelFormat format = PixelFormat.NV21;
     private int width;
     private int height;
     private int rotationDegrees;
@@ -31,8 +38,22 @@ public final class CameraFrame {
     private byte[] firstRow = NOTHING;
     private byte[] secondRow = NOTHING;
 
-    /** Creates a frame without content, which must be filled before use. */
-    public CameraFrame() {}
+    /** Creates an NV21 frame without content, which must be filled before use. */
+    public CameraFrame() {
+        this(PixelFormat.NV21);
+    }
+
+    /**
+     * Creates a frame without content, which must be filled before use.
+     *
+     * @param format what filling gives: {@link PixelFormat#NV21} or {@link PixelFormat#NV12}
+     * @throws NullPointerException when the format is null
+     * @throws IllegalArgumentException when the format is another
+     */
+    public CameraFrame(@NotNull PixelFormat format) {
+        Check.frameFormat("format", format);
+        this.format = format;
+    }
 
     /**
      * Creates a frame over an array that already is a packed frame. The array is not copied.
@@ -43,25 +64,20 @@ public final class CameraFrame {
      * @param height height in pixels, even
      * @param rotationDegrees by how much the frame must be turned clockwise to be upright: 0, 90, 180 or 270
      * @return the frame
+     * @throws NullPointerException when the data or the format is null
      * @throws IllegalArgumentException when anything does not fit
      */
     public static @NotNull CameraFrame of(
             byte @NotNull [] data, @NotNull PixelFormat format, int width, int height, int rotationDegrees) {
-        Check.notNull("data", data);
-        Check.notNull("format", format);
-        if (!format.isSemiPlanar()) {
-            throw new IllegalArgumentException("format must be NV21 or NV12, not " + format);
-        }
-        int bytes = Check.packedBytes(format, width, height);
-        Check.that(data.length == bytes, "data.length", "exactly " + bytes, data.length);
+        CameraFrame frame = new CameraFrame(format);
+        Check.packedImage("data", data, format, width, height);
         Check.rotation("rotationDegrees", rotationDegrees);
-        CameraFrame frame = new CameraFrame();
-        frame.set(data, format, width, height, rotationDegrees);
+        frame.set(data, width, height, rotationDegrees);
         return frame;
     }
 
     /**
-     * Fills a new frame from the planes of a YUV_420_888 image; see {@link #fill}.
+     * Fills a new NV21 frame from the planes of a YUV_420_888 image; see {@link #fill}.
      *
      * @param width width in pixels, even
      * @param height height in pixels, even
@@ -76,14 +92,18 @@ public final class CameraFrame {
      * @param rotationDegrees by how much the frame must be turned clockwise to be upright: 0, 90, 180 or 270
      * @param reuse an array to fill, of exactly {@code width * height * 3 / 2} bytes, or null for a new one
      * @return the frame
-     * @throws IllegalArgumentException when anything does not fit
+     * @throws NullPointerException when a plane is null
+     * @throws IllegalArgumentException when anything does not fit, or {@code reuse} is the memory of a plane
      */
     public static @NotNull CameraFrame fromPlanes(
             int width, int height, @NotNull ByteBuffer y, int yRowStride, @NotNull ByteBuffer u, int uRowStride,
             int uPixelStride, @NotNull ByteBuffer v, int vRowStride, int vPixelStride, int rotationDegrees,
             byte @Nullable [] reuse) {
         CameraFrame frame = new CameraFrame();
-        frame.data = Check.output("reuse", reuse, Check.packedBytes(PixelFormat.NV21, width, height));
+        if (reuse != null) {
+            Check.packedImage("reuse", reuse, PixelFormat.NV21, width, height);
+            frame.data = reuse;
+        }
         frame.fill(width, height, y, yRowStride, u, uRowStride, uPixelStride, v, vRowStride, vPixelStride,
                 rotationDegrees);
         return frame;
@@ -93,8 +113,7 @@ public final class CameraFrame {
      * Fills this frame from the planes of a YUV_420_888 image, as Camera2 and CameraX deliver them.
      *
      * <p>A plane begins at its buffer's position. The last row may end with its last sample, however long the row
-     * stride is. Positions are as before afterwards. Planes whose U and V alternate in memory, which is what most
-     * cameras deliver, are copied a row at a time and give NV21 or NV12 as they were; any others give NV21.
+     * stride is. Positions are as before afterwards. No other thread may use the buffers or write the planes meanwhile.
      *
      * @param newWidth width in pixels, even
      * @param newHeight height in pixels, even
@@ -107,35 +126,36 @@ public final class CameraFrame {
      * @param vRowStride bytes from one V row to the next
      * @param vPixelStride bytes from one V sample to the next
      * @param newRotationDegrees by how much the frame must be turned clockwise to be upright: 0, 90, 180 or 270
-     * @throws IllegalArgumentException when anything does not fit; the frame is as it was then
+     * @throws NullPointerException when a plane is null; the frame is as it was then
+     * @throws IllegalArgumentException when anything does not fit, or the frame's array is the memory of a plane; the
+     *     frame is as it was then
      */
-    public synchronized void fill(
+    public void fill(
             int newWidth, int newHeight, @NotNull ByteBuffer y, int yRowStride, @NotNull ByteBuffer u, int uRowStride,
             int uPixelStride, @NotNull ByteBuffer v, int vRowStride, int vPixelStride, int newRotationDegrees) {
-        int bytes = Check.packedBytes(PixelFormat.NV21, newWidth, newHeight);
+        int bytes = Check.packedBytes(format, newWidth, newHeight);
         int pairs = newWidth / 2;
         int chromaRows = newHeight / 2;
-        checkPlane("y", y, newHeight, newWidth, yRowStride, 1);
-        checkPlane("u", u, chromaRows, pairs, uRowStride, uPixelStride);
-        checkPlane("v", v, chromaRows, pairs, vRowStride, vPixelStride);
+        Check.plane("y", y, newHeight, newWidth, yRowStride, 1);
+        Check.plane("u", u, chromaRows, pairs, uRowStride, uPixelStride);
+        Check.plane("v", v, chromaRows, pairs, vRowStride, vPixelStride);
         Check.rotation("rotationDegrees", newRotationDegrees);
-
-        byte[] out = data.length == bytes ? data : new byte[bytes];
-        copyRows(y, yRowStride, newHeight, newWidth, out, 0, newWidth);
-
-        int chroma = newWidth * newHeight;
-        PixelFormat newFormat = PixelFormat.NV21;
-        boolean sameShape = uPixelStride == 2 && vPixelStride == 2 && uRowStride == vRowStride;
-        int reach = (chromaRows - 1) * uRowStride + newWidth - 1;
-        if (sameShape && isOneBehind(v, u, reach)) {
-            copyPairs(v, u, uRowStride, chromaRows, newWidth, out, chroma);
-        } else if (sameShape && isOneBehind(u, v, reach)) {
-            copyPairs(u, v, uRowStride, chromaRows, newWidth, out, chroma);
-            newFormat = PixelFormat.NV12;
-        } else {
-            interleave(v, vRowStride, vPixelStride, u, uRowStride, uPixelStride, chromaRows, pairs, out, chroma);
+        synchronized (lock) {
+            byte[] out = data.length == bytes ? data : new byte[bytes];
+            ByteBuffer luma = readable("y", y, out);
+            ByteBuffer first = readable("v", v, out);
+            ByteBuffer second = readable("u", u, out);
+            copyRows(luma, yRowStride, newHeight, newWidth, out);
+            int chroma = newWidth * newHeight;
+            if (format == PixelFormat.NV21) {
+                interleave(first, vRowStride, vPixelStride, second, uRowStride, uPixelStride, chromaRows, pairs, out,
+                        chroma);
+            } else {
+                interleave(second, uRowStride, uPixelStride, first, vRowStride, vPixelStride, chromaRows, pairs, out,
+                        chroma);
+            }
+            set(out, newWidth, newHeight, newRotationDegrees);
         }
-        set(out, newFormat, newWidth, newHeight, newRotationDegrees);
     }
 
     /**
@@ -143,8 +163,10 @@ public final class CameraFrame {
      *
      * @return the array; empty when the frame was never filled
      */
-    public synchronized byte @NotNull [] data() {
-        return data;
+    public byte @NotNull [] data() {
+        synchronized (lock) {
+            return data;
+        }
     }
 
     /**
@@ -152,7 +174,7 @@ public final class CameraFrame {
      *
      * @return {@link PixelFormat#NV21} or {@link PixelFormat#NV12}
      */
-    public synchronized @NotNull PixelFormat format() {
+    public @NotNull PixelFormat format() {
         return format;
     }
 
@@ -161,8 +183,10 @@ public final class CameraFrame {
      *
      * @return pixels; 0 when the frame was never filled
      */
-    public synchronized int width() {
-        return width;
+    public int width() {
+        synchronized (lock) {
+            return width;
+        }
     }
 
     /**
@@ -170,8 +194,10 @@ public final class CameraFrame {
      *
      * @return pixels; 0 when the frame was never filled
      */
-    public synchronized int height() {
-        return height;
+    public int height() {
+        synchronized (lock) {
+            return height;
+        }
     }
 
     /**
@@ -179,8 +205,10 @@ public final class CameraFrame {
      *
      * @return by how many degrees it must be turned clockwise to be upright
      */
-    public synchronized int rotationDegrees() {
-        return rotationDegrees;
+    public int rotationDegrees() {
+        synchronized (lock) {
+            return rotationDegrees;
+        }
     }
 
     void checkFilled() {
@@ -189,63 +217,39 @@ public final class CameraFrame {
         }
     }
 
-    private void set(byte[] newData, PixelFormat newFormat, int newWidth, int newHeight, int newRotationDegrees) {
+    private void set(byte[] newData, int newWidth, int newHeight, int newRotationDegrees) {
         data = newData;
-        format = newFormat;
         width = newWidth;
         height = newHeight;
         rotationDegrees = newRotationDegrees;
     }
 
-    private static void checkPlane(
-            String name, ByteBuffer plane, int rows, int samples, int rowStride, int pixelStride) {
-        Check.notNull(name, plane);
-        Check.positive(name + "PixelStride", pixelStride);
-        long row = (samples - 1L) * pixelStride + 1;
-        Check.that(rowStride >= row, name + "RowStride", "at least " + row, rowStride);
-        Check.length(name, plane.remaining(), (rows - 1L) * rowStride + row, "bytes from its position on");
-    }
-
     /**
-     * Whether, over {@code reach} bytes, the second plane is the first one byte further on: two views of the same
-     * pairs. It is the content that counts, since that is what a copy of the first plane would have to contain.
+     * The plane, which must not change while {@code out} is written: one that says it lies there is refused, and one
+     * that does not say where it lies, as read-only views of arrays, is copied.
      */
-    private static boolean isOneBehind(ByteBuffer first, ByteBuffer second, int reach) {
-        int firstPosition = first.position();
-        int firstLimit = first.limit();
-        int secondPosition = second.position();
-        int secondLimit = second.limit();
-        try {
-            first.position(firstPosition + 1);
-            first.limit(firstPosition + reach);
-            second.limit(secondPosition + reach - 1);
-            return first.equals(second);
-        } finally {
-            first.limit(firstLimit);
-            first.position(firstPosition);
-            second.limit(secondLimit);
-            second.position(secondPosition);
+    private static ByteBuffer readable(String name, ByteBuffer plane, byte[] out) {
+        if (plane.isDirect()) {
+            return plane;
         }
+        if (!plane.hasArray()) {
+            byte[] copy = new byte[plane.remaining()];
+            plane.duplicate().get(copy);
+            return ByteBuffer.wrap(copy);
+        }
+        if (plane.array() == out) {
+            throw new IllegalArgumentException(name + " must not lie in the array that is filled");
+        }
+        return plane;
     }
 
-    /** Copies rows of pairs that begin with {@code first}; the very last byte is only in {@code second}. */
-    private static void copyPairs(
-            ByteBuffer first, ByteBuffer second, int rowStride, int rows, int rowBytes, byte[] out, int offset) {
-        copyRows(first, rowStride, rows - 1, rowBytes, out, offset, rowBytes);
-        int last = (rows - 1) * rowStride;
-        int end = offset + rows * rowBytes;
-        copy(first, last, out, end - rowBytes, rowBytes - 1);
-        out[end - 1] = second.get(second.position() + last + rowBytes - 2);
-    }
-
-    private static void copyRows(
-            ByteBuffer plane, int rowStride, int rows, int rowBytes, byte[] out, int offset, int outStride) {
-        if (rowStride == rowBytes && outStride == rowBytes) {
-            copy(plane, 0, out, offset, rows * rowBytes);
+    private static void copyRows(ByteBuffer plane, int rowStride, int rows, int rowBytes, byte[] out) {
+        if (rowStride == rowBytes) {
+            copy(plane, 0, out, 0, rows * rowBytes);
             return;
         }
         for (int row = 0; row < rows; row++) {
-            copy(plane, row * rowStride, out, offset + row * outStride, rowBytes);
+            copy(plane, row * rowStride, out, row * rowBytes, rowBytes);
         }
     }
 

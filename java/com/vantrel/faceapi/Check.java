@@ -1,6 +1,15 @@
 package com.vantrel.faceapi;
 
-/** Argument checks whose messages name the argument, what is expected and what was given. */
+import java.nio.ByteBuffer;
+
+/**
+ * Argument checks, whose messages name the argument, what is expected and what was given; and every product of sizes
+ * in this package.
+ *
+ * <p>Native code is called with sizes that came through here and with no others. A product is formed of factors that
+ * were checked before, in 64 bits that hold it. Messages are made for failures only: checks of what is right allocate
+ * nothing.
+ */
 final class Check {
     private Check() {}
 
@@ -11,66 +20,98 @@ final class Check {
         return value;
     }
 
-    static void that(boolean holds, String name, String expected, long given) {
-        if (!holds) {
-            throw new IllegalArgumentException(name + " must be " + expected + ", not " + given);
-        }
+    /** What is thrown for an argument that is not as expected. */
+    static IllegalArgumentException refusal(String name, String expected, Object given) {
+        return new IllegalArgumentException(name + " must be " + expected + ", not " + given);
     }
 
     static void positive(String name, int value) {
-        that(value > 0, name, "above 0", value);
+        if (value <= 0) {
+            throw refusal(name, "above 0", value);
+        }
     }
 
     static void range(String name, long value, long lowest, long highest) {
         if (value < lowest || value > highest) {
-            that(false, name, "from " + lowest + " to " + highest, value);
-        }
-    }
-
-    static void evenAndPositive(String name, int value) {
-        that(value > 0 && value % 2 == 0, name, "even and above 0", value);
-    }
-
-    /** An array of at least {@code needed} elements, for what is described. */
-    static void length(String name, int length, long needed, String unit) {
-        if (length < needed) {
-            throw new IllegalArgumentException(
-                    name + " must have at least " + needed + " " + unit + ", not " + length);
+            throw refusal(name, "from " + lowest + " to " + highest, value);
         }
     }
 
     static void rotation(String name, int degrees) {
-        that(degrees == 0 || degrees == 90 || degrees == 180 || degrees == 270, name, "0, 90, 180 or 270", degrees);
+        if (degrees != 0 && degrees != 90 && degrees != 180 && degrees != 270) {
+            throw refusal(name, "0, 90, 180 or 270", degrees);
+        }
+    }
+
+    /** One of the two layouts of camera frames. */
+    static void frameFormat(String name, PixelFormat format) {
+        if (!notNull(name, format).isSemiPlanar()) {
+            throw refusal(name, "NV21 or NV12", format);
+        }
+    }
+
+    /** A width or height of an image of a format. */
+    static void side(String name, PixelFormat format, int length) {
+        if (length <= 0 || (format.isSemiPlanar() && length % 2 != 0)) {
+            throw refusal(name, format.isSemiPlanar() ? "even and above 0" : "above 0", length);
+        }
     }
 
     /** Width and height of an image of a format; returns its packed size in bytes. */
     static int packedBytes(PixelFormat format, int width, int height) {
-        size(format, width, height);
-        long bytes = format.isSemiPlanar() ? (long) width * height * 3 / 2 : format.rowBytes(width) * height;
-        if (bytes > Integer.MAX_VALUE) {
-            throw new IllegalArgumentException(
-                    "width x height must fit an array, not be " + width + " x " + height + " as " + format);
+        side("width", format, width);
+        side("height", format, height);
+        long pixels = (long) width * height;
+        // Compared before the pixels' bytes multiply it.
+        if (pixels <= Integer.MAX_VALUE) {
+            long bytes = format.isSemiPlanar() ? pixels + pixels / 2 : pixels * format.bytesPerPixel();
+            if (bytes <= Integer.MAX_VALUE) {
+                return (int) bytes;
+            }
         }
-        return (int) bytes;
+        throw new IllegalArgumentException(
+                "width x height must fit an array, not be " + width + " x " + height + " as " + format);
     }
 
-    /** An image in an array: sizes, stride and the array's length, of which one element is {@code unit} bytes. */
+    /** Width, height and stride of an image of a format; returns its bytes to behind the last pixel. */
+    static long imageBytes(PixelFormat format, int width, int height, int stride) {
+        side("width", format, width);
+        side("height", format, height);
+        long row = format.rowBytes(width);
+        if (stride < row) {
+            throw refusal("stride", "at least " + row + " (a row of " + width + " pixels as " + format + ")", stride);
+        }
+        long rows = format.isSemiPlanar() ? height + (long) height / 2 : height;
+        return (rows - 1) * stride + row;
+    }
+
+    /** An array that is exactly a packed image. */
+    static void packedImage(String name, byte[] image, PixelFormat format, int width, int height) {
+        exactly(name, notNull(name, image), packedBytes(format, width, height));
+    }
+
+    /** An image in an array, of which one element is {@code unit} bytes. */
     static void image(PixelFormat format, int width, int height, int stride, int length, int unit) {
-        notNull("format", format);
-        size(format, width, height);
-        that(stride >= format.rowBytes(width), "stride", "at least " + format.rowBytes(width) + " (a row of " + width
-                + " pixels as " + format + ")", stride);
-        long bytes = format.imageBytes(width, height, stride);
-        length("image", length, (bytes + unit - 1) / unit, unit == 1 ? "bytes" : "ints");
+        long bytes = imageBytes(notNull("format", format), width, height, stride);
+        long needed = (bytes + unit - 1) / unit;
+        if (length < needed) {
+            throw tooShort("image", needed, unit == 1 ? "bytes" : "ints", length);
+        }
     }
 
-    private static void size(PixelFormat format, int width, int height) {
-        if (format.isSemiPlanar()) {
-            evenAndPositive("width", width);
-            evenAndPositive("height", height);
-        } else {
-            positive("width", width);
-            positive("height", height);
+    /** A plane: samples at a distance in rows at a distance, from a buffer's position on. */
+    static void plane(String name, ByteBuffer plane, int rows, int samples, int rowStride, int pixelStride) {
+        notNull(name, plane);
+        if (pixelStride <= 0) {
+            throw refusal(name + "PixelStride", "above 0", pixelStride);
+        }
+        long row = (samples - 1L) * pixelStride + 1;
+        if (rowStride < row) {
+            throw refusal(name + "RowStride", "at least " + row, rowStride);
+        }
+        long bytes = (rows - 1L) * rowStride + row;
+        if (plane.remaining() < bytes) {
+            throw tooShort(name, bytes, "bytes from its position on", plane.remaining());
         }
     }
 
@@ -82,12 +123,25 @@ final class Check {
         range("y", y, 0, (long) height - h);
     }
 
-    /** {@code reuse} when it has the exact length, a new array when it is null. */
-    static byte[] output(String name, byte[] reuse, int bytes) {
+    /** {@code reuse} when it has the exact length and is not {@code src}, a new array when it is null. */
+    static byte[] output(byte[] reuse, int bytes, byte[] src) {
         if (reuse == null) {
             return new byte[bytes];
         }
-        that(reuse.length == bytes, name + ".length", "exactly " + bytes, reuse.length);
+        exactly("reuse", reuse, bytes);
+        if (reuse == src) {
+            throw new IllegalArgumentException("reuse must not be the source");
+        }
         return reuse;
+    }
+
+    private static void exactly(String name, byte[] array, int bytes) {
+        if (array.length != bytes) {
+            throw refusal(name + ".length", "exactly " + bytes, array.length);
+        }
+    }
+
+    private static IllegalArgumentException tooShort(String name, long needed, String unit, long given) {
+        return new IllegalArgumentException(name + " must have at least " + needed + " " + unit + ", not " + given);
     }
 }

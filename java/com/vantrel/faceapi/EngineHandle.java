@@ -44,7 +44,7 @@ final class EngineHandle extends PhantomReference<Object> {
     /** Takes charge of {@code value} for {@code owner}; the destroyer must not refer to the owner. */
     static EngineHandle own(Object owner, String kind, long value, Destroyer destroyer) {
         if (value == 0) {
-            throw new FaceEngineException("creating a " + kind, FaceEngineException.UNKNOWN_CODE);
+            throw new FaceEngineException("creating a " + kind);
         }
         EngineHandle handle = new EngineHandle(owner, kind, value, destroyer);
         LIVE.add(handle);

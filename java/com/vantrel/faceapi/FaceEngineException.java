@@ -2,7 +2,7 @@ package com.vantrel.faceapi;
 
 import org.jetbrains.annotations.NotNull;
 
-/** The face engine refused a call or failed. */
+/** The face engine refused a call or failed. The message has the name that {@link EngineProfile} gives the code. */
 public final class FaceEngineException extends RuntimeException {
     /** The code of a failure for which the engine's own code is not known, such as that of creating an object. */
     public static final int UNKNOWN_CODE = Integer.MIN_VALUE;
@@ -11,9 +11,15 @@ public final class FaceEngineException extends RuntimeException {
 
     private final int code;
 
-    FaceEngineException(@NotNull String call, int code) {
-        super(code == UNKNOWN_CODE ? call + " failed" : call + " failed with code " + code);
+    FaceEngineException(@NotNull String call, @NotNull EngineProfile profile, int code) {
+        super(call + " failed: " + profile.describe(code));
         this.code = code;
+    }
+
+    /** A failure whose code the engine keeps to itself. */
+    FaceEngineException(@NotNull String call) {
+        super(call + " failed");
+        code = UNKNOWN_CODE;
     }
 
     /**

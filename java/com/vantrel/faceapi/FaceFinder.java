@@ -13,10 +13,12 @@ abstract class FaceFinder implements AutoCloseable {
     /** The status array of native calls; used under the handle's monitor. */
     final int[] status = new int[1];
 
+    private final EngineProfile profile;
     private final String call;
 
-    FaceFinder(String kind, String call, long handle, EngineHandle.Destroyer destroyer) {
+    FaceFinder(String kind, String call, EngineProfile profile, long handle, EngineHandle.Destroyer destroyer) {
         this.handle = EngineHandle.own(this, kind, handle, destroyer);
+        this.profile = profile;
         this.call = call;
     }
 
@@ -30,11 +32,11 @@ abstract class FaceFinder implements AutoCloseable {
         Check.notNull("frame", frame);
         synchronized (handle) {
             long engineHandle = handle.value();
-            // Nobody refills the frame while native code reads it.
-            synchronized (frame) {
+            synchronized (frame.lock) {
                 frame.checkFilled();
-                return listOf(findInBytes(engineHandle, frame.data(), frame.format().engineValue(), frame.width(),
-                        frame.height(), frame.width(), frame.rotationDegrees()));
+                return listOf(findInBytes(engineHandle, frame.data(), profile.formatValue(frame.format()),
+                        frame.width(), frame.height(), frame.width(),
+                        profile.orientationValue(frame.rotationDegrees())));
             }
         }
     }
@@ -43,10 +45,10 @@ abstract class FaceFinder implements AutoCloseable {
             byte[] image, PixelFormat format, int width, int height, int stride, int rotationDegrees) {
         Check.notNull("image", image);
         Check.image(format, width, height, stride, image.length, 1);
-        Check.rotation("rotationDegrees", rotationDegrees);
+        int formatValue = profile.formatValue(format);
+        int orientation = profile.orientationValue(rotationDegrees);
         synchronized (handle) {
-            return listOf(findInBytes(
-                    handle.value(), image, format.engineValue(), width, height, stride, rotationDegrees));
+            return listOf(findInBytes(handle.value(), image, formatValue, width, height, stride, orientation));
         }
     }
 
@@ -54,10 +56,10 @@ abstract class FaceFinder implements AutoCloseable {
             int[] image, PixelFormat format, int width, int height, int stride, int rotationDegrees) {
         Check.notNull("image", image);
         Check.image(format, width, height, stride, image.length, Integer.BYTES);
-        Check.rotation("rotationDegrees", rotationDegrees);
+        int formatValue = profile.formatValue(format);
+        int orientation = profile.orientationValue(rotationDegrees);
         synchronized (handle) {
-            return listOf(findInInts(
-                    handle.value(), image, format.engineValue(), width, height, stride, rotationDegrees));
+            return listOf(findInInts(handle.value(), image, formatValue, width, height, stride, orientation));
         }
     }
 
@@ -69,7 +71,7 @@ abstract class FaceFinder implements AutoCloseable {
     /** Fails when the last native call left a code other than success. The caller holds the handle's monitor. */
     final void checkStatus(@NotNull String what) {
         if (status[0] != 0) {
-            throw new FaceEngineException(what, status[0]);
+            throw new FaceEngineException(what, profile, status[0]);
         }
     }
 

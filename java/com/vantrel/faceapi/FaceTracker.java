@@ -28,8 +28,21 @@ public final class FaceTracker extends FaceFinder {
      * @throws FaceEngineException when the engine cannot create it
      */
     public FaceTracker(@Nullable String modelPath, int config) {
-        super("face tracker", "face tracking", FaceLibrary.kyFaceCreateTracker(modelPath, 0, config),
-                FaceLibrary::kyFaceDestroyTracker);
+        this(modelPath, config, EngineProfile.OPEN);
+    }
+
+    /**
+     * Creates a tracker of an engine that has numbers of its own.
+     *
+     * @param modelPath the model file; null for the engine's built-in model
+     * @param config engine flags, 0 for the engine's defaults
+     * @param profile the engine's numbers
+     * @throws NullPointerException when the profile is null
+     * @throws FaceEngineException when the engine cannot create it
+     */
+    public FaceTracker(@Nullable String modelPath, int config, @NotNull EngineProfile profile) {
+        super("face tracker", "face tracking", Check.notNull("profile", profile),
+                FaceLibrary.kyFaceCreateTracker(modelPath, 0, config), FaceLibrary::kyFaceDestroyTracker);
     }
 
     /**
@@ -37,6 +50,8 @@ public final class FaceTracker extends FaceFinder {
      *
      * @param frame the frame; its rotation says how it is turned
      * @return the faces, in the frame's own coordinates; empty when there is none; not modifiable
+     * @throws NullPointerException when the frame is null
+     * @throws IllegalArgumentException when the engine does not take the frame's format or rotation
      * @throws FaceEngineException when the engine fails
      * @throws IllegalStateException when this tracker is closed or the frame was never filled
      */
@@ -54,7 +69,9 @@ public final class FaceTracker extends FaceFinder {
      * @param stride bytes from one row to the next
      * @param rotationDegrees by how much the image must be turned clockwise to be upright: 0, 90, 180 or 270
      * @return the faces, in the image's own coordinates; empty when there is none; not modifiable
-     * @throws IllegalArgumentException when a size, the stride, the rotation or the array's length does not fit
+     * @throws NullPointerException when the image or the format is null
+     * @throws IllegalArgumentException when a size, the stride, the rotation or the array's length does not fit, or
+     *     the engine does not take the format or the rotation
      * @throws FaceEngineException when the engine fails
      * @throws IllegalStateException when this tracker is closed
      */
@@ -74,7 +91,9 @@ public final class FaceTracker extends FaceFinder {
      * @param stride bytes from one row to the next
      * @param rotationDegrees by how much the image must be turned clockwise to be upright: 0, 90, 180 or 270
      * @return the faces, in the image's own coordinates; empty when there is none; not modifiable
-     * @throws IllegalArgumentException when a size, the stride, the rotation or the array's length does not fit
+     * @throws NullPointerException when the image or the format is null
+     * @throws IllegalArgumentException when a size, the stride, the rotation or the array's length does not fit, or
+     *     the engine does not take the format or the rotation
      * @throws FaceEngineException when the engine fails
      * @throws IllegalStateException when this tracker is closed
      */

@@ -15,9 +15,10 @@ public final class FaceVerifier implements AutoCloseable {
     /** The most landmark points that a face may have. */
     public static final int MAX_POINTS = 256;
 
-    /** What native code leaves in the status where the engine failed before it was written. */
+    /** What the status holds where native code did not write it. */
     private static final int NOT_WRITTEN = FaceEngineException.UNKNOWN_CODE;
 
+    private final EngineProfile profile;
     private final EngineHandle handle;
     private final int[] status = new int[1];
 
@@ -37,6 +38,19 @@ public final class FaceVerifier implements AutoCloseable {
      * @throws FaceEngineException when the engine cannot create it
      */
     public FaceVerifier(@Nullable String modelPath) {
+        this(modelPath, EngineProfile.OPEN);
+    }
+
+    /**
+     * Creates a verifier of an engine that has numbers of its own.
+     *
+     * @param modelPath the model file; null for the engine's built-in model
+     * @param profile the engine's numbers; of its orientations none is used
+     * @throws NullPointerException when the profile is null
+     * @throws FaceEngineException when the engine cannot create it
+     */
+    public FaceVerifier(@Nullable String modelPath, @NotNull EngineProfile profile) {
+        this.profile = Check.notNull("profile", profile);
         handle = EngineHandle.own(this, "face verifier", FaceLibrary.kyFaceCreateVerify(modelPath),
                 FaceLibrary::kyFaceDestroyVerify);
     }
@@ -70,9 +84,12 @@ public final class FaceVerifier implements AutoCloseable {
      * says: turn it first when its faces lie on their side.
      *
      * @param frame the frame
-     * @param face the face, in the frame's coordinates, with a rectangle and at most {@link #MAX_POINTS} points
+     * @param face the face, in the frame's coordinates, with a rectangle and at most {@link #MAX_POINTS} points. The
+     *     rectangle lies inside the frame: the engine refuses one whose middle does not
      * @return the feature
-     * @throws IllegalArgumentException when the face is incomplete
+     * @throws NullPointerException when the frame, the face, its rectangle, its points or one of them is null
+     * @throws IllegalArgumentException when the face has too many points, or the engine does not take the frame's
+     *     format
      * @throws FaceEngineException when the engine cannot extract a feature
      * @throws IllegalStateException when this verifier is closed or the frame was never filled
      */
@@ -81,11 +98,12 @@ public final class FaceVerifier implements AutoCloseable {
         check(face);
         synchronized (handle) {
             long engineHandle = handle.value();
-            synchronized (frame) {
+            synchronized (frame.lock) {
                 frame.checkFilled();
                 status[0] = NOT_WRITTEN;
-                return extracted(FaceLibrary.kyFaceGetFeatureBytes(engineHandle, frame.data(),
-                        frame.format().engineValue(), frame.width(), frame.height(), frame.width(), face, status));
+                int format = profile.formatValue(frame.format());
+                return extracted(FaceLibrary.kyFaceGetFeatureBytes(engineHandle, frame.data(), format, frame.width(),
+                        frame.height(), frame.width(), face, status));
             }
         }
     }
@@ -98,10 +116,13 @@ public final class FaceVerifier implements AutoCloseable {
      * @param width image width in pixels
      * @param height image height in pixels
      * @param stride bytes from one row to the next
-     * @param face the face, in the image's coordinates, with a rectangle and at most {@link #MAX_POINTS} points
+     * @param face the face, in the image's coordinates, with a rectangle and at most {@link #MAX_POINTS} points. The
+     *     rectangle lies inside the image: the engine refuses one whose middle does not
      * @return the feature
-     * @throws IllegalArgumentException when a size, the stride or the array's length does not fit, or the face is
-     *     incomplete
+     * @throws NullPointerException when the image, the format, the face, its rectangle, its points or one of them is
+     *     null
+     * @throws IllegalArgumentException when a size, the stride or the array's length does not fit, the face has too
+     *     many points, or the engine does not take the format
      * @throws FaceEngineException when the engine cannot extract a feature
      * @throws IllegalStateException when this verifier is closed
      */
@@ -111,11 +132,12 @@ public final class FaceVerifier implements AutoCloseable {
         Check.notNull("image", image);
         Check.image(format, width, height, stride, image.length, 1);
         check(face);
+        int formatValue = profile.formatValue(format);
         synchronized (handle) {
             long engineHandle = handle.value();
             status[0] = NOT_WRITTEN;
             return extracted(FaceLibrary.kyFaceGetFeatureBytes(
-                    engineHandle, image, format.engineValue(), width, height, stride, face, status));
+                    engineHandle, image, formatValue, width, height, stride, face, status));
         }
     }
 
@@ -127,10 +149,13 @@ public final class FaceVerifier implements AutoCloseable {
      * @param width image width in pixels
      * @param height image height in pixels
      * @param stride bytes from one row to the next
-     * @param face the face, in the image's coordinates, with a rectangle and at most {@link #MAX_POINTS} points
+     * @param face the face, in the image's coordinates, with a rectangle and at most {@link #MAX_POINTS} points. The
+     *     rectangle lies inside the image: the engine refuses one whose middle does not
      * @return the feature
-     * @throws IllegalArgumentException when a size, the stride or the array's length does not fit, or the face is
-     *     incomplete
+     * @throws NullPointerException when the image, the format, the face, its rectangle, its points or one of them is
+     *     null
+     * @throws IllegalArgumentException when a size, the stride or the array's length does not fit, the face has too
+     *     many points, or the engine does not take the format
      * @throws FaceEngineException when the engine cannot extract a feature
      * @throws IllegalStateException when this verifier is closed
      */
@@ -140,33 +165,35 @@ public final class FaceVerifier implements AutoCloseable {
         Check.notNull("image", image);
         Check.image(format, width, height, stride, image.length, Integer.BYTES);
         check(face);
+        int formatValue = profile.formatValue(format);
         synchronized (handle) {
             long engineHandle = handle.value();
             status[0] = NOT_WRITTEN;
             return extracted(FaceLibrary.kyFaceGetFeatureInts(
-                    engineHandle, image, format.engineValue(), width, height, stride, face, status));
+                    engineHandle, image, formatValue, width, height, stride, face, status));
         }
     }
 
     /**
      * Compares two features.
      *
-     * @param feature1 a feature of this verifier's version
-     * @param feature2 the other
+     * @param feature1 a feature of this verifier's version; copied first, so that other threads may write it
+     * @param feature2 the other; copied too
      * @return their similarity; the larger, the more alike
+     * @throws NullPointerException when a feature is null
      * @throws IllegalArgumentException when an array is no feature by its form
      * @throws FaceEngineException when the engine cannot read or compare them
      * @throws IllegalStateException when this verifier is closed
      */
     public float compare(byte @NotNull [] feature1, byte @NotNull [] feature2) {
-        check("feature1", feature1);
-        check("feature2", feature2);
+        byte[] text1 = checkedCopy("feature1", feature1);
+        byte[] text2 = checkedCopy("feature2", feature2);
         synchronized (handle) {
             long engineHandle = handle.value();
             status[0] = NOT_WRITTEN;
-            float score = FaceLibrary.kyFaceCompareFeature(engineHandle, feature1, feature2, status);
+            float score = FaceLibrary.kyFaceCompareFeature(engineHandle, text1, text2, status);
             if (status[0] != 0) {
-                throw new FaceEngineException("comparing features", status[0]);
+                throw new FaceEngineException("comparing features", profile, status[0]);
             }
             return score;
         }
@@ -178,9 +205,9 @@ public final class FaceVerifier implements AutoCloseable {
         handle.destroy();
     }
 
-    private byte[] extracted(byte[] feature) {
+    private static byte[] extracted(byte[] feature) {
         if (feature == null) {
-            throw new FaceEngineException("extracting a feature", status[0]);
+            throw new FaceEngineException("extracting a feature");
         }
         return feature;
     }
@@ -188,17 +215,26 @@ public final class FaceVerifier implements AutoCloseable {
     private static void check(FaceInfo face) {
         Check.notNull("face", face);
         Check.notNull("face.faceRect", face.faceRect);
-        Check.notNull("face.facePoints", face.facePoints);
-        Check.range("face.facePoints.length", face.facePoints.length, 0, MAX_POINTS);
-        for (PointF point : face.facePoints) {
+        PointF[] points = Check.notNull("face.facePoints", face.facePoints);
+        Check.range("face.facePoints.length", points.length, 0, MAX_POINTS);
+        for (PointF point : points) {
             Check.notNull("a point of face.facePoints", point);
         }
     }
 
-    /** The engine reads a feature up to its terminating zero: without one it would read on. */
-    private static void check(String name, byte[] feature) {
-        Check.notNull(name, feature);
-        Check.length(name, feature.length, 1, "bytes");
-        Check.that(feature[feature.length - 1] == 0, name + "'s last byte", "0", feature[feature.length - 1]);
+    /**
+     * The engine reads a feature up to its terminating zero: without one it would read on. What it is given is what was
+     * checked, whoever writes the caller's array meanwhile.
+     */
+    private static byte[] checkedCopy(String name, byte[] feature) {
+        byte[] copy = Check.notNull(name, feature).clone();
+        if (copy.length == 0) {
+            throw Check.refusal(name + ".length", "above 0", 0);
+        }
+        byte last = copy[copy.length - 1];
+        if (last != 0) {
+            throw Check.refusal(name + "'s last byte", "0", last);
+        }
+        return copy;
     }
 }

@@ -75,12 +75,9 @@ public final class Images {
      */
     public static byte @NotNull [] convert(
             byte @NotNull [] src, int width, int height, @NotNull Conversion conversion, byte @Nullable [] reuse) {
-        Check.notNull("src", src);
         Check.notNull("conversion", conversion);
-        int sourceBytes = Check.packedBytes(conversion.source, width, height);
-        int resultBytes = Check.packedBytes(conversion.result, width, height);
-        Check.that(src.length == sourceBytes, "src.length", "exactly " + sourceBytes, src.length);
-        byte[] out = distinct("reuse", Check.output("reuse", reuse, resultBytes), src);
+        Check.packedImage("src", src, conversion.source, width, height);
+        byte[] out = Check.output(reuse, Check.packedBytes(conversion.result, width, height), src);
         FaceLibrary.convertColorSpace(src, width, height, out, conversion.code);
         return out;
     }
@@ -102,16 +99,15 @@ public final class Images {
     public static byte @NotNull [] crop(
             @NotNull CameraFrame frame, int x, int y, int w, int h, byte @Nullable [] reuse) {
         Check.notNull("frame", frame);
-        synchronized (frame) {
+        synchronized (frame.lock) {
             frame.checkFilled();
-            if (!frame.format().isLayoutOf(PixelFormat.NV21)) {
+            if (frame.format() != PixelFormat.NV21) {
                 throw new IllegalArgumentException("frame must be NV21, not " + frame.format());
             }
             Check.rectangle(x, y, w, h, frame.width(), frame.height());
             int evenW = evenLength(x, w);
             int evenH = evenLength(y, h);
-            byte[] out = distinct("reuse",
-                    Check.output("reuse", reuse, Check.packedBytes(PixelFormat.RGBA, evenW, evenH)), frame.data());
+            byte[] out = Check.output(reuse, Check.packedBytes(PixelFormat.RGBA, evenW, evenH), frame.data());
             FaceLibrary.cropNv21Data(
                     frame.data(), frame.width(), frame.height(), x & ~1, y & ~1, evenW, evenH, out);
             return out;
@@ -124,8 +120,12 @@ public final class Images {
      * @param start where the side starts, not negative
      * @param length its length, above 0
      * @return the even length, that of {@code length} or up to two more
+     * @throws IllegalArgumentException when one is out of its range, or the even end beyond that of an int
      */
     public static int evenLength(int start, int length) {
+        Check.range("start", start, 0, Integer.MAX_VALUE);
+        Check.positive("length", length);
+        Check.range("start + length", (long) start + length, 1, Integer.MAX_VALUE - 1);
         return (start & 1) + length + ((start + length) & 1);
     }
 
@@ -142,11 +142,11 @@ public final class Images {
      */
     public static byte @NotNull [] rotate(
             byte @NotNull [] src, int width, int height, int degrees, byte @Nullable [] reuse) {
-        Check.notNull("src", src);
-        int bytes = Check.packedBytes(PixelFormat.BGR, width, height);
-        Check.that(src.length == bytes, "src.length", "exactly " + bytes, src.length);
-        Check.that(degrees == 90 || degrees == 180 || degrees == 270, "degrees", "90, 180 or 270", degrees);
-        byte[] out = distinct("reuse", Check.output("reuse", reuse, bytes), src);
+        Check.packedImage("src", src, PixelFormat.BGR, width, height);
+        if (degrees != 90 && degrees != 180 && degrees != 270) {
+            throw Check.refusal("degrees", "90, 180 or 270", degrees);
+        }
+        byte[] out = Check.output(reuse, src.length, src);
         FaceLibrary.rotateBGR(src, width, height, out, degrees, OUT_SIZE.get());
         return out;
     }
@@ -173,7 +173,7 @@ public final class Images {
      */
     public static float brightness(@NotNull CameraFrame frame, int x, int y, int w, int h) {
         Check.notNull("frame", frame);
-        synchronized (frame) {
+        synchronized (frame.lock) {
             frame.checkFilled();
             Check.rectangle(x, y, w, h, frame.width(), frame.height());
             // The native method clips the height by x + h. Given a height that holds both, it clips nothing here.
@@ -203,8 +203,8 @@ public final class Images {
         Check.notNull("image", image);
         Check.image(format, width, height, stride, image.length, 1);
         Check.rectangle(x, y, w, h, width, height);
-        boolean rgba = format.isLayoutOf(PixelFormat.RGBA);
-        if (!rgba && !format.isLayoutOf(PixelFormat.BGRA)) {
+        boolean rgba = format == PixelFormat.RGBA;
+        if (!rgba && format != PixelFormat.BGRA) {
             throw new IllegalArgumentException("format must be RGBA or BGRA, not " + format);
         }
         return FaceLibrary.faceBrightEvaluate(image,
@@ -226,8 +226,8 @@ public final class Images {
             @NotNull Bitmap bitmap, @NotNull PixelFormat format, byte @Nullable [] reuse) {
         Check.notNull("bitmap", bitmap);
         Check.notNull("format", format);
-        boolean bgra = format.isLayoutOf(PixelFormat.BGRA);
-        if (!bgra && !format.isLayoutOf(PixelFormat.BGR)) {
+        boolean bgra = format == PixelFormat.BGRA;
+        if (!bgra && format != PixelFormat.BGR) {
             throw new IllegalArgumentException("format must be BGRA or BGR, not " + format);
         }
         if (bitmap.isRecycled()) {
@@ -239,7 +239,7 @@ public final class Images {
         int width = bitmap.getWidth();
         int height = bitmap.getHeight();
         int rowBytes = Check.packedBytes(PixelFormat.RGBA, width, 1);
-        byte[] out = Check.output("reuse", reuse, Check.packedBytes(format, width, height));
+        byte[] out = Check.output(reuse, Check.packedBytes(format, width, height), null);
         if (bitmap.getRowBytes() != rowBytes) {
             // The native methods take rows as packed; this one is not, so its rows are moved together first.
             stridedPixels(bitmap, bgra ? 4 : 3, out);
@@ -268,12 +268,5 @@ public final class Images {
                 to += bytesPerPixel;
             }
         }
-    }
-
-    private static byte[] distinct(String name, byte[] out, byte[] src) {
-        if (out == src) {
-            throw new IllegalArgumentException(name + " must not be the source");
-        }
-        return out;
     }
 }

@@ -1,61 +1,28 @@
 package com.vantrel.faceapi;
 
-import org.jetbrains.annotations.NotNull;
-
-/** How the pixels of an image are laid out, with the face engine's number for it. */
-public final class PixelFormat {
+/** How the pixels of an image are laid out in memory. What an engine calls a layout is {@link EngineProfile}'s. */
+public enum PixelFormat {
     /** Gray, one byte a pixel. */
-    public static final PixelFormat GRAY = packed("GRAY", EngineValues.PIXEL_GRAY, 1);
+    GRAY(1, false),
     /** Three bytes a pixel, blue first. */
-    public static final PixelFormat BGR = packed("BGR", EngineValues.PIXEL_BGR, 3);
+    BGR(3, false),
     /** Three bytes a pixel, red first. */
-    public static final PixelFormat RGB = packed("RGB", EngineValues.PIXEL_RGB, 3);
+    RGB(3, false),
     /** Four bytes a pixel, blue first, alpha last. */
-    public static final PixelFormat BGRA = packed("BGRA", EngineValues.PIXEL_BGRA, 4);
+    BGRA(4, false),
     /** Four bytes a pixel, red first, alpha last. */
-    public static final PixelFormat RGBA = packed("RGBA", EngineValues.PIXEL_RGBA, 4);
+    RGBA(4, false),
     /** Luma rows, then half as many rows of V, U pairs; even width and height. */
-    public static final PixelFormat NV21 = semiPlanar("NV21", EngineValues.PIXEL_NV21);
+    NV21(1, true),
     /** Luma rows, then half as many rows of U, V pairs; even width and height. */
-    public static final PixelFormat NV12 = semiPlanar("NV12", EngineValues.PIXEL_NV12);
+    NV12(1, true);
 
-    private final String name;
-    private final int engineValue;
     private final int bytesPerPixel;
     private final boolean semiPlanar;
 
-    private PixelFormat(String name, int engineValue, int bytesPerPixel, boolean semiPlanar) {
-        this.name = name;
-        this.engineValue = engineValue;
+    PixelFormat(int bytesPerPixel, boolean semiPlanar) {
         this.bytesPerPixel = bytesPerPixel;
         this.semiPlanar = semiPlanar;
-    }
-
-    private static PixelFormat packed(String name, int engineValue, int bytesPerPixel) {
-        return new PixelFormat(name, engineValue, bytesPerPixel, false);
-    }
-
-    private static PixelFormat semiPlanar(String name, int engineValue) {
-        return new PixelFormat(name, engineValue, 1, true);
-    }
-
-    /**
-     * Returns the same layout under another number, for an engine that counts its formats differently.
-     *
-     * @param value the engine's number for this layout
-     * @return the format with that number
-     */
-    public @NotNull PixelFormat withEngineValue(int value) {
-        return new PixelFormat(name, value, bytesPerPixel, semiPlanar);
-    }
-
-    /**
-     * Returns the engine's number for this format.
-     *
-     * @return the number that native calls are given
-     */
-    public int engineValue() {
-        return engineValue;
     }
 
     /**
@@ -63,8 +30,10 @@ public final class PixelFormat {
      *
      * @param width image width in pixels
      * @return bytes from the first to behind the last pixel of a row
+     * @throws IllegalArgumentException when the width is below 1, or odd where it must be even
      */
     public long rowBytes(int width) {
+        Check.side("width", this, width);
         return (long) width * bytesPerPixel;
     }
 
@@ -75,27 +44,20 @@ public final class PixelFormat {
      * @param height image height in pixels
      * @param stride bytes from one row to the next
      * @return bytes from the first to behind the last pixel
+     * @throws IllegalArgumentException when a side is below 1, or odd where it must be even, or the stride is shorter
+     *     than a row
      */
     public long imageBytes(int width, int height, int stride) {
-        long rows = semiPlanar ? height + (long) height / 2 : height;
-        return (rows - 1) * stride + rowBytes(width);
+        return Check.imageBytes(this, width, height, stride);
     }
 
+    /** Whether this is one of the two 4:2:0 layouts of camera frames. */
     boolean isSemiPlanar() {
         return semiPlanar;
     }
 
+    /** Bytes of a pixel; of a pixel's luma in the 4:2:0 layouts. */
     int bytesPerPixel() {
         return bytesPerPixel;
-    }
-
-    /** Whether both describe the same layout, whatever the engine's numbers. */
-    boolean isLayoutOf(PixelFormat other) {
-        return name.equals(other.name);
-    }
-
-    @Override
-    public String toString() {
-        return name;
     }
 }

@@ -94,7 +94,15 @@ public final class CameraFrameTest {
 
     @Test
     public void everyShapeGivesTheSameFrameAsAByteByByteCopy() {
-        CameraFrame frame = new CameraFrame();
+        for (PixelFormat format : new PixelFormat[] {PixelFormat.NV21, PixelFormat.NV12}) {
+            CameraFrame frame = new CameraFrame(format);
+            assertSame(format, frame.format());
+            everyShape(frame);
+            assertSame(format, frame.format());
+        }
+    }
+
+    private void everyShape(CameraFrame frame) {
         int[][] sizes = {{2, 2}, {4, 2}, {2, 6}, {6, 4}, {34, 10}, {64, 48}};
         for (int[] size : sizes) {
             int width = size[0];
@@ -123,10 +131,6 @@ public final class CameraFrameTest {
         String what = width + "x" + height + "+" + padding + ", pixel stride " + pixelStride + ", " + layout
                 + ", position " + position + (direct ? ", direct" : ", heap");
         boolean vFirst = frame.format() == PixelFormat.NV21;
-        // A single chroma sample a plane has no neighbour that tells whose memory it shares.
-        if (layout != Layout.SEPARATE && (width > 2 || height > 2)) {
-            assertEquals(what, layout == Layout.V_FIRST, vFirst);
-        }
         assertArrayEquals(what, expected(planes, width, height, vFirst), frame.data());
         assertEquals(what, position, planes.y.position());
         assertEquals(what, layout == Layout.V_FIRST ? position + 1 : position, planes.u.position());
@@ -148,6 +152,87 @@ public final class CameraFrameTest {
         fill(frame, planes, 16, 8, 0);
         assertEquals(PixelFormat.NV21, frame.format());
         assertArrayEquals(expected(planes, 16, 8, true), frame.data());
+    }
+
+    @Test
+    public void whatChromaHoldsDecidesNothing() {
+        for (PixelFormat format : new PixelFormat[] {PixelFormat.NV21, PixelFormat.NV12}) {
+            for (Layout layout : Layout.values()) {
+                for (boolean direct : new boolean[] {false, true}) {
+                    Planes p = planes(16, 8, 4, 2, layout, direct, 3);
+                    for (ByteBuffer chroma : new ByteBuffer[] {p.u, p.v}) {
+                        for (int i = chroma.position(); i < chroma.limit(); i++) {
+                            chroma.put(i, (byte) 77);
+                        }
+                    }
+                    CameraFrame frame = new CameraFrame(format);
+                    fill(frame, p, 16, 8, 0);
+                    assertSame(format, frame.format());
+                    assertArrayEquals(expected(p, 16, 8, format == PixelFormat.NV21), frame.data());
+                }
+            }
+            ByteBuffer one = buffer(64, true); // U and V are one buffer: gray
+            ByteBuffer y = buffer(16 * 8, true);
+            CameraFrame frame = new CameraFrame(format);
+            frame.fill(16, 8, y, 16, one, 16, 2, one, 16, 2, 0);
+            for (int i = 0; i < 32; i++) {
+                assertEquals(one.get(i / 8 * 16 + i % 8 * 2), frame.data()[16 * 8 + 2 * i]);
+                assertEquals(one.get(i / 8 * 16 + i % 8 * 2), frame.data()[16 * 8 + 2 * i + 1]);
+            }
+        }
+        refused("format", () -> new CameraFrame(PixelFormat.GRAY));
+    }
+
+    @Test
+    public void sizesAreCheckedBeforeAnythingIsMade() {
+        ByteBuffer few = ByteBuffer.allocate(16);
+        refused("y must", () -> CameraFrame.fromPlanes(37836, 37836, few, 37836, few, 18918, 1, few, 18918, 1, 0, null));
+        int most = Integer.MAX_VALUE - 1;
+        refused("width x height", () ->
+                CameraFrame.fromPlanes(most, most, few, most, few, most / 2, 1, few, most / 2, 1, 0, null));
+        refused("width x height", () -> CameraFrame.of(new byte[6], PixelFormat.NV21, most, most, 0));
+        refused("reuse.length", () -> CameraFrame.fromPlanes(2, 2, few, 2, few, 1, 1, few, 1, 1, 0, new byte[7]));
+    }
+
+    /** Planes in the very array that is to be filled: refused, or read before it is written. */
+    @Test
+    public void theArrayThatIsFilledIsNoPlane() {
+        byte[] memory = new byte[16 * 8 * 3];
+        random.nextBytes(memory);
+        byte[] before = memory.clone();
+        ByteBuffer far = buffer(16 * 8, false);
+        ByteBuffer mine = ByteBuffer.wrap(memory);
+        Runnable[] fills = {
+            () -> CameraFrame.fromPlanes(16, 16, mine, 16, far, 8, 1, far, 8, 1, 0, memory),
+            () -> CameraFrame.fromPlanes(16, 16, mine.slice(), 16, far, 8, 1, far, 8, 1, 0, memory),
+            () -> CameraFrame.of(memory, PixelFormat.NV12, 16, 16, 0)
+                    .fill(16, 16, mine, 16, mine, 8, 1, mine, 8, 1, 0),
+        };
+        for (Runnable fill : fills) {
+            refused("y must not lie", fill);
+            assertArrayEquals(before, memory);
+        }
+        ByteBuffer wide = buffer(16 * 16, true);
+        refused("u must not lie", () ->
+                CameraFrame.fromPlanes(16, 16, wide, 16, mine, 8, 1, far, 8, 1, 0, memory));
+        refused("v must not lie", () ->
+                CameraFrame.fromPlanes(16, 16, wide, 16, far, 8, 1, mine, 8, 1, 0, memory));
+        assertArrayEquals(before, memory);
+
+        // A view that does not say that it is one of the array.
+        Planes p = new Planes();
+        p.y = window(ByteBuffer.wrap(before), 100, 256);
+        p.u = window(ByteBuffer.wrap(before), 9, 64);
+        p.v = window(ByteBuffer.wrap(before), 300, 64);
+        p.yStride = 16;
+        p.chromaStride = 8;
+        p.pixelStride = 1;
+        byte[] want = expected(p, 16, 16, true);
+        ByteBuffer hidden = mine.asReadOnlyBuffer();
+        CameraFrame frame = CameraFrame.fromPlanes(16, 16, window(hidden, 100, 256), 16, window(hidden, 9, 64), 8, 1,
+                window(hidden, 300, 64), 8, 1, 0, memory);
+        assertSame(memory, frame.data());
+        assertArrayEquals(want, memory);
     }
 
     @Test

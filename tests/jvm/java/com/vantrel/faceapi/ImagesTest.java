@@ -4,6 +4,7 @@ import static com.vantrel.faceapi.CameraFrameTest.refused;
 import static org.junit.Assert.assertArrayEquals;
 import static org.junit.Assert.assertEquals;
 import static org.junit.Assert.assertSame;
+import static org.junit.Assert.assertTrue;
 import static org.junit.Assert.fail;
 
 import android.graphics.Bitmap;
@@ -76,6 +77,62 @@ public final class ImagesTest {
         } catch (NullPointerException right) {
             assertEquals("src is null", right.getMessage());
         }
+    }
+
+    /** Sizes whose product is 0, negative or small once it no longer fits. */
+    @Test
+    public void sizesThatNothingHoldsAreRefused() {
+        int most = Integer.MAX_VALUE;
+        refused("width x height", () ->
+                Images.convert(new byte[4], most, most, Images.Conversion.BGRA_TO_RGBA, null));
+        refused("width x height", () ->
+                Images.convert(new byte[16], most - 1, most - 1, Images.Conversion.RGBA_TO_NV12, null));
+        refused("width x height", () -> Images.rotate(new byte[3], most, most, 90, null));
+        for (int width : new int[] {2, 4, 1 << 15, 1 << 16, 1 << 30, most - 1}) {
+            for (int height : new int[] {2, 4, 1 << 15, 1 << 16, 1 << 30, most - 1}) {
+                for (Images.Conversion conversion : Images.Conversion.values()) {
+                    refusedSize(() -> Images.convert(new byte[4], width, height, conversion, null));
+                    refusedSize(() -> Images.convert(new byte[0], width, height, conversion, null));
+                }
+                refusedSize(() -> Images.rotate(new byte[3], width, height, 90, null));
+                refusedSize(() -> CameraFrame.of(new byte[0], PixelFormat.NV21, width, height, 0));
+            }
+        }
+        byte[] pixels = new byte[64];
+        refused("image", () ->
+                Images.lightness(pixels, PixelFormat.RGBA, (1 << 29) - 1, most, most, 0, 0, 1, 1));
+        refused("stride", () ->
+                Images.lightness(pixels, PixelFormat.RGBA, most, most, most, 0, 0, 1, 1));
+        for (PixelFormat format : PixelFormat.values()) {
+            long bytes = format.imageBytes(1 << 28, most - 1, most);
+            assertTrue(format.name(), bytes > most);
+            refused("width", () -> format.rowBytes(0));
+            refused("width", () -> format.imageBytes(-2, 2, 2));
+            refused("height", () -> format.imageBytes(2, most + 1, 8));
+            refused("stride", () -> format.imageBytes(2, 2, 1));
+        }
+    }
+
+    private static void refusedSize(Runnable call) {
+        try {
+            call.run();
+        } catch (IllegalArgumentException right) {
+            assertTrue(right.getMessage(), right.getMessage().matches("(width x height|src.length|data.length) .*"));
+            return;
+        }
+        fail("taken");
+    }
+
+    @Test
+    public void evenLengthsAreThoseOfAnInt() {
+        int most = Integer.MAX_VALUE;
+        assertEquals(most - 1, Images.evenLength(0, most - 1));
+        assertEquals(most - 1, Images.evenLength(1, most - 2));
+        assertEquals(2, Images.evenLength(most - 3, 2));
+        refused("start + length", () -> Images.evenLength(most, most));
+        refused("start + length", () -> Images.evenLength(0, most));
+        refused("start", () -> Images.evenLength(-1, 2));
+        refused("length", () -> Images.evenLength(0, 0));
     }
 
     @Test

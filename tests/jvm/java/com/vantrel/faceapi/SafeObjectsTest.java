@@ -10,6 +10,7 @@ import static org.junit.Assert.fail;
 import android.graphics.PointF;
 import android.graphics.Rect;
 import com.vantrel.faceapi.model.FaceInfo;
+import java.lang.reflect.Field;
 import java.util.ArrayList;
 import java.util.List;
 import java.util.concurrent.Callable;
@@ -18,6 +19,8 @@ import java.util.concurrent.ExecutionException;
 import java.util.concurrent.ExecutorService;
 import java.util.concurrent.Executors;
 import java.util.concurrent.Future;
+import java.util.concurrent.TimeUnit;
+import java.util.concurrent.atomic.AtomicReference;
 import org.junit.BeforeClass;
 import org.junit.Test;
 
@@ -157,13 +160,16 @@ public final class SafeObjectsTest {
                 fail("the engine took a threshold of 1000");
             } catch (FaceEngineException right) {
                 assertEquals(EngineValues.ERROR_RANGE, right.code());
+                assertEquals("setting the threshold failed: ERROR_RANGE (code -8)", right.getMessage());
             }
-            try {
-                detector.detect(new byte[64], PixelFormat.GRAY.withEngineValue(99), 8, 8, 8, 0);
-                fail("the engine took pixel format 99");
-            } catch (FaceEngineException right) {
-                assertEquals(EngineValues.ERROR_PIXEL_FORMAT, right.code());
-            }
+        }
+        EngineProfile wrong = new EngineProfile.Builder().format(PixelFormat.GRAY, 99).orientation(0, 0).build();
+        try (FaceDetector detector = new FaceDetector(null, 0, wrong)) {
+            detector.detect(new byte[64], PixelFormat.GRAY, 8, 8, 8, 0);
+            fail("the engine took pixel format 99");
+        } catch (FaceEngineException right) {
+            assertEquals(EngineValues.ERROR_PIXEL_FORMAT, right.code());
+            assertEquals("face detection failed: code " + right.code(), right.getMessage());
         }
         try {
             new FaceDetector("/there is no such model", 0);
@@ -180,6 +186,72 @@ public final class SafeObjectsTest {
             fail("a frame without content was taken");
         } catch (IllegalStateException right) {
             assertEquals("the frame was never filled", right.getMessage());
+        }
+    }
+
+    /** Two threads on one frame, of which one holds the frame's monitor all the while. */
+    @Test
+    public void aFramesMonitorLocksNothing() throws Exception {
+        CameraFrame frame = CameraFrame.of(new byte[96 * 64 * 3 / 2], PixelFormat.NV21, 96, 64, 0);
+        ExecutorService threads = Executors.newFixedThreadPool(2);
+        try (FaceDetector detector = new FaceDetector(); FaceVerifier verifier = new FaceVerifier()) {
+            CountDownLatch held = new CountDownLatch(1);
+            Future<?> holder = threads.submit(() -> {
+                synchronized (frame) {
+                    held.countDown();
+                    for (int i = 0; i < 200; i++) {
+                        detector.detect(frame);
+                        Images.brightness(frame, 0, 0, 96, 64);
+                    }
+                }
+            });
+            Future<?> other = threads.submit(() -> {
+                held.await();
+                for (int i = 0; i < 200; i++) {
+                    detector.detect(frame);
+                    frame.data();
+                    try {
+                        verifier.extract(frame, new FaceInfo());
+                        fail("a face without a rectangle was taken");
+                    } catch (NullPointerException right) {
+                        assertTrue(right.getMessage().startsWith("face.faceRect"));
+                    }
+                }
+                return null;
+            });
+            holder.get(300, TimeUnit.SECONDS);
+            other.get(300, TimeUnit.SECONDS);
+        } finally {
+            threads.shutdownNow();
+        }
+    }
+
+    /** A second writer takes a feature's end away while comparing waits for the verifier. */
+    @Test
+    public void aFeatureIsCheckedAsItIsCompared() throws Exception {
+        byte[] feature = {'x', 0};
+        ExecutorService threads = Executors.newFixedThreadPool(1);
+        try (FaceVerifier verifier = new FaceVerifier()) {
+            Field field = FaceVerifier.class.getDeclaredField("handle");
+            field.setAccessible(true);
+            Future<?> comparing;
+            synchronized (field.get(verifier)) {
+                AtomicReference<Thread> thread = new AtomicReference<>();
+                comparing = threads.submit(() -> {
+                    thread.set(Thread.currentThread());
+                    return verifier.compare(feature, new byte[] {0});
+                });
+                while (thread.get() == null || thread.get().getState() != Thread.State.BLOCKED) {
+                    Thread.sleep(1);
+                }
+                feature[1] = 'x'; // the engine would read past the array now
+            }
+            comparing.get();
+            fail("a text that is no feature was compared");
+        } catch (ExecutionException right) {
+            assertEquals(FaceEngineException.class, right.getCause().getClass());
+        } finally {
+            threads.shutdownNow();
         }
     }
 
