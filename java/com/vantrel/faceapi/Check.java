@@ -25,6 +25,12 @@ final class Check {
         return new IllegalArgumentException(name + " must be " + expected + ", not " + given);
     }
 
+    static void that(boolean holds, String name, String expected, long given) {
+        if (!holds) {
+            throw refusal(name, expected, given);
+        }
+    }
+
     static void positive(String name, int value) {
         if (value <= 0) {
             throw refusal(name, "above 0", value);
@@ -54,6 +60,18 @@ final class Check {
     static void side(String name, PixelFormat format, int length) {
         if (length <= 0 || (format.isSemiPlanar() && length % 2 != 0)) {
             throw refusal(name, format.isSemiPlanar() ? "even and above 0" : "above 0", length);
+        }
+    }
+
+    static void evenAndPositive(String name, int value) {
+        side(name, PixelFormat.NV21, value);
+    }
+
+    /** An array or buffer of at least {@code needed} elements, of which one is {@code unit}. */
+    static void length(String name, int length, long needed, String unit) {
+        if (length < needed) {
+            throw new IllegalArgumentException(
+                    name + " must have at least " + needed + " " + unit + ", not " + length);
         }
     }
 
@@ -93,10 +111,7 @@ final class Check {
     /** An image in an array, of which one element is {@code unit} bytes. */
     static void image(PixelFormat format, int width, int height, int stride, int length, int unit) {
         long bytes = imageBytes(notNull("format", format), width, height, stride);
-        long needed = (bytes + unit - 1) / unit;
-        if (length < needed) {
-            throw tooShort("image", needed, unit == 1 ? "bytes" : "ints", length);
-        }
+        length("image", length, (bytes + unit - 1) / unit, unit == 1 ? "bytes" : "ints");
     }
 
     /** A plane: samples at a distance in rows at a distance, from a buffer's position on. */
@@ -109,10 +124,7 @@ final class Check {
         if (rowStride < row) {
             throw refusal(name + "RowStride", "at least " + row, rowStride);
         }
-        long bytes = (rows - 1L) * rowStride + row;
-        if (plane.remaining() < bytes) {
-            throw tooShort(name, bytes, "bytes from its position on", plane.remaining());
-        }
+        length(name, plane.remaining(), (rows - 1L) * rowStride + row, "bytes from its position on");
     }
 
     /** A rectangle inside an image. */
@@ -139,9 +151,5 @@ final class Check {
         if (array.length != bytes) {
             throw refusal(name + ".length", "exactly " + bytes, array.length);
         }
-    }
-
-    private static IllegalArgumentException tooShort(String name, long needed, String unit, long given) {
-        return new IllegalArgumentException(name + " must have at least " + needed + " " + unit + ", not " + given);
     }
 }
