@@ -72,6 +72,39 @@ class PinnedArray {
   Element* elements_;
 };
 
+/// The elements of a Java array, or of none, where they are if the machine can have it so: borrowed by the
+/// constructor and given back by the destructor. In between only such arrays may be borrowed and given back,
+/// no other function of the machine called, and nothing waited for.
+class CriticalArray {
+ public:
+  /// `mode` is what becomes of the elements: 0 to copy them back where they were copied, JNI_ABORT when they
+  /// are only read.
+  CriticalArray(JNIEnv* env, jarray array, jint mode)
+      : env_(env),
+        array_(array),
+        mode_(mode),
+        elements_(array != nullptr ? env->GetPrimitiveArrayCritical(array, nullptr) : nullptr) {}
+  CriticalArray(const CriticalArray&) = delete;
+  CriticalArray& operator=(const CriticalArray&) = delete;
+  ~CriticalArray() {
+    if (elements_ != nullptr) {
+      env_->ReleasePrimitiveArrayCritical(array_, elements_, mode_);
+    }
+  }
+
+  /// Whether the virtual machine refused the elements of an array.
+  bool refused() const { return array_ != nullptr && elements_ == nullptr; }
+
+  /// The elements as raw bytes; null without an array.
+  unsigned char* bytes() const { return static_cast<unsigned char*>(elements_); }
+
+ private:
+  JNIEnv* env_;
+  jarray array_;
+  jint mode_;
+  void* elements_;
+};
+
 /// The modified UTF-8 characters of a Java string, or of none: a null string has null characters and is no
 /// failure. They are freed by `release` alone; without it they stay with the virtual machine.
 class StringChars {

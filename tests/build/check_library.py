@@ -6,7 +6,7 @@ import subprocess
 import sys
 from pathlib import Path
 
-JNI_PREFIX = "Java_com_vantrel_faceapi_FaceLibrary_"
+JNI_PREFIX = "Java_com_vantrel_faceapi_"
 PAGE = 16384
 NEEDED = {"liblog.so", "libjnigraphics.so", "libkyface_api.so"}
 # What the compiler and the C library bring along.
@@ -19,10 +19,11 @@ def output(*command):
 
 
 def intended(arguments):
-    """The exported functions: what intended_exports.cpp refers to, and the native methods of the Java class."""
+    """The exported functions: what intended_exports.cpp refers to, and the native methods of the Java classes."""
     names = {line.split()[-1] for line in output(arguments.nm, "-u", arguments.intended).splitlines()}
-    java = re.findall(r"\bnative\s+[\w\[\]]+\s+(\w+)\(", Path(arguments.java).read_text())
-    return {name for name in names if name.startswith("_Z")} | {JNI_PREFIX + name for name in java} | {"JNI_OnLoad"}
+    java = {f"{JNI_PREFIX}{Path(source).stem}_{name}" for source in arguments.java
+            for name in re.findall(r"\bnative\s+[\w\[\]]+\s+(\w+)\(", Path(source).read_text())}
+    return {name for name in names if name.startswith("_Z")} | java | {"JNI_OnLoad"}
 
 
 def check_exports(arguments):
@@ -89,7 +90,7 @@ def main():
     parser.add_argument("--nm", required=True)
     parser.add_argument("--readelf", required=True)
     parser.add_argument("--intended", help="the object of intended_exports.cpp")
-    parser.add_argument("--java", help="the source of the Java class")
+    parser.add_argument("--java", nargs="+", help="the sources of the Java classes")
     parser.add_argument("--aarch64", action="store_true", help="the library is one of 64-bit Arm")
     arguments = parser.parse_args()
     findings = list(CHECKS[arguments.check](arguments))

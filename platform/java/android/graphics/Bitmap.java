@@ -32,6 +32,7 @@ public final class Bitmap {
     private final int height;
     private final int rowBytes;
     private final int nativeFormat;
+    private boolean mutable = true;
     private ByteBuffer pixels; // null once recycled
     private int locks;
 
@@ -69,6 +70,22 @@ public final class Bitmap {
 
     public int getHeight() {
         return height;
+    }
+
+    /** Copies the pixels to a bitmap of its own, here of the same configuration only. */
+    public Bitmap copy(Config newConfig, boolean isMutable) {
+        if (newConfig != config) {
+            throw new IllegalArgumentException("the stand-in copies to the same configuration only");
+        }
+        Bitmap copy = new Bitmap(width, height, config, rowBytes);
+        copyPixelsToBuffer(copy.pixels);
+        copy.pixels.clear();
+        copy.mutable = isMutable;
+        return copy;
+    }
+
+    public boolean isMutable() {
+        return mutable;
     }
 
     /** Bytes from one row to the next. */

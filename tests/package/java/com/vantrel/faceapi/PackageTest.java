@@ -140,15 +140,20 @@ public final class PackageTest {
                 classes++;
             }
             assertTrue(classes > 10);
-            nativeMethodsAreThoseOfTheLibrary(Class.forName("com.vantrel.faceapi.FaceLibrary", false, loader));
+            nativeMethodsAreThoseOfTheLibrary(loader);
         }
     }
 
-    private static void nativeMethodsAreThoseOfTheLibrary(Class<?> library) throws Exception {
+    /** The classes with native methods. */
+    private static final String[] NATIVE = {"FaceLibrary", "PlaneConversion"};
+
+    private static void nativeMethodsAreThoseOfTheLibrary(ClassLoader loader) throws Exception {
         Set<String> declared = new TreeSet<>();
-        for (Method method : library.getDeclaredMethods()) {
-            if (Modifier.isNative(method.getModifiers())) {
-                declared.add("Java_com_vantrel_faceapi_FaceLibrary_" + method.getName());
+        for (String name : NATIVE) {
+            for (Method method : Class.forName("com.vantrel.faceapi." + name, false, loader).getDeclaredMethods()) {
+                if (Modifier.isNative(method.getModifiers())) {
+                    declared.add("Java_com_vantrel_faceapi_" + name + "_" + method.getName());
+                }
             }
         }
         Set<String> exported = new TreeSet<>();
@@ -164,7 +169,9 @@ public final class PackageTest {
     @Test
     public void shrinkingKeepsWhatNativeCodeLooksUp() throws IOException {
         String rules = text("proguard.txt");
-        assertTrue(rules.contains("-keep class com.vantrel.faceapi.FaceLibrary {\n    native <methods>;\n}"));
+        for (String name : NATIVE) {
+            assertTrue(rules.contains("-keep class com.vantrel.faceapi." + name + " {\n    native <methods>;\n}"));
+        }
         int start = rules.indexOf("-keep class com.vantrel.faceapi.model.FaceInfo {");
         assertTrue(start >= 0);
         String kept = rules.substring(start, rules.indexOf('}', start));
