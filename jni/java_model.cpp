@@ -14,6 +14,11 @@ constexpr char kRectClass[] = "android/graphics/Rect";
 constexpr char kPointFClass[] = "android/graphics/PointF";
 constexpr char kFaceInfoClass[] = "com/vantrel/faceapi/model/FaceInfo";
 
+/// Local references that a machine promises to every native method, and how many of them a face's points may
+/// take: its rectangle, its array of points and the method's result take the others.
+constexpr int kPromisedReferences = 16;
+constexpr int kPromisedPoints = kPromisedReferences - 3;
+
 /// Everything that is looked up at load. What a failed look-up leaves null is deliberately used as it is by
 /// later conversions: the virtual machine has its say.
 struct Registry {
@@ -218,6 +223,12 @@ ky_face_t java_face_to_ky_face_t(JNIEnv* env, jobject face) {
   auto points = static_cast<jobjectArray>(env->GetObjectField(face, registry.face.facePoints));
   if (points != nullptr) {
     record.points_count = std::min<int>(env->GetArrayLength(points), KY_FACE_MAX_POINTS);
+    // For the points beside all else. A machine that has no room for the promise may have it for the
+    // references.
+    if (record.points_count > kPromisedPoints &&
+        env->EnsureLocalCapacity(kPromisedReferences + record.points_count) < 0) {
+      env->ExceptionClear();
+    }
   }
   for (int i = 0; i < record.points_count; ++i) {
     jobject point = env->GetObjectArrayElement(points, i);

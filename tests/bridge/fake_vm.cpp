@@ -117,6 +117,16 @@ struct Functions {
     --self.live_locals_;
   }
 
+  static jint JNICALL EnsureLocalCapacity(JNIEnv* env, jint capacity) {
+    Vm& self = vm(env);
+    note("EnsureLocalCapacity(%d)", capacity);
+    if (self.enter("EnsureLocalCapacity")) {
+      self.throw_exception();
+      return JNI_ENOMEM;
+    }
+    return JNI_OK;
+  }
+
   static void JNICALL ExceptionClear(JNIEnv* env) {
     Vm& self = vm(env);
     self.enter("ExceptionClear", true);
@@ -308,6 +318,7 @@ JNINativeInterface_ makeFunctions() {
   KY_MODELLED(GetMethodID)
   KY_MODELLED(NewGlobalRef)
   KY_MODELLED(DeleteLocalRef)
+  KY_MODELLED(EnsureLocalCapacity)
   KY_MODELLED(ExceptionClear)
   KY_MODELLED(NewObjectV)
   KY_MODELLED(NewObjectArray)

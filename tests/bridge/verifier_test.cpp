@@ -156,6 +156,29 @@ TEST_F(VerifierTest, HandsTheWholeFaceOver) {
   EXPECT_EQ(vm.live_locals(), 6);
 }
 
+/// Beyond the sixteen references that a machine promises, more are asked for before they are made.
+TEST_F(VerifierTest, AsksForRoomForManyPoints) {
+  for (int count : {0, 1, 13, 14, 31, 256, 1000}) {
+    get_feature(make_java_face(count));
+    EXPECT_EQ(vm.calls("DeleteLocalRef"), 0);
+    const Lines asked = fake::entries("EnsureLocalCapacity");
+    if (count <= 13) {
+      EXPECT_THAT(asked, ElementsAre());
+    } else {
+      EXPECT_THAT(asked,
+                  ElementsAre("EnsureLocalCapacity(" + std::to_string(16 + std::min(count, 256)) + ")"));
+    }
+  }
+}
+
+TEST_F(VerifierTest, ReadsPointsWithoutThePromiseOfRoom) {
+  jobject face = make_java_face(256);
+  vm.refuse("EnsureLocalCapacity", 1);
+  EXPECT_NE(get_feature(face), nullptr);
+  EXPECT_FALSE(vm.exception_pending());
+  EXPECT_EQ(engine.record.points_count, 256);
+}
+
 TEST_F(VerifierTest, AFaceWithoutPointsHasNone) {
   get_feature(make_java_face(0));
   EXPECT_EQ(engine.record.points_count, 0);

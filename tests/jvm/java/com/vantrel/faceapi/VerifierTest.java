@@ -84,6 +84,17 @@ public class VerifierTest {
         assertArrayEquals(kept, feature(portrait, portraitsFace()));
     }
 
+    /** The virtual machine's checks complain of references that were not announced. */
+    @Test
+    public void facesOfManyPointsAreRead() {
+        for (int count : new int[] {1, 13, 14, 16, 17, 28, 30, 31, 256, 300}) {
+            FaceInfo face = portraitsFace();
+            face.facePoints = new PointF[count];
+            Arrays.setAll(face.facePoints, i -> new PointF(Portrait.FACE.left + i % 50, Portrait.FACE.top + i / 50));
+            assertNotNull(feature(portrait, face));
+        }
+    }
+
     @Test
     public void theSameFaceIsMoreAlikeThanAnotherPatch() {
         byte[] face = feature(portrait, portraitsFace());
