@@ -3,8 +3,9 @@
 #
 #   scripts/setup.sh [group...]
 #
-# Groups are `host` and `aarch64`, named after the build presets that need them, both without an argument; and `bench`,
-# `coverage`, `fuzz` and `lint`, which add what the scripts of these names need. Packages that are there already are left
+# Groups are `host` and `aarch64`, named after the build presets that need them, both without an argument; `bench`,
+# `coverage`, `fuzz` and `lint`, which add what the scripts of these names need; and `models`, which makes the verifier's
+# model in .deps/models out of published weights, and which nothing else needs. Packages that are there already are left
 # alone, and nothing is asked when all are. Packages of this machine are installed with apt-get (through sudo when not
 # root). Packages of 64-bit Arm are unpacked into .deps/arm64: installing them would pull this system's own packages
 # along.
@@ -27,6 +28,10 @@ packages_aarch64=(
   clang-19 lld-19 llvm-19      # the compiler family of Android's NDK
   g++-aarch64-linux-gnu        # the C and C++ libraries that it compiles and links against
   qemu-user                    # runs the result
+)
+packages_models=(
+  python3                      # the conversion
+  libdlib-data                 # landmarks, which go into the same file
 )
 packages_lint=(
   "${packages_aarch64[@]}"
@@ -144,9 +149,55 @@ unpack_arm64() {
   exec 9>&-
 }
 
+# The weights of dlib's face descriptor, as an npm package carries them. They are neither committed nor packaged: whoever
+# wants them fetches them, and reads what is written beside them.
+descriptor_package=@vladmandic/face-api
+descriptor_version=1.7.15
+descriptor_sha256=0d77fffeef362ef9c0939cf6c567f3a2e8e177f114fa257a3270cbd2e509b031
+landmarks=/usr/share/dlib/shape_predictor_68_face_landmarks.dat
+
+make_models() {
+  local models=$deps/models work
+  ! grep -q "$descriptor_sha256" "$models/ORIGIN.txt" 2>/dev/null || return 0
+  command -v npm >/dev/null || fail "the descriptor's weights come from npm, and there is no npm here"
+  mkdir -p "$deps"
+  work=$(mktemp -d "$deps/models.XXXXXX")
+  say "fetching $descriptor_package $descriptor_version from npm"
+  (cd "$work" && npm pack --silent "$descriptor_package@$descriptor_version" >package.name) ||
+    fail "could not fetch $descriptor_package $descriptor_version"
+  echo "$descriptor_sha256  $work/$(cat "$work/package.name")" | sha256sum --check --status ||
+    fail "$descriptor_package $descriptor_version is not the package that it was: its checksum differs"
+  tar -xzf "$work/$(cat "$work/package.name")" -C "$work" package/model package/LICENSE
+  mkdir "$work/models"
+  python3 engine/tool/make_verifier_model.py "$work/package/model" "$work/models/descriptor.kym"
+  python3 engine/tool/make_verifier_model.py "$work/package/model" "$work/models/verifier.kym" --landmarks "$landmarks"
+  cp "$work/package/LICENSE" "$work/models/LICENSE.txt"
+  cat >"$work/models/ORIGIN.txt" <<END
+descriptor.kym  dlib's face descriptor (dlib_face_recognition_resnet_model_v1), converted
+verifier.kym    the same, and dlib's landmarks of 68 points behind it
+
+The weights come from the npm package $descriptor_package $descriptor_version
+(model/face_recognition_model, sha256 of the package $descriptor_sha256),
+which is under the licence in LICENSE.txt. It carries them in a form whose numbers are quantised to bytes but for some.
+The network and its training are dlib's, whose author put the weights into the public domain.
+
+The descriptor was trained with about 3 million pictures of 7485 persons, put together from collections for research
+(FaceScrub and VGG among them) and from pictures found on the internet. The persons in such collections were not asked,
+and most of them are adults and well known: with children, and with peoples whose pictures are few there, it errs more
+often than the figures that are quoted for it say. Find out how often before relying on it.
+
+The landmarks come from Debian's package libdlib-data. They were trained with the iBUG 300-W pictures, whose licence
+excludes commercial use.
+END
+  rm -rf "$models"
+  mv "$work/models" "$models"
+  rm -rf "$work"
+  say "the verifier's models are in .deps/models"
+}
+
 command -v apt-get >/dev/null || fail "this needs a Debian system (Debian 12 or later): there is no apt-get"
 [ $# -gt 0 ] || set -- host aarch64
-packages=() arm64=()
+packages=() arm64=() models=
 for group in "$@"; do
   case $group in
     host) packages+=("${packages_host[@]}") ;;
@@ -155,9 +206,11 @@ for group in "$@"; do
     fuzz) packages+=("${packages_fuzz[@]}") ;;
     coverage) packages+=("${packages_coverage[@]}") ;;
     bench) packages+=("${packages_bench[@]}") arm64+=("${arm64_bench[@]}") ;;
-    *) fail "there is no group \"$group\"; the groups are host, aarch64, bench, coverage, fuzz and lint" ;;
+    models) packages+=("${packages_models[@]}") models=1 ;;
+    *) fail "there is no group \"$group\"; the groups are host, aarch64, bench, coverage, fuzz, lint and models" ;;
   esac
 done
 readarray -t packages < <(printf '%s\n' "${packages[@]}" | awk '!seen[$0]++')
 install_packages "${packages[@]}"
 [ ${#arm64[@]} -eq 0 ] || unpack_arm64 "${arm64[@]}"
+[ -z "$models" ] || make_models
