@@ -10,12 +10,15 @@
 /// bits; 0 when n is 0. A null `data`, a `widthStride` below 1 or a rectangle whose `rectW * rectH` is 0
 /// prints "wrong enter\r" and a newline to standard output and returns 255.
 ///
-/// All of this is 32-bit arithmetic that wraps, whatever the arguments: an unsigned sum, signed sizes and a
-/// signed division. Any region up to 8 405 024 pixels (2899 x 2899) is safe. From there on a region that is
-/// white throughout makes sum + n / 2 exceed 2^31 - 1, from 16 843 010 pixels on the sum itself wraps, and
-/// the mean means nothing; a darker region may be larger in proportion.
+/// The rectangle is clipped in 64 bits. The rest is 32-bit arithmetic that wraps, whatever the arguments: an
+/// unsigned sum, a signed n and a signed division. Any region up to 8 405 024 pixels (2899 x 2899) is safe.
+/// From there on a region that is white throughout makes sum + n / 2 exceed 2^31 - 1, from 16 843 010 pixels
+/// on the sum itself wraps, and the mean means nothing; a darker region may be larger in proportion.
 ///
 /// The functions may be called from several threads at once.
+///
+/// In C++ a function's name in a library tells whether its pointer is to `const`. The library exports each
+/// metric under the other name, too, for callers whose own declarations have a plain `unsigned char*`.
 #pragma once
 
 #ifndef KYFACE_EXPORT

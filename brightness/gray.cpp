@@ -59,17 +59,6 @@ using kyface::brightness::GraySum;
 using kyface::brightness::Layout;
 using kyface::brightness::meanOf;
 
-unsigned char calcGray_YUV(const unsigned char* data, int width, int widthStride, int height,
-                           int /*heightStride*/, int rectX, int rectY, int rectW, int rectH) {
-  return meanOf<GraySum<Layout::kYUV>>({data, width, widthStride, height, rectX, rectY, rectW, rectH});
-}
-
-unsigned char calcGray_BGRA(const unsigned char* data, int width, int widthStride, int height,
-                            int /*heightStride*/, int rectX, int rectY, int rectW, int rectH) {
-  return meanOf<GraySum<Layout::kBGRA>>({data, width, widthStride, height, rectX, rectY, rectW, rectH});
-}
-
-unsigned char calcGray_RGBA(const unsigned char* data, int width, int widthStride, int height,
-                            int /*heightStride*/, int rectX, int rectY, int rectW, int rectH) {
-  return meanOf<GraySum<Layout::kRGBA>>({data, width, widthStride, height, rectX, rectY, rectW, rectH});
-}
+BRIGHTNESS_METRIC(calcGray_YUV, meanOf<GraySum<Layout::kYUV>>)
+BRIGHTNESS_METRIC(calcGray_BGRA, meanOf<GraySum<Layout::kBGRA>>)
+BRIGHTNESS_METRIC(calcGray_RGBA, meanOf<GraySum<Layout::kRGBA>>)

@@ -34,17 +34,20 @@ void initLuminanceTables() {
   kyface::brightness::rebuild(labCbrtTab, HPC::fastcv::arm::kCubeRootTable);
 }
 
-using kyface::brightness::LightnessSum;
-using kyface::brightness::meanOf;
+namespace kyface::brightness {
+namespace {
 
-unsigned char calcLuminance_BGRA(const unsigned char* data, int width, int widthStride, int height,
-                                 int /*heightStride*/, int rectX, int rectY, int rectW, int rectH) {
+/// The metric of pixels with blue in channel `blue`.
+template <int blue>
+unsigned char meanLightness(const Region& region) {
   initLuminanceTables();
-  return meanOf<LightnessSum<0>>({data, width, widthStride, height, rectX, rectY, rectW, rectH});
+  return meanOf<LightnessSum<blue>>(region);
 }
 
-unsigned char calcLuminance_RGBA(const unsigned char* data, int width, int widthStride, int height,
-                                 int /*heightStride*/, int rectX, int rectY, int rectW, int rectH) {
-  initLuminanceTables();
-  return meanOf<LightnessSum<2>>({data, width, widthStride, height, rectX, rectY, rectW, rectH});
-}
+}  // namespace
+}  // namespace kyface::brightness
+
+using kyface::brightness::meanLightness;
+
+BRIGHTNESS_METRIC(calcLuminance_BGRA, meanLightness<0>)
+BRIGHTNESS_METRIC(calcLuminance_RGBA, meanLightness<2>)

@@ -6,8 +6,8 @@
 #include <cstdint>
 #include <cstdio>
 #include <cstring>
-#include <limits>
 
+#include "clip.h"
 #include "loop.h"
 #include "pixel.h"
 
@@ -31,22 +31,20 @@ struct Region {
   int rectH;
 };
 
-// Sizes and sums are 32-bit and wrap, so that every argument has a defined result.
+// Counts and sums are 32-bit and wrap, so that every argument has a defined result.
 inline int wrapped(uint32_t value) { return static_cast<int>(value); }
 
-/// The part of [start, start + extent) inside [0, size): first to last, none if last < first. The smallest
-/// size does not wrap: nothing is inside it.
+/// The part of [start, start + extent) inside [0, size): from `first` to before `end`, none if that is not
+/// behind it.
 struct Range {
-  int first;
-  int last;
+  int64_t first;
+  int64_t end;
 
   Range(int start, int extent, int size)
-      : first(std::max(start, 0)),
-        last(std::min(wrapped(static_cast<uint32_t>(start) + static_cast<uint32_t>(extent) - 1u),
-                      std::max(size, std::numeric_limits<int>::min() + 1) - 1)) {}
+      : first(std::max(start, 0)), end(reachesBeyond(start, extent, size) ? size : int64_t{start} + extent) {}
 
-  bool isEmpty() const { return last < first; }
-  uint32_t count() const { return static_cast<uint32_t>(last) - static_cast<uint32_t>(first) + 1u; }
+  /// Negative where the two ends are the wrong way round.
+  int64_t count() const { return end - first; }
 };
 
 /// Adds a row of `length` >= 1 pixels to `sum`. The pixels after the last whole block come as one more block,
@@ -99,14 +97,13 @@ unsigned char meanOf(const Region& region) {
   const Range columns(region.rectX, region.rectW, region.width);
   const Range rows(region.rectY, region.rectH, region.height);
   Sum sum;
-  if (!columns.isEmpty()) {
-    const ptrdiff_t length = static_cast<ptrdiff_t>(columns.last) - columns.first + 1;
-    const ptrdiff_t start = static_cast<ptrdiff_t>(columns.first) * Sum::kChannels;
-    for (ptrdiff_t row = rows.first; row <= rows.last; ++row) {
-      addRow(sum, region.data + row * region.widthStride + start, length);
+  if (columns.count() > 0) {
+    const ptrdiff_t start = columns.first * Sum::kChannels;
+    for (ptrdiff_t row = rows.first; row < rows.end; ++row) {
+      addRow(sum, region.data + row * region.widthStride + start, columns.count());
     }
   }
-  const int n = wrapped(columns.count() * rows.count());
+  const int n = wrapped(static_cast<uint32_t>(columns.count()) * static_cast<uint32_t>(rows.count()));
   if (n == 0) {
     return 0;
   }
@@ -116,3 +113,15 @@ unsigned char meanOf(const Region& region) {
 }
 
 }  // namespace kyface::brightness
+
+/// Defines a metric by a function of a `Region`; and once more with a plain pointer, which is another name in
+/// a library.
+#define BRIGHTNESS_METRIC(name, ...)                                                                   \
+  unsigned char name(const unsigned char* data, int width, int widthStride, int height,                \
+                     int /*heightStride*/, int rectX, int rectY, int rectW, int rectH) {               \
+    return __VA_ARGS__({data, width, widthStride, height, rectX, rectY, rectW, rectH});                \
+  }                                                                                                    \
+  KYFACE_EXPORT unsigned char name(unsigned char* data, int width, int widthStride, int height,        \
+                                   int /*heightStride*/, int rectX, int rectY, int rectW, int rectH) { \
+    return __VA_ARGS__({data, width, widthStride, height, rectX, rectY, rectW, rectH});                \
+  }

@@ -7,9 +7,12 @@
 #include <cstdint>
 
 #include "bridge_log.h"
+#include "clip.h"
 #include "pinned.h"
 
 namespace {
+
+using kyface::brightness::reachesBeyond;
 
 using Metric = decltype(calcGray_YUV);
 
@@ -84,9 +87,9 @@ JNIEXPORT jfloat JNICALL Java_com_vantrel_faceapi_FaceLibrary_averageBrightness(
   }
   const int left = std::max(x, 0);
   const int top = std::max(y, 0);
-  const int columns = std::int64_t{left} + w > width ? width - left : w;
+  const int columns = reachesBeyond(left, w, width) ? width - left : w;
   // The height test deliberately adds to the left edge: callers depend on which rectangles it cuts.
-  const int rows = std::int64_t{left} + h > height ? height - top : h;
+  const int rows = reachesBeyond(left, h, height) ? height - top : h;
   const std::int64_t stride = width;
   const std::uint32_t sum = sum_bytes(pinned.bytes() + top * stride + left, stride, columns, rows);
   pinned.release();

@@ -13,6 +13,10 @@
 #include "lab_reference.h"
 #include "sparse_memory.h"
 
+// The same metrics for callers whose declarations lack the `const`.
+using PlainMetric = unsigned char(unsigned char*, int, int, int, int, int, int, int, int);
+PlainMetric calcGray_YUV, calcGray_BGRA, calcGray_RGBA, calcLuminance_BGRA, calcLuminance_RGBA;
+
 namespace {
 
 using kyface::test::ByteSource;
@@ -26,6 +30,7 @@ using Metric = unsigned char (*)(const u8*, int, int, int, int, int, int, int, i
 struct Variant {
   const char* name;
   Metric metric;
+  PlainMetric* plain;
   int channels;
   int (*value)(const u8* pixel);
 };
@@ -36,13 +41,15 @@ int lightness(int b, int g, int r) {
 }
 
 const Variant kVariants[] = {
-    {"Gray_YUV", calcGray_YUV, 3, [](const u8* p) { return static_cast<int>(p[0]); }},
-    {"Gray_BGRA", calcGray_BGRA, 4,
+    {"Gray_YUV", calcGray_YUV, calcGray_YUV, 3, [](const u8* p) { return static_cast<int>(p[0]); }},
+    {"Gray_BGRA", calcGray_BGRA, calcGray_BGRA, 4,
      [](const u8* p) { return (77 * p[0] + 150 * p[1] + 29 * p[2] + 128) / 256; }},
-    {"Gray_RGBA", calcGray_RGBA, 4,
+    {"Gray_RGBA", calcGray_RGBA, calcGray_RGBA, 4,
      [](const u8* p) { return (77 * p[2] + 150 * p[1] + 29 * p[0] + 128) / 256; }},
-    {"Luminance_BGRA", calcLuminance_BGRA, 4, [](const u8* p) { return lightness(p[0], p[1], p[2]); }},
-    {"Luminance_RGBA", calcLuminance_RGBA, 4, [](const u8* p) { return lightness(p[2], p[1], p[0]); }},
+    {"Luminance_BGRA", calcLuminance_BGRA, calcLuminance_BGRA, 4,
+     [](const u8* p) { return lightness(p[0], p[1], p[2]); }},
+    {"Luminance_RGBA", calcLuminance_RGBA, calcLuminance_RGBA, 4,
+     [](const u8* p) { return lightness(p[2], p[1], p[0]); }},
 };
 
 // The low 32 bits of a number, as a signed one.
@@ -64,8 +71,8 @@ int expectedMean(const Variant& variant, const u8* data, int width, int stride, 
     return 255;
   }
   const int64_t x0 = std::max(rectX, 0), y0 = std::max(rectY, 0);
-  const int64_t x1 = std::min<int64_t>(wrapped(static_cast<int64_t>(rectX) + rectW - 1), width - 1LL);
-  const int64_t y1 = std::min<int64_t>(wrapped(static_cast<int64_t>(rectY) + rectH - 1), height - 1LL);
+  const int64_t x1 = std::min<int64_t>(static_cast<int64_t>(rectX) + rectW - 1, width - 1LL);
+  const int64_t y1 = std::min<int64_t>(static_cast<int64_t>(rectY) + rectH - 1, height - 1LL);
   int64_t sum = 0;
   for (int64_t y = y0; y <= y1; ++y) {
     for (int64_t x = x0; x <= x1; ++x) {
@@ -174,6 +181,18 @@ TEST_P(Metrics, ExtremeArguments) {
   }
 }
 
+// Edges that 32 bits cannot hold are right of and below every image.
+TEST_P(Metrics, RectanglesBeyond32Bits) {
+  const int nc = GetParam().channels;
+  const std::vector<u8> image(static_cast<size_t>(8) * 8 * nc, 200);
+  const int level = GetParam().value(image.data());
+  EXPECT_EQ(measure(image.data(), 8, 8 * nc, 8, 2, 0, INT_MAX, 8), level);
+  EXPECT_EQ(measure(image.data(), 8, 8 * nc, 8, 0, 7, 8, INT_MAX), level);
+  EXPECT_EQ(measure(image.data(), 8, 8 * nc, 8, 1, 1, INT_MAX, INT_MAX), level);
+  // Far left of and above the image, and of a negative size.
+  EXPECT_EQ(measure(image.data(), 8, 8 * nc, 8, INT_MIN, INT_MIN, INT_MIN + 1, INT_MIN + 1), 0);
+}
+
 TEST_P(Metrics, RectanglesWithoutPixels) {
   const u8 pixel[4] = {200, 200, 200, 200};
   // Four columns too far right: n = -4, and (0 - 2) / -4 is 0.
@@ -198,6 +217,14 @@ TEST_P(Metrics, RefusedArguments) {
   testing::internal::CaptureStdout();
   EXPECT_EQ(measure(pixel, 1, 4, 1, 0, 0, 1, 1), 0);
   EXPECT_EQ(testing::internal::GetCapturedStdout(), "");
+}
+
+TEST_P(Metrics, PlainPointers) {
+  const int nc = GetParam().channels;
+  GuardedImage<u8> image(4, 37 * nc, 37 * nc + 2);
+  image.fill(ByteSource(9));
+  EXPECT_EQ(GetParam().plain(image.data(), 37, image.stride(), 4, -1, 3, 1, 30, 9),
+            expectedMean(GetParam(), image.data(), 37, image.stride(), 4, 3, 1, 30, 9));
 }
 
 TEST_P(Metrics, BlackAndWhite) {

@@ -7,6 +7,10 @@
 #include "frame.h"
 #include "kernels.h"
 
+using PlainMetric = unsigned char(unsigned char*, int, int, int, int, int, int, int, int);
+using HeaderMetric = unsigned char(const unsigned char*, int, int, int, int, int, int, int, int);
+PlainMetric calcGray_YUV, calcGray_BGRA, calcGray_RGBA, calcLuminance_BGRA, calcLuminance_RGBA;
+
 namespace HPC::fastcv {
 
 using Function = void (*)();
@@ -30,6 +34,11 @@ using Function = void (*)();
 
 #define FRAME(type) ADDRESS(rotate_YUV420<type, unsigned char, ECO_ENV_ARM>)
 
+// The metrics have two names each: that of the header, and the one with a plain pointer.
+#define METRIC(name)                                               \
+  reinterpret_cast<Function>(static_cast<HeaderMetric*>(&::name)), \
+      reinterpret_cast<Function>(static_cast<PlainMetric*>(&::name)),
+
 // clang-format off
 extern const Function intended[];
 const Function intended[] = {
@@ -41,8 +50,8 @@ const Function intended[] = {
     ADDRESS(armRotateNx90degree_YUV420<unsigned char>) ADDRESS(imgRotate_I420<unsigned char>)
     ADDRESS(nv2RGB) ADDRESS(RGB2nv) ADDRESS(nv2BGR) ADDRESS(nv212BGR) ADDRESS(BGR2nv)
     ADDRESS(BGR2RGB) ADDRESS(BGRA2RGB) ADDRESS(cropNv21) ADDRESS(rotateBGR)
-    ADDRESS(calcGray_YUV) ADDRESS(calcGray_BGRA) ADDRESS(calcGray_RGBA)
-    ADDRESS(calcLuminance_BGRA) ADDRESS(calcLuminance_RGBA)
+    METRIC(calcGray_YUV) METRIC(calcGray_BGRA) METRIC(calcGray_RGBA)
+    METRIC(calcLuminance_BGRA) METRIC(calcLuminance_RGBA)
 };
 // clang-format on
 
