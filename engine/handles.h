@@ -1,6 +1,8 @@
 /// The opaque values by which callers name the engine's objects.
 #pragma once
 
+#include <atomic>
+#include <cstdint>
 #include <memory>
 #include <mutex>
 #include <unordered_map>
@@ -10,14 +12,22 @@
 
 namespace kyengine {
 
-/// All objects of type `T` that callers hold. A value that names none is refused without looking at what it
-/// points to, and an object that is destroyed during a call on another thread lives until that call is over.
+/// A value that no handle of any kind has had before: a count, so that the handle of what has been destroyed
+/// never comes to name something newer. Its 64 bits do not run out.
+inline void* NewHandle() noexcept {
+  static_assert(sizeof(uintptr_t) == 8);
+  static std::atomic<uintptr_t> last = 0;
+  return reinterpret_cast<void*>(++last);  // NOLINT(performance-no-int-to-ptr): callers hold pointers
+}
+
+/// All objects of type `T` that callers hold. A value that names none is refused, and an object that is
+/// destroyed during a call on another thread lives until that call is over.
 template <typename T>
 class Handles {
  public:
   /// Takes an object in and returns its handle, which is never null.
   static void* Add(std::shared_ptr<T> object) {
-    void* const handle = object.get();
+    void* const handle = NewHandle();
     Table& table = Get();
     const std::lock_guard lock(table.mutex);
     table.objects.emplace(handle, std::move(object));

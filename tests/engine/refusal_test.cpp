@@ -1,5 +1,6 @@
 // What detector and tracker refuse, and with which codes.
 #include <limits>
+#include <set>
 #include <vector>
 
 #include "engine_calls.h"
@@ -106,6 +107,21 @@ TEST_P(RefusalTest, HandlesOfNothing) {
     EXPECT_EQ(KY_ERROR_HANDLE, Search(handle, bytes_.data(), &faces, &count));
     GetParam().destroy(handle);
   }
+}
+
+// A handle names one object for as long as the process lives, whatever comes and goes.
+TEST_P(RefusalTest, HandlesAreNotUsedAgain) {
+  const Kind& other = GetParam().create == kDetector.create ? kTracker : kDetector;
+  std::set<ky_handle_t> handles = {handle_};
+  for (int i = 0; i < 50; ++i) {
+    for (const Kind& kind : {GetParam(), other}) {
+      ky_handle_t handle = nullptr;
+      ASSERT_EQ(KY_SUCCESS, kind.create(&handle, nullptr, KY_CONFIG_DEFAULT));
+      kind.destroy(handle);
+      EXPECT_TRUE(handles.insert(handle).second) << "object " << i;
+    }
+  }
+  EXPECT_EQ(0u, handles.count(nullptr));
 }
 
 TEST_P(RefusalTest, HandlesOfTheOtherKind) {
