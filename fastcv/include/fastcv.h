@@ -6,6 +6,10 @@
 /// destination as it was whenever it returns anything but `HPC_SUCCESS`. Threads may call it on distinct
 /// destinations.
 ///
+/// Source and destination must not overlap, unless a front-end's comment says that it works forwards. Then
+/// they may where no row of the destination begins behind the row of the source that it is made of: where
+/// both are the same buffer with the same step, or a smaller destination is packed at the source's start.
+///
 /// The checks are those of each front-end's comment and no more. Past all of them go, to every kernel,
 /// matrices
 /// - whose `data` is null (except to `rotate`) or has less room than the other fields say;
@@ -172,6 +176,9 @@ inline constexpr bool kNever = false;
 
 /// Converts `src` into `*dst`, which the caller has set up with its size and data.
 ///
+/// CVT_YUV2GRAY and the packed conversions into no more channels than there were work forwards over images
+/// that overlap (8-bit CVT_LAB2BGR excepted, for what it writes beyond its rows); all others need them apart.
+///
 /// Only the instances of FASTCV_CVT_COLOR_INSTANCES exist; any other does not compile. The checks, in this
 /// order, with S a matrix's step in elements, W and H its width and height, in signed 32-bit arithmetic, X /
 /// 3 truncating:
@@ -209,7 +216,7 @@ HPCStatus_t cvtColor(const Mat<Tsrc, ncSrc, env>& /*src*/, Mat<Tdst, ncDst, env>
 
 /// Copies the rectangle of `dst->width` by `dst->height` pixels at `p` out of `src` into `*dst`, every sample
 /// (alpha too) multiplied by `ratio`; a `ratio` of 1 is a plain copy. 8-bit results are rounded, halves
-/// upward, and saturated.
+/// upward, and saturated. Works forwards over images that overlap.
 ///
 /// Checks, in order: `src`, then `*dst` empty: HPC_MAT_EMPTY; the rectangle not wholly inside `src` (touching
 /// the right and bottom edges is inside): HPC_INVALID_ARGS.

@@ -1,9 +1,12 @@
 // The crop kernel against its formulas: copies, 8-bit samples in groups of 8 pixels and one by one, floats.
 
 #include <gtest/gtest.h>
+#include <unistd.h>
 
 #include <algorithm>
+#include <climits>
 #include <cmath>
+#include <csignal>
 #include <cstdint>
 #include <cstring>
 #include <limits>
@@ -269,6 +272,29 @@ TEST(CropExamples, GroupsAndTailsDifferAboveAFactorOf128) {
   for (size_t i = 0; i < 27; ++i) {
     EXPECT_EQ(scaledRows[i], i % 9 == 8 ? 255 : 0) << i;
   }
+}
+
+// A row of 2^31 samples, of which the memory ends early: what lies before the end has been scaled.
+template <int nc>
+void checkRowBeyond32Bits() {
+  constexpr int kSamples = 4096;
+  GuardedImage<float> in(1, kSamples, kSamples), out(1, kSamples, kSamples);
+  in.fill([] { return 3.0f; });
+  static const float* last;
+  last = out.data() + kSamples - 16;
+  const auto scale = [&] {
+    // Where the row leaves the memory, and the process ends.
+    signal(SIGSEGV, [](int) { _exit(*last == 6.0f ? 0 : 1); });
+    armImageCrop<float, nc, float, nc, nc>(0, 0, INT_MAX, in.data(), 1, INT_MAX / nc + 1, INT_MAX, out.data(),
+                                           2.0f);
+    _exit(2);
+  };
+  EXPECT_EXIT(scale(), testing::ExitedWithCode(0), "");
+}
+
+TEST(CropExamples, RowsBeyond32Bits) {
+  checkRowBeyond32Bits<3>();
+  checkRowBeyond32Bits<4>();
 }
 
 // In place every sample is scaled once, whatever the width.

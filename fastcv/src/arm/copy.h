@@ -5,6 +5,7 @@
 #include <cstring>
 
 #include "neon.h"
+#include "overlap.h"
 #include "registers.h"
 
 namespace HPC::fastcv::arm {
@@ -34,7 +35,7 @@ inline constexpr bool kOwnCopyPays = false;
 
 /// Copies `size` bytes; where the two places overlap, they arrive as they were.
 inline void copyRow(const unsigned char* src, unsigned char* dst, ptrdiff_t size) {
-  if (!kOwnCopyPays || size < kCopyBlock || (src < dst + size && dst < src + size)) {
+  if (!kOwnCopyPays || size < kCopyBlock || !areApart(src, size, dst, size)) {
     memmove(dst, src, static_cast<size_t>(size));
     return;
   }

@@ -15,6 +15,7 @@
 #include "copy.h"
 #include "entry.h"
 #include "loop.h"
+#include "overlap.h"
 
 namespace HPC::fastcv {
 namespace {
@@ -89,7 +90,7 @@ inline void scaleRows(const Scale& scale, float ratio, bool alike, ptrdiff_t hei
   for (ptrdiff_t row = 0; row < height; ++row) {
     const unsigned char* src = in + row * inStride;
     unsigned char* dst = out + row * outStride;
-    const bool apart = src + width * nc <= dst || dst + width * nc <= src;
+    const bool apart = areApart(src, width * nc, dst, width * nc);
     walk<kGroup, kInFlight, 1>(
         width * nc, alike && apart ? Tail::kOverlap : Tail::kSteps,
         [&](ptrdiff_t x, auto groups) { scaleSamples<groups * kGroup>(scale, src + x, dst + x); },
@@ -125,8 +126,8 @@ struct ScaleFloats {
 };
 
 template <int nc>
-void scaleImage(float ratio, int height, int width, int inStride, const float* in, int outStride,
-                float* out) {
+void scaleImage(float ratio, ptrdiff_t height, ptrdiff_t width, ptrdiff_t inStride, const float* in,
+                ptrdiff_t outStride, float* out) {
   forEachPixel(ScaleFloats{ratio}, height, width * nc, inStride, in, outStride, out);
 }
 

@@ -45,8 +45,9 @@ FASTCV_COLOR_KERNEL(armI4202BGRImage);
 FASTCV_COLOR_KERNEL(armYUV2GRAYImage);
 
 // ---- packed images
-// -------------------------------------------------------------------------------------------- All sizes. The
-// channel reorderings of equal channel counts also work in place.
+// -------------------------------------------------------------------------------------------- All sizes.
+// Those whose destination has no more channels than the source also work forwards over images that overlap
+// (no row of the destination begins behind that of the source), armLAB2BGRImage of `unsigned char` excepted.
 
 FASTCV_COLOR_KERNEL(armBGR2BGRAImage);
 FASTCV_COLOR_KERNEL(armBGRA2BGRImage);

@@ -9,6 +9,7 @@
 #include <type_traits>
 #include <utility>
 
+#include "overlap.h"
 #include "pixel.h"
 
 /// Keeps the compiler from unrolling or vectorising the loop that follows.
@@ -34,8 +35,7 @@ using Blocks = std::integral_constant<int, n>;
 
 /// How the end of a row that is no whole block is handled.
 enum class Tail {
-  kOverlap,  ///< the last block is done again, flush with the row's end: needs distinct source and
-             ///< destination
+  kOverlap,  ///< the last block is done again, flush with the row's end: the source must not have changed
   kSteps,    ///< step by step
 };
 
@@ -221,10 +221,12 @@ class PixelRow {
 /// - `scalar(const Src*, Dst*)`, for one pixel;
 /// - `kPacked`, if `vector` takes and gives blocks of 4-channel pixels as they lie in memory, not a channel a
 ///   register.
-/// Strides count elements. Source and destination are distinct, or the same with equal strides and channels.
+/// Strides count elements. Rows are worked on from their starts, each block read before it is written, so
+/// that the images may overlap where no row of the destination begins behind that of the source or has more
+/// elements.
 template <typename Op>
-inline void forEachPixel(const Op& op, int height, int width, int inStride, const typename Op::Src* in,
-                         int outStride, typename Op::Dst* out) {
+inline void forEachPixel(const Op& op, ptrdiff_t height, ptrdiff_t width, ptrdiff_t inStride,
+                         const typename Op::Src* in, ptrdiff_t outStride, typename Op::Dst* out) {
   if (height < 1 || width < 1) {
     return;
   }
@@ -234,10 +236,12 @@ inline void forEachPixel(const Op& op, int height, int width, int inStride, cons
     length *= rows;
     rows = 1;
   }
-  const bool inPlace = static_cast<const void*>(in) == static_cast<const void*>(out);
-  const Tail tail = Op::kUniform && !inPlace ? Tail::kOverlap : Tail::kSteps;
   for (ptrdiff_t row = 0; row < rows; ++row) {
-    detail::PixelRow<Op>::convert(op, length, tail, in + row * inStride, out + row * outStride);
+    const typename Op::Src* const src = in + row * inStride;
+    typename Op::Dst* const dst = out + row * outStride;
+    const bool redoes =
+        Op::kUniform && areApart(src, length * Op::kSrcChannels, dst, length * Op::kDstChannels);
+    detail::PixelRow<Op>::convert(op, length, redoes ? Tail::kOverlap : Tail::kSteps, src, dst);
   }
 }
 
