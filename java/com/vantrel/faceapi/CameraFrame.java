@@ -34,9 +34,8 @@ public final class CameraFrame {
     private int height;
     private int rotationDegrees;
 
-    /** A row of the first and of the second chroma plane, as they are in memory. */
-    private byte[] firstRow = NOTHING;
-    private byte[] secondRow = NOTHING;
+    /** What native code is told of the planes. */
+    private final int[] planes = new int[PlaneConversion.NUMBERS];
 
     /** Creates an NV21 frame without content, which must be filled before use. */
     public CameraFrame() {
@@ -113,7 +112,8 @@ public final class CameraFrame {
      * Fills this frame from the planes of a YUV_420_888 image, as Camera2 and CameraX deliver them.
      *
      * <p>A plane begins at its buffer's position. The last row may end with its last sample, however long the row
-     * stride is. Positions are as before afterwards. No other thread may use the buffers or write the planes meanwhile.
+     * stride is. Positions are not moved. Planes in direct buffers, as cameras give them, are read where they are; those
+     * in arrays too, unless the buffer is read-only: such a plane is copied first.
      *
      * @param newWidth width in pixels, even
      * @param newHeight height in pixels, even
@@ -143,17 +143,13 @@ public final class CameraFrame {
         synchronized (lock) {
             byte[] out = data.length == bytes ? data : new byte[bytes];
             ByteBuffer luma = readable("y", y, out);
-            ByteBuffer first = readable("v", v, out);
-            ByteBuffer second = readable("u", u, out);
-            copyRows(luma, yRowStride, newHeight, newWidth, out);
-            int chroma = newWidth * newHeight;
-            if (format == PixelFormat.NV21) {
-                interleave(first, vRowStride, vPixelStride, second, uRowStride, uPixelStride, chromaRows, pairs, out,
-                        chroma);
-            } else {
-                interleave(second, uRowStride, uPixelStride, first, vRowStride, vPixelStride, chromaRows, pairs, out,
-                        chroma);
-            }
+            ByteBuffer cb = readable("u", u, out);
+            ByteBuffer cr = readable("v", v, out);
+            PlaneConversion.describe(planes, newWidth, newHeight, luma, yRowStride, cb, uRowStride, uPixelStride, cr,
+                    vRowStride, vPixelStride);
+            PlaneConversion.check(PlaneConversion.toBytes(PlaneConversion.memory(luma), PlaneConversion.memory(cb),
+                    PlaneConversion.memory(cr), planes, 0, 0, newWidth, newHeight, 0, false,
+                    format == PixelFormat.NV21 ? PlaneConversion.NV21 : PlaneConversion.NV12, out, 0, newWidth));
             set(out, newWidth, newHeight, newRotationDegrees);
         }
     }
@@ -229,56 +225,14 @@ public final class CameraFrame {
      * that does not say where it lies, as read-only views of arrays, is copied.
      */
     private static ByteBuffer readable(String name, ByteBuffer plane, byte[] out) {
-        if (plane.isDirect()) {
-            return plane;
-        }
-        if (!plane.hasArray()) {
+        if (!PlaneConversion.isReadable(plane)) {
             byte[] copy = new byte[plane.remaining()];
             plane.duplicate().get(copy);
             return ByteBuffer.wrap(copy);
         }
-        if (plane.array() == out) {
+        if (!plane.isDirect() && plane.array() == out) {
             throw new IllegalArgumentException(name + " must not lie in the array that is filled");
         }
         return plane;
-    }
-
-    private static void copyRows(ByteBuffer plane, int rowStride, int rows, int rowBytes, byte[] out) {
-        if (rowStride == rowBytes) {
-            copy(plane, 0, out, 0, rows * rowBytes);
-            return;
-        }
-        for (int row = 0; row < rows; row++) {
-            copy(plane, row * rowStride, out, row * rowBytes, rowBytes);
-        }
-    }
-
-    /** A bulk read at an offset from the buffer's position, which stays where it is. */
-    private static void copy(ByteBuffer plane, int from, byte[] out, int offset, int length) {
-        int position = plane.position();
-        try {
-            plane.position(position + from);
-            plane.get(out, offset, length);
-        } finally {
-            plane.position(position);
-        }
-    }
-
-    private void interleave(
-            ByteBuffer first, int firstRowStride, int firstPixelStride, ByteBuffer second, int secondRowStride,
-            int secondPixelStride, int rows, int pairs, byte[] out, int offset) {
-        int firstBytes = (pairs - 1) * firstPixelStride + 1;
-        int secondBytes = (pairs - 1) * secondPixelStride + 1;
-        firstRow = firstRow.length < firstBytes ? new byte[firstBytes] : firstRow;
-        secondRow = secondRow.length < secondBytes ? new byte[secondBytes] : secondRow;
-        int to = offset;
-        for (int row = 0; row < rows; row++) {
-            copy(first, row * firstRowStride, firstRow, 0, firstBytes);
-            copy(second, row * secondRowStride, secondRow, 0, secondBytes);
-            for (int pair = 0; pair < pairs; pair++) {
-                out[to++] = firstRow[pair * firstPixelStride];
-                out[to++] = secondRow[pair * secondPixelStride];
-            }
-        }
     }
 }

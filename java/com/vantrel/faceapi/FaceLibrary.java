@@ -38,7 +38,8 @@ public final class FaceLibrary {
 
     /**
      * Switches the messages of this class's methods on or off, those about errors included. They are on at first. What
-     * the library says while it is loaded, and the frame conversions' notes of start and end, are not affected.
+     * the library says while it is loaded, and the notes of start and end of {@link #convertColorSpace}, of the two
+     * methods over bitmaps and of {@link #rotateBGR}, are not affected; {@link Images} does the same without notes.
      *
      * @param debug true for on
      */

@@ -1,7 +1,6 @@
 package com.vantrel.faceapi;
 
 import android.graphics.Bitmap;
-import java.nio.ByteBuffer;
 import org.jetbrains.annotations.NotNull;
 import org.jetbrains.annotations.Nullable;
 
@@ -10,33 +9,36 @@ import org.jetbrains.annotations.Nullable;
  *
  * <p>An output array may be handed in to be reused; it must have exactly the result's size. Images are packed: no
  * padding between rows. All methods may be called from any thread, on arrays that no other thread writes meanwhile.
+ * Nothing is written to Android's log, whatever {@link FaceLibrary#setDebug} says.
  */
 public final class Images {
     /** What {@link Images#convert} converts between. A 4:2:0 image has an even width and height. */
     public enum Conversion {
         /** NV21 to BGRA, alpha 255. */
-        NV21_TO_BGRA(ColorConversion.NV21_TO_BGRA, PixelFormat.NV21, PixelFormat.BGRA),
+        NV21_TO_BGRA(PixelFormat.NV21, PixelFormat.BGRA),
         /** NV21 to RGBA, alpha 255. */
-        NV21_TO_RGBA(ColorConversion.NV21_TO_RGBA, PixelFormat.NV21, PixelFormat.RGBA),
+        NV21_TO_RGBA(PixelFormat.NV21, PixelFormat.RGBA),
         /** NV21 to BGR. */
-        NV21_TO_BGR(ColorConversion.NV21_TO_BGR, PixelFormat.NV21, PixelFormat.BGR),
+        NV21_TO_BGR(PixelFormat.NV21, PixelFormat.BGR),
         /** NV12 to BGRA, alpha 255. */
-        NV12_TO_BGRA(ColorConversion.NV12_TO_BGRA, PixelFormat.NV12, PixelFormat.BGRA),
+        NV12_TO_BGRA(PixelFormat.NV12, PixelFormat.BGRA),
+        /** NV12 to RGBA, alpha 255. */
+        NV12_TO_RGBA(PixelFormat.NV12, PixelFormat.RGBA),
+        /** NV12 to BGR. */
+        NV12_TO_BGR(PixelFormat.NV12, PixelFormat.BGR),
         /** RGBA to NV21. */
-        RGBA_TO_NV21(ColorConversion.RGBA_TO_NV21, PixelFormat.RGBA, PixelFormat.NV21),
+        RGBA_TO_NV21(PixelFormat.RGBA, PixelFormat.NV21),
         /** RGBA to NV12. */
-        RGBA_TO_NV12(ColorConversion.RGBA_TO_NV12, PixelFormat.RGBA, PixelFormat.NV12),
+        RGBA_TO_NV12(PixelFormat.RGBA, PixelFormat.NV12),
         /** BGRA to RGBA, alpha kept. */
-        BGRA_TO_RGBA(ColorConversion.BGRA_TO_RGBA, PixelFormat.BGRA, PixelFormat.RGBA),
+        BGRA_TO_RGBA(PixelFormat.BGRA, PixelFormat.RGBA),
         /** RGBA to BGRA, alpha kept. */
-        RGBA_TO_BGRA(ColorConversion.BGRA_TO_RGBA, PixelFormat.RGBA, PixelFormat.BGRA);
+        RGBA_TO_BGRA(PixelFormat.RGBA, PixelFormat.BGRA);
 
-        private final int code;
         private final PixelFormat source;
         private final PixelFormat result;
 
-        Conversion(int code, PixelFormat source, PixelFormat result) {
-            this.code = code;
+        Conversion(PixelFormat source, PixelFormat result) {
             this.source = source;
             this.result = result;
         }
@@ -65,12 +67,25 @@ public final class Images {
     /**
      * Converts an image.
      *
+     * <p>The colours of a 4:2:0 image are those of full-range YUV with a matrix of this library's own, near to BT.601's.
+     * With Y from 0 to 255 and U and V less 128:
+     *
+     * <pre>
+     * R = (64 Y        + 86 V + 32) &gt;&gt; 6            Y = (38 R + 74 G + 16 B + 64) &gt;&gt; 7
+     * G = (64 Y - 24 U - 44 V + 32) &gt;&gt; 6            U = (-22 R - 43 G + 65 B + 64) &gt;&gt; 7
+     * B = (64 Y + 110 U       + 32) &gt;&gt; 6            V = (67 R - 55 G - 12 B + 64) &gt;&gt; 7
+     * </pre>
+     *
+     * <p>clamped to 0 to 255. Towards pixels each pair of U and V serves 2 x 2 pixels as it is; towards frames it is that
+     * of their upper left pixel.
+     *
      * @param src the source, of exactly the size that its layout takes
      * @param width width in pixels
      * @param height height in pixels
      * @param conversion what to convert
      * @param reuse the array to write, or null for a new one; not {@code src}
      * @return the result
+     * @throws NullPointerException when the source or the conversion is null
      * @throws IllegalArgumentException when a size does not fit
      */
     public static byte @NotNull [] convert(
@@ -78,21 +93,60 @@ public final class Images {
         Check.notNull("conversion", conversion);
         Check.packedImage("src", src, conversion.source, width, height);
         byte[] out = Check.output(reuse, Check.packedBytes(conversion.result, width, height), src);
-        FaceLibrary.convertColorSpace(src, width, height, out, conversion.code);
+        if (conversion.source.isSemiPlanar()) {
+            frameToPixels(src, conversion.source, width, height, 0, 0, width, height, conversion.result, out);
+        } else {
+            PixelConversion.check(PixelConversion.convert(src, width, height, out, pixelConversion(conversion)));
+        }
         return out;
+    }
+
+    private static int pixelConversion(Conversion conversion) {
+        switch (conversion.result) {
+            case NV21: return PixelConversion.RGBA_TO_NV21;
+            case NV12: return PixelConversion.RGBA_TO_NV12;
+            default: return PixelConversion.SWAP_RED_AND_BLUE;
+        }
+    }
+
+    /** What native code is told of a frame; one array a thread, so that none is made per call. */
+    private static final ThreadLocal<int[]> PICTURE = new ThreadLocal<int[]>() {
+        @Override
+        protected int[] initialValue() {
+            return new int[PlaneConversion.NUMBERS];
+        }
+    };
+
+    /** A rectangle of a packed frame as packed pixels; all sizes were checked. */
+    private static void frameToPixels(
+            byte[] frame, PixelFormat format, int width, int height, int x, int y, int w, int h, PixelFormat result,
+            byte[] out) {
+        int[] picture = PICTURE.get();
+        PlaneConversion.describe(picture, width, height, frame.length, format == PixelFormat.NV21);
+        PlaneConversion.check(PlaneConversion.toBytes(frame, frame, frame, picture, x, y, w, h, 0, false,
+                layoutOf(result), out, 0, (int) result.rowBytes(evenLength(x, w))));
+    }
+
+    private static int layoutOf(PixelFormat pixels) {
+        switch (pixels) {
+            case RGBA: return PlaneConversion.RGBA;
+            case BGRA: return PlaneConversion.BGRA;
+            default: return PlaneConversion.BGR;
+        }
     }
 
     /**
      * Cuts a rectangle out of a camera frame and converts it to RGBA. The rectangle is made even, as 4:2:0 needs it:
      * its left and top edge move to the even position before, its right and bottom edge to the one behind.
      *
-     * @param frame the frame, NV21
+     * @param frame the frame, NV21 or NV12
      * @param x left edge in pixels, in the frame
      * @param y top edge
      * @param w width in pixels, to within the frame
      * @param h height
      * @param reuse the array to write, of {@code evenWidth * evenHeight * 4} bytes, or null for a new one
      * @return the pixels; see {@link #evenLength} for their width and height
+     * @throws NullPointerException when the frame is null
      * @throws IllegalArgumentException when the rectangle is not inside the frame or a size does not fit
      * @throws IllegalStateException when the frame was never filled
      */
@@ -101,15 +155,12 @@ public final class Images {
         Check.notNull("frame", frame);
         synchronized (frame.lock) {
             frame.checkFilled();
-            if (frame.format() != PixelFormat.NV21) {
-                throw new IllegalArgumentException("frame must be NV21, not " + frame.format());
-            }
             Check.rectangle(x, y, w, h, frame.width(), frame.height());
             int evenW = evenLength(x, w);
             int evenH = evenLength(y, h);
             byte[] out = Check.output(reuse, Check.packedBytes(PixelFormat.RGBA, evenW, evenH), frame.data());
-            FaceLibrary.cropNv21Data(
-                    frame.data(), frame.width(), frame.height(), x & ~1, y & ~1, evenW, evenH, out);
+            frameToPixels(frame.data(), frame.format(), frame.width(), frame.height(), x, y, w, h, PixelFormat.RGBA,
+                    out);
             return out;
         }
     }
@@ -138,6 +189,7 @@ public final class Images {
      * @param degrees 90, 180 or 270
      * @param reuse the array to write, or null for a new one; not {@code src}
      * @return the result; with 90 and 270 its width is {@code height} and its height {@code width}
+     * @throws NullPointerException when the source is null
      * @throws IllegalArgumentException when a size or the angle does not fit
      */
     public static byte @NotNull [] rotate(
@@ -147,17 +199,9 @@ public final class Images {
             throw Check.refusal("degrees", "90, 180 or 270", degrees);
         }
         byte[] out = Check.output(reuse, src.length, src);
-        FaceLibrary.rotateBGR(src, width, height, out, degrees, OUT_SIZE.get());
+        PixelConversion.check(PixelConversion.rotate(src, width, height, 3, degrees, out));
         return out;
     }
-
-    /** Where native code writes a size that is known already; one array a thread, so that none is made per call. */
-    private static final ThreadLocal<int[]> OUT_SIZE = new ThreadLocal<int[]>() {
-        @Override
-        protected int[] initialValue() {
-            return new int[2];
-        }
-    };
 
     /**
      * Averages the luma of a rectangle of a camera frame.
@@ -167,7 +211,8 @@ public final class Images {
      * @param y top edge
      * @param w width in pixels, to within the frame
      * @param h height
-     * @return 0 (black) to 1 (white)
+     * @return 0 (black) to 1 (white), of frames of any size
+     * @throws NullPointerException when the frame is null
      * @throws IllegalArgumentException when the rectangle is not inside the frame
      * @throws IllegalStateException when the frame was never filled
      */
@@ -176,9 +221,8 @@ public final class Images {
         synchronized (frame.lock) {
             frame.checkFilled();
             Check.rectangle(x, y, w, h, frame.width(), frame.height());
-            // The native method clips the height by x + h. Given a height that holds both, it clips nothing here.
-            int height = Math.max(frame.height(), x + h);
-            return FaceLibrary.averageBrightness(frame.data(), frame.width(), height, x, y, w, h);
+            long sum = PixelConversion.check(PixelConversion.sumBytes(frame.data(), frame.width(), x, y, w, h));
+            return (float) sum / (float) ((long) w * h * 255);
         }
     }
 
@@ -194,7 +238,8 @@ public final class Images {
      * @param y top edge
      * @param w width in pixels, to within the image
      * @param h height
-     * @return 0 (black) to 255 (white)
+     * @return 0 (black) to 255 (white), the rounded mean, of images of any size
+     * @throws NullPointerException when the image or the format is null
      * @throws IllegalArgumentException when a size, the rectangle or the format does not fit
      */
     public static int lightness(
@@ -203,13 +248,13 @@ public final class Images {
         Check.notNull("image", image);
         Check.image(format, width, height, stride, image.length, 1);
         Check.rectangle(x, y, w, h, width, height);
-        boolean rgba = format == PixelFormat.RGBA;
-        if (!rgba && format != PixelFormat.BGRA) {
-            throw new IllegalArgumentException("format must be RGBA or BGRA, not " + format);
+        if (format != PixelFormat.RGBA && format != PixelFormat.BGRA) {
+            throw Check.refusal("format", "RGBA or BGRA", format);
         }
-        return FaceLibrary.faceBrightEvaluate(image,
-                rgba ? BrightnessMetric.LIGHTNESS_RGBA : BrightnessMetric.LIGHTNESS_BGRA, width, stride, height, height,
-                x, y, w, h);
+        boolean rgba = format == PixelFormat.RGBA;
+        long sum = PixelConversion.check(PixelConversion.sumLightness(image, stride, rgba, x, y, w, h));
+        long area = (long) w * h;
+        return (int) ((sum + area / 2) / area);
     }
 
     /**
@@ -219,54 +264,27 @@ public final class Images {
      * @param format {@link PixelFormat#BGRA} or {@link PixelFormat#BGR}
      * @param reuse the array to write, or null for a new one
      * @return the pixels
-     * @throws IllegalArgumentException when the bitmap is recycled or of another configuration, or a size or the
-     *     format does not fit
+     * @throws NullPointerException when the bitmap or the format is null
+     * @throws IllegalArgumentException when the bitmap is recycled, before or meanwhile, or of another configuration,
+     *     or a size or the format does not fit; nothing was written then
      */
     public static byte @NotNull [] pixels(
             @NotNull Bitmap bitmap, @NotNull PixelFormat format, byte @Nullable [] reuse) {
         Check.notNull("bitmap", bitmap);
         Check.notNull("format", format);
-        boolean bgra = format == PixelFormat.BGRA;
-        if (!bgra && format != PixelFormat.BGR) {
-            throw new IllegalArgumentException("format must be BGRA or BGR, not " + format);
+        if (format != PixelFormat.BGRA && format != PixelFormat.BGR) {
+            throw Check.refusal("format", "BGRA or BGR", format);
         }
         if (bitmap.isRecycled()) {
             throw new IllegalArgumentException("bitmap is recycled");
         }
         if (bitmap.getConfig() != Bitmap.Config.ARGB_8888) {
-            throw new IllegalArgumentException("bitmap must be ARGB_8888, not " + bitmap.getConfig());
+            throw Check.refusal("bitmap", "ARGB_8888", bitmap.getConfig());
         }
         int width = bitmap.getWidth();
         int height = bitmap.getHeight();
-        int rowBytes = Check.packedBytes(PixelFormat.RGBA, width, 1);
         byte[] out = Check.output(reuse, Check.packedBytes(format, width, height), null);
-        if (bitmap.getRowBytes() != rowBytes) {
-            // The native methods take rows as packed; this one is not, so its rows are moved together first.
-            stridedPixels(bitmap, bgra ? 4 : 3, out);
-        } else if (bgra) {
-            FaceLibrary.getBGRADataFromBitmap(bitmap, out);
-        } else {
-            FaceLibrary.getBGRDataFromBitmap(bitmap, out);
-        }
+        PixelConversion.check(PixelConversion.read(bitmap, width, height, format.bytesPerPixel(), out));
         return out;
-    }
-
-    private static void stridedPixels(Bitmap bitmap, int bytesPerPixel, byte[] out) {
-        int stride = bitmap.getRowBytes();
-        byte[] rgba = new byte[Math.multiplyExact(stride, bitmap.getHeight())];
-        bitmap.copyPixelsToBuffer(ByteBuffer.wrap(rgba));
-        int to = 0;
-        for (int row = 0; row < bitmap.getHeight(); row++) {
-            int from = row * stride;
-            for (int end = from + bitmap.getWidth() * 4; from < end; from += 4) {
-                out[to] = rgba[from + 2];
-                out[to + 1] = rgba[from + 1];
-                out[to + 2] = rgba[from];
-                if (bytesPerPixel == 4) {
-                    out[to + 3] = rgba[from + 3];
-                }
-                to += bytesPerPixel;
-            }
-        }
     }
 }

@@ -8,6 +8,7 @@ import static org.junit.Assert.assertTrue;
 import static org.junit.Assert.fail;
 
 import android.graphics.Bitmap;
+import java.util.Arrays;
 import java.util.Random;
 import org.junit.BeforeClass;
 import org.junit.Test;
@@ -31,6 +32,9 @@ public final class ImagesTest {
     @Test
     public void conversionsAreThoseOfTheNativeMethod() {
         for (Images.Conversion conversion : Images.Conversion.values()) {
+            if (codeOf(conversion) == NO_CODE) {
+                continue;
+            }
             byte[] src = random((int) packed(conversion.source()));
             byte[] want = new byte[(int) packed(conversion.result())];
             FaceLibrary.convertColorSpace(src, WIDTH, HEIGHT, want, codeOf(conversion));
@@ -42,9 +46,37 @@ public final class ImagesTest {
         }
     }
 
+    @Test
+    public void bothFrameLayoutsGiveEveryPixelLayout() {
+        for (int width = 2; width <= 70; width += 2) {
+            byte[] frame = random(width * 6 * 3 / 2);
+            for (Images.Conversion conversion : Images.Conversion.values()) {
+                if (!conversion.source().isSemiPlanar()) {
+                    continue;
+                }
+                byte[] want = ColorReference.toPixels(frame, width, 6,
+                        conversion.source() == PixelFormat.NV21 ? ColorReference.Chroma.VU : ColorReference.Chroma.UV,
+                        ColorReference.Layout.valueOf(conversion.result().name()));
+                assertArrayEquals(conversion + " " + width, want, Images.convert(frame, width, 6, conversion, null));
+            }
+        }
+        int conversions = 0;
+        for (PixelFormat frame : new PixelFormat[] {PixelFormat.NV21, PixelFormat.NV12}) {
+            for (PixelFormat pixels : new PixelFormat[] {PixelFormat.RGBA, PixelFormat.BGRA, PixelFormat.BGR}) {
+                Images.Conversion conversion = Images.Conversion.valueOf(frame + "_TO_" + pixels);
+                assertSame(frame, conversion.source());
+                assertSame(pixels, conversion.result());
+                conversions++;
+            }
+        }
+        assertEquals(6, conversions);
+    }
+
     private static long packed(PixelFormat format) {
         return format.imageBytes(WIDTH, HEIGHT, (int) format.rowBytes(WIDTH));
     }
+
+    private static final int NO_CODE = -1;
 
     private static int codeOf(Images.Conversion conversion) {
         switch (conversion) {
@@ -54,7 +86,9 @@ public final class ImagesTest {
             case NV12_TO_BGRA: return 5;
             case RGBA_TO_NV12: return 20;
             case NV21_TO_BGR: return 1001;
-            default: return 14;
+            case BGRA_TO_RGBA: return 14;
+            case RGBA_TO_BGRA: return 14;
+            default: return NO_CODE;
         }
     }
 
@@ -137,8 +171,25 @@ public final class ImagesTest {
 
     @Test
     public void cropsAreMadeEven() {
+        for (PixelFormat format : new PixelFormat[] {PixelFormat.NV21, PixelFormat.NV12}) {
+            cropsAreMadeEven(CameraFrame.of(random(WIDTH * HEIGHT * 3 / 2), format, WIDTH, HEIGHT, 0));
+        }
         CameraFrame frame = CameraFrame.of(random(WIDTH * HEIGHT * 3 / 2), PixelFormat.NV21, WIDTH, HEIGHT, 0);
-        byte[] whole = Images.convert(frame.data(), WIDTH, HEIGHT, Images.Conversion.NV21_TO_RGBA, null);
+        refused("x", () -> Images.crop(frame, -1, 0, 2, 2, null));
+        refused("x", () -> Images.crop(frame, WIDTH - 1, 0, 2, 2, null));
+        refused("y", () -> Images.crop(frame, 0, HEIGHT, 2, 2, null));
+        refused("w", () -> Images.crop(frame, 0, 0, 0, 2, null));
+        refused("h", () -> Images.crop(frame, 0, 0, 2, -2, null));
+        refused("x", () -> Images.crop(frame, 2, 0, Integer.MAX_VALUE, 2, null));
+        refused("reuse.length", () -> Images.crop(frame, 0, 0, 2, 2, new byte[3]));
+        CameraFrame small = CameraFrame.of(random(96), PixelFormat.NV21, 16, 4, 0);
+        refused("reuse must not", () -> Images.crop(small, 0, 0, 12, 2, small.data()));
+    }
+
+    private static void cropsAreMadeEven(CameraFrame frame) {
+        byte[] whole = ColorReference.toPixels(frame.data(), WIDTH, HEIGHT,
+                frame.format() == PixelFormat.NV21 ? ColorReference.Chroma.VU : ColorReference.Chroma.UV,
+                ColorReference.Layout.RGBA);
         for (int x = 0; x < WIDTH; x += 3) {
             for (int y = 0; y < HEIGHT; y += 3) {
                 for (int w = 1; w <= WIDTH - x; w += 2) {
@@ -157,15 +208,6 @@ public final class ImagesTest {
                 }
             }
         }
-        refused("x", () -> Images.crop(frame, -1, 0, 2, 2, null));
-        refused("x", () -> Images.crop(frame, WIDTH - 1, 0, 2, 2, null));
-        refused("y", () -> Images.crop(frame, 0, HEIGHT, 2, 2, null));
-        refused("w", () -> Images.crop(frame, 0, 0, 0, 2, null));
-        refused("h", () -> Images.crop(frame, 0, 0, 2, -2, null));
-        refused("x", () -> Images.crop(frame, 2, 0, Integer.MAX_VALUE, 2, null));
-        refused("reuse.length", () -> Images.crop(frame, 0, 0, 2, 2, new byte[3]));
-        CameraFrame small = CameraFrame.of(random(96), PixelFormat.NV21, 16, 4, 0);
-        refused("reuse must not", () -> Images.crop(small, 0, 0, 12, 2, small.data()));
     }
 
     @Test
@@ -212,11 +254,72 @@ public final class ImagesTest {
         refused("x", () -> Images.brightness(frame, WIDTH, 0, 1, 1));
     }
 
+    /** Beyond what the native metrics' 32 bits hold. */
+    @Test
+    public void brightnessOfManyPixels() {
+        int width = 4096;
+        int height = 2160;
+        byte[] data = new byte[width * height * 3 / 2];
+        Arrays.fill(data, (byte) 128);
+        CameraFrame frame = CameraFrame.of(data, PixelFormat.NV21, width, height, 0);
+        assertEquals(128 / 255.0, Images.brightness(frame, 0, 0, width, height), 1e-7);
+        Arrays.fill(data, 0, width * height, (byte) 255);
+        assertEquals(1, Images.brightness(frame, 0, 0, width, height), 0);
+        new Random(5).nextBytes(data);
+        long sum = 0;
+        for (int i = 0; i < width * height; i++) {
+            sum += data[i] & 0xFF;
+        }
+        assertEquals(sum / (255.0 * width * height), Images.brightness(frame, 0, 0, width, height), 1e-7);
+    }
+
+    @Test
+    public void lightnessOfManyPixels() {
+        int width = 6000;
+        int height = 3000;
+        byte[] pixels = new byte[width * height * 4];
+        for (int value : new int[] {255, 128}) {
+            Arrays.fill(pixels, (byte) value);
+            int want = Images.lightness(pixels, PixelFormat.RGBA, width, height, width * 4, 0, 0, 1, 1);
+            assertEquals(value == 255 ? 255 : 137, want);
+            assertEquals(want, Images.lightness(pixels, PixelFormat.RGBA, width, height, width * 4, 0, 0, width, height));
+            int all = width * height;
+            assertEquals(want, Images.lightness(pixels, PixelFormat.BGRA, all, 1, all * 4, 0, 0, all, 1));
+        }
+        // Rows of black above: the mean is rounded once, over all of them.
+        int gray = 137;
+        for (int black : new int[] {1, 7, 1499, 1500, 2999}) {
+            Arrays.fill(pixels, 0, black * width * 4, (byte) 0);
+            long sum = (long) gray * (height - black) * width;
+            long area = (long) width * height;
+            assertEquals((sum + area / 2) / area,
+                    Images.lightness(pixels, PixelFormat.BGRA, width, height, width * 4, 0, 0, width, height));
+        }
+    }
+
+    @Test
+    public void lightnessIsThatOfTheNativeMetric() {
+        byte[] pixels = random(WIDTH * HEIGHT * 4);
+        for (int x = 0; x < WIDTH; x += 3) {
+            for (int y = 0; y < HEIGHT; y += 2) {
+                for (int w = 1; w <= WIDTH - x; w += 2) {
+                    int h = HEIGHT - y;
+                    assertEquals(FaceLibrary.faceBrightEvaluate(pixels, BrightnessMetric.LIGHTNESS_RGBA, WIDTH,
+                            WIDTH * 4, HEIGHT, HEIGHT, x, y, w, h),
+                            Images.lightness(pixels, PixelFormat.RGBA, WIDTH, HEIGHT, WIDTH * 4, x, y, w, h));
+                    assertEquals(FaceLibrary.faceBrightEvaluate(pixels, BrightnessMetric.LIGHTNESS_BGRA, WIDTH,
+                            WIDTH * 4, HEIGHT, HEIGHT, x, y, w, h),
+                            Images.lightness(pixels, PixelFormat.BGRA, WIDTH, HEIGHT, WIDTH * 4, x, y, w, h));
+                }
+            }
+        }
+    }
+
     @Test
     public void lightnessIsMeasuredInsideTheImage() {
         byte[] pixels = new byte[WIDTH * HEIGHT * 4];
         assertEquals(0, Images.lightness(pixels, PixelFormat.RGBA, WIDTH, HEIGHT, WIDTH * 4, 0, 0, WIDTH, HEIGHT));
-        java.util.Arrays.fill(pixels, (byte) 255);
+        Arrays.fill(pixels, (byte) 255);
         assertEquals(255, Images.lightness(pixels, PixelFormat.BGRA, WIDTH, HEIGHT, WIDTH * 4, 3, 2, 5, 7));
         refused("stride", () -> Images.lightness(pixels, PixelFormat.RGBA, WIDTH, HEIGHT, WIDTH, 0, 0, 1, 1));
         refused("image", () ->

@@ -5,6 +5,7 @@ import static org.junit.Assert.assertFalse;
 
 import android.graphics.Bitmap;
 import java.io.IOException;
+import java.nio.ByteBuffer;
 import java.util.ArrayList;
 import java.util.Arrays;
 import java.util.List;
@@ -85,6 +86,38 @@ public class LoggingTest {
     @Test
     public void conversionsAloneWhenOff() throws IOException, InterruptedException {
         assertLogs("off", Arrays.asList(CONVERSIONS));
+    }
+
+    @Test
+    public void theCheckedImageOperationsSayNothing() throws IOException, InterruptedException {
+        Child child = Child.run(CheckedCalls.class);
+        assertEquals(child.output, 0, child.exitStatus);
+        assertEquals(Arrays.asList(), child.errors);
+    }
+
+    /** Everything that the checked classes do to images, with the switch as it is at first. */
+    static final class CheckedCalls {
+        public static void main(String[] args) {
+            for (Images.Conversion conversion : Images.Conversion.values()) {
+                PixelFormat source = conversion.source();
+                int bytes = (int) source.imageBytes(16, 16, (int) source.rowBytes(16));
+                Images.convert(new byte[bytes], 16, 16, conversion, null);
+            }
+            for (PixelFormat format : new PixelFormat[] {PixelFormat.NV21, PixelFormat.NV12}) {
+                CameraFrame frame = new CameraFrame(format);
+                ByteBuffer plane = ByteBuffer.allocate(256);
+                frame.fill(16, 16, plane, 16, plane, 8, 1, plane, 8, 1, 0);
+                Images.crop(frame, 1, 1, 3, 3, null);
+                Images.brightness(frame, 0, 0, 16, 16);
+            }
+            for (int degrees : new int[] {90, 180, 270}) {
+                Images.rotate(new byte[16 * 3], 4, 4, degrees, null);
+            }
+            Images.lightness(new byte[64], PixelFormat.RGBA, 4, 4, 16, 0, 0, 4, 4);
+            Bitmap bitmap = Bitmap.createBitmap(4, 4, Bitmap.Config.ARGB_8888);
+            Images.pixels(bitmap, PixelFormat.BGRA, null);
+            Images.pixels(bitmap, PixelFormat.BGR, null);
+        }
     }
 
     /** Makes the calls whose messages are expected above. */

@@ -145,7 +145,7 @@ public final class PackageTest {
     }
 
     /** The classes with native methods. */
-    private static final String[] NATIVE = {"FaceLibrary", "PlaneConversion"};
+    private static final String[] NATIVE = {"FaceLibrary", "PixelConversion", "PlaneConversion"};
 
     private static void nativeMethodsAreThoseOfTheLibrary(ClassLoader loader) throws Exception {
         Set<String> declared = new TreeSet<>();
