@@ -1,6 +1,7 @@
 package com.vantrel.faceapi;
 
 import java.nio.ByteBuffer;
+import java.util.concurrent.atomic.AtomicLong;
 import org.jetbrains.annotations.NotNull;
 import org.jetbrains.annotations.Nullable;
 
@@ -10,9 +11,11 @@ import org.jetbrains.annotations.Nullable;
  * <p>Keep one object and refill it for every frame: once its array has the size, filling allocates nothing.
  *
  * <pre>{@code
+ * YuvPlanes planes = new YuvPlanes();
  * CameraFrame frame = new CameraFrame();
  * // for every image of format YUV_420_888, from Camera2 or CameraX:
- * frame.fill(width, height, y, yRowStride, u, uRowStride, uPixelStride, v, vRowStride, vPixelStride, rotation);
+ * planes.set(image);
+ * frame.fill(planes, rotation);
  * }</pre>
  *
  * <p>A frame keeps its chroma order for life: NV21 unless it was made for NV12, however the planes that fill it lie in
@@ -25,8 +28,15 @@ import org.jetbrains.annotations.Nullable;
 public final class CameraFrame {
     private static final byte[] NOTHING = {};
 
-    /** Held while the frame is read or filled. Who needs an {@link EngineHandle} too takes the handle first. */
+    private static final AtomicLong MADE = new AtomicLong();
+
+    /**
+     * Held while the frame is read or filled. Who needs an {@link EngineHandle} too takes the handle first; who needs
+     * two frames takes first the one that was made first.
+     */
     final Object lock = new Object();
+
+    private final long number = MADE.getAndIncrement();
 
     private final PixelFormat format;
     private byte[] data = NOTHING;
@@ -34,8 +44,11 @@ public final class CameraFrame {
     private int height;
     private int rotationDegrees;
 
-    /** What native code is told of the planes. */
-    private final int[] planes = new int[PlaneConversion.NUMBERS];
+    /** The planes, or this frame, as native code is told of them. */
+    private final int[] numbers = new int[PlaneConversion.NUMBERS];
+
+    /** Cuts faces out of this frame, with arrays that stay for the next face. */
+    private final FaceCutter cutter = new FaceCutter();
 
     /** Creates an NV21 frame without content, which must be filled before use. */
     public CameraFrame() {
@@ -109,6 +122,81 @@ public final class CameraFrame {
     }
 
     /**
+     * Fills this frame from planes as Camera2 and CameraX deliver them, in one pass.
+     *
+     * @param planes the planes, which no other thread may write meanwhile
+     * @param newRotationDegrees by how much the frame must be turned clockwise to be upright: 0, 90, 180 or 270
+     * @throws NullPointerException when the planes are null
+     * @throws IllegalArgumentException when the rotation does not fit, the planes no longer fit their size, or the
+     *     frame's array is the memory of a plane; the frame is as it was then
+     * @throws IllegalStateException when no planes were set
+     */
+    public void fill(@NotNull YuvPlanes planes, int newRotationDegrees) {
+        Check.notNull("planes", planes);
+        Check.rotation("rotationDegrees", newRotationDegrees);
+        int[] picture = planes.described();
+        int newWidth = planes.width();
+        int newHeight = planes.height();
+        synchronized (lock) {
+            byte[] out = arrayFor(newWidth, newHeight);
+            pack(planes.yMemory(), planes.uMemory(), planes.vMemory(), picture, newWidth, newHeight, 0, format, out);
+            set(out, newWidth, newHeight, newRotationDegrees);
+        }
+    }
+
+    /**
+     * Returns this frame turned upright: the same picture, to be turned by 0. What was found in the one is where
+     * {@link FrameTransform#map} says in the other.
+     *
+     * @param reuse the frame to fill, which keeps its own order of chroma, or null for a new one like this; not this
+     * @return the upright frame
+     * @throws IllegalArgumentException when {@code reuse} is this frame, or a frame over the same array; it is as it
+     *     was then
+     * @throws IllegalStateException when the frame was never filled
+     */
+    public @NotNull CameraFrame upright(@Nullable CameraFrame reuse) {
+        if (reuse == this) {
+            throw new IllegalArgumentException("reuse must not be the frame itself");
+        }
+        CameraFrame out = reuse == null ? new CameraFrame(format) : reuse;
+        synchronized (number < out.number ? lock : out.lock) {
+            synchronized (number < out.number ? out.lock : lock) {
+                int[] picture = described();
+                boolean sideways = rotationDegrees == 90 || rotationDegrees == 270;
+                int newWidth = sideways ? height : width;
+                int newHeight = sideways ? width : height;
+                byte[] array = out.arrayFor(newWidth, newHeight);
+                pack(data, data, data, picture, width, height, rotationDegrees, out.format, array);
+                out.set(array, newWidth, newHeight, 0);
+            }
+        }
+        return out;
+    }
+
+    private byte[] arrayFor(int newWidth, int newHeight) {
+        int bytes = Check.packedBytes(format, newWidth, newHeight);
+        return data.length == bytes ? data : new byte[bytes];
+    }
+
+    /** Packs a whole picture of {@code width} x {@code height}, turned. */
+    private static void pack(Object y, Object u, Object v, int[] picture, int width, int height, int degrees,
+            PixelFormat format, byte[] out) {
+        PlaneConversion.check(PlaneConversion.toBytes(y, u, v, picture, 0, 0, width, height, degrees, false,
+                TransformPass.layoutOf(format), out, 0, degrees == 90 || degrees == 270 ? height : width));
+    }
+
+    /** This frame as native code takes it, to be given to it with the array as each plane's memory. Under the lock. */
+    int[] described() {
+        checkFilled();
+        PlaneConversion.describe(numbers, width, height, data.length, format == PixelFormat.NV21);
+        return numbers;
+    }
+
+    FaceCutter cutter() {
+        return cutter;
+    }
+
+    /**
      * Fills this frame from the planes of a YUV_420_888 image, as Camera2 and CameraX deliver them.
      *
      * <p>A plane begins at its buffer's position. The last row may end with its last sample, however long the row
@@ -145,11 +233,10 @@ public final class CameraFrame {
             ByteBuffer luma = readable("y", y, out);
             ByteBuffer cb = readable("u", u, out);
             ByteBuffer cr = readable("v", v, out);
-            PlaneConversion.describe(planes, newWidth, newHeight, luma, yRowStride, cb, uRowStride, uPixelStride, cr,
+            PlaneConversion.describe(numbers, newWidth, newHeight, luma, yRowStride, cb, uRowStride, uPixelStride, cr,
                     vRowStride, vPixelStride);
-            PlaneConversion.check(PlaneConversion.toBytes(PlaneConversion.memory(luma), PlaneConversion.memory(cb),
-                    PlaneConversion.memory(cr), planes, 0, 0, newWidth, newHeight, 0, false,
-                    format == PixelFormat.NV21 ? PlaneConversion.NV21 : PlaneConversion.NV12, out, 0, newWidth));
+            pack(PlaneConversion.memory(luma), PlaneConversion.memory(cb), PlaneConversion.memory(cr), numbers,
+                    newWidth, newHeight, 0, format, out);
             set(out, newWidth, newHeight, newRotationDegrees);
         }
     }

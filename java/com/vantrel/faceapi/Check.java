@@ -1,5 +1,6 @@
 package com.vantrel.faceapi;
 
+import android.graphics.Rect;
 import java.nio.ByteBuffer;
 
 /**
@@ -133,6 +134,14 @@ final class Check {
         positive("h", h);
         range("x", x, 0, (long) width - w);
         range("y", y, 0, (long) height - h);
+    }
+
+    /** A rectangle that is not empty and begins at no negative position, so that its sides are ints. */
+    static void edges(String name, Rect rect) {
+        notNull(name, rect);
+        if (rect.left < 0 || rect.top < 0 || rect.left >= rect.right || rect.top >= rect.bottom) {
+            throw refusal(name, "neither empty nor begin at a negative position", rect);
+        }
     }
 
     /** {@code reuse} when it has the exact length and is not {@code src}, a new array when it is null. */

@@ -1,5 +1,6 @@
 package com.vantrel.faceapi;
 
+import android.graphics.Bitmap;
 import com.vantrel.faceapi.model.FaceInfo;
 import java.util.List;
 import org.jetbrains.annotations.NotNull;
@@ -67,6 +68,22 @@ public final class FaceDetector extends FaceFinder {
      */
     public @NotNull List<FaceInfo> detect(@NotNull CameraFrame frame) {
         return find(frame);
+    }
+
+    /**
+     * Finds the faces of a bitmap, whose pixels are copied once.
+     *
+     * @param bitmap the bitmap, ARGB_8888, which no other thread may write or recycle meanwhile
+     * @param rotationDegrees by how much the bitmap must be turned clockwise to be upright: 0, 90, 180 or 270
+     * @return the faces, in the bitmap's own coordinates; empty when there is none; not modifiable
+     * @throws NullPointerException when the bitmap is null
+     * @throws IllegalArgumentException when the bitmap is recycled, of another configuration or too large for an array,
+     *     or the rotation does not fit
+     * @throws FaceEngineException when the engine fails
+     * @throws IllegalStateException when this detector is closed
+     */
+    public @NotNull List<FaceInfo> detect(@NotNull Bitmap bitmap, int rotationDegrees) {
+        return find(bitmap, rotationDegrees);
     }
 
     /**

@@ -1,5 +1,6 @@
 package com.vantrel.faceapi;
 
+import android.graphics.Bitmap;
 import com.vantrel.faceapi.model.FaceInfo;
 import java.util.Arrays;
 import java.util.Collections;
@@ -15,6 +16,9 @@ abstract class FaceFinder implements AutoCloseable {
 
     private final EngineProfile profile;
     private final String call;
+
+    /** The pixels of the bitmap that is looked at; used under the handle's monitor. */
+    private final BitmapBytes bitmapBytes = new BitmapBytes();
 
     FaceFinder(String kind, String call, EngineProfile profile, long handle, EngineHandle.Destroyer destroyer) {
         this.handle = EngineHandle.own(this, kind, handle, destroyer);
@@ -60,6 +64,17 @@ abstract class FaceFinder implements AutoCloseable {
         int orientation = profile.orientationValue(rotationDegrees);
         synchronized (handle) {
             return listOf(findInInts(handle.value(), image, formatValue, width, height, stride, orientation));
+        }
+    }
+
+    final List<FaceInfo> find(Bitmap bitmap, int rotationDegrees) {
+        BitmapBytes.checkPixels("bitmap", bitmap);
+        int formatValue = profile.formatValue(PixelFormat.RGBA);
+        int orientation = profile.orientationValue(rotationDegrees);
+        synchronized (handle) {
+            long engineHandle = handle.value();
+            return listOf(findInBytes(engineHandle, bitmapBytes.read(bitmap), formatValue, bitmap.getWidth(),
+                    bitmap.getHeight(), bitmap.getRowBytes(), orientation));
         }
     }
 

@@ -1,6 +1,8 @@
 package com.vantrel.faceapi;
 
 import android.graphics.Bitmap;
+import android.graphics.Rect;
+import com.vantrel.faceapi.model.FaceInfo;
 import org.jetbrains.annotations.NotNull;
 import org.jetbrains.annotations.Nullable;
 
@@ -124,15 +126,7 @@ public final class Images {
         int[] picture = PICTURE.get();
         PlaneConversion.describe(picture, width, height, frame.length, format == PixelFormat.NV21);
         PlaneConversion.check(PlaneConversion.toBytes(frame, frame, frame, picture, x, y, w, h, 0, false,
-                layoutOf(result), out, 0, (int) result.rowBytes(evenLength(x, w))));
-    }
-
-    private static int layoutOf(PixelFormat pixels) {
-        switch (pixels) {
-            case RGBA: return PlaneConversion.RGBA;
-            case BGRA: return PlaneConversion.BGRA;
-            default: return PlaneConversion.BGR;
-        }
+                TransformPass.layoutOf(result), out, 0, (int) result.rowBytes(evenLength(x, w))));
     }
 
     /**
@@ -163,6 +157,22 @@ public final class Images {
                     out);
             return out;
         }
+    }
+
+    /**
+     * Cuts a rectangle out of a camera frame; see {@link #crop(CameraFrame, int, int, int, int, byte[])}.
+     *
+     * @param frame the frame
+     * @param rect the rectangle, within the frame
+     * @param reuse the array to write, of {@code evenWidth * evenHeight * 4} bytes, or null for a new one
+     * @return the pixels, RGBA
+     * @throws NullPointerException when the frame or the rectangle is null
+     * @throws IllegalArgumentException when the rectangle is empty or not inside the frame, or a size does not fit
+     * @throws IllegalStateException when the frame was never filled
+     */
+    public static byte @NotNull [] crop(@NotNull CameraFrame frame, @NotNull Rect rect, byte @Nullable [] reuse) {
+        Check.edges("rect", rect);
+        return crop(frame, rect.left, rect.top, rect.right - rect.left, rect.bottom - rect.top, reuse);
     }
 
     /**
@@ -227,6 +237,42 @@ public final class Images {
     }
 
     /**
+     * Averages the luma of a rectangle of a camera frame.
+     *
+     * @param frame the frame
+     * @param rect the rectangle, within the frame
+     * @return 0 (black) to 1 (white)
+     * @throws NullPointerException when the frame or the rectangle is null
+     * @throws IllegalArgumentException when the rectangle is empty or not inside the frame
+     * @throws IllegalStateException when the frame was never filled
+     */
+    public static float brightness(@NotNull CameraFrame frame, @NotNull Rect rect) {
+        Check.edges("rect", rect);
+        return brightness(frame, rect.left, rect.top, rect.right - rect.left, rect.bottom - rect.top);
+    }
+
+    /**
+     * Averages the lightness, L* of CIE Lab, of a rectangle of an RGBA or BGRA image.
+     *
+     * @param image the pixels
+     * @param format {@link PixelFormat#RGBA} or {@link PixelFormat#BGRA}
+     * @param width image width in pixels
+     * @param height image height in pixels
+     * @param stride bytes from one row to the next
+     * @param rect the rectangle, within the image
+     * @return 0 (black) to 255 (white)
+     * @throws NullPointerException when the image, the format or the rectangle is null
+     * @throws IllegalArgumentException when a size, the rectangle or the format does not fit
+     */
+    public static int lightness(
+            byte @NotNull [] image, @NotNull PixelFormat format, int width, int height, int stride,
+            @NotNull Rect rect) {
+        Check.edges("rect", rect);
+        return lightness(image, format, width, height, stride, rect.left, rect.top, rect.right - rect.left,
+                rect.bottom - rect.top);
+    }
+
+    /**
      * Averages the lightness, L* of CIE Lab, of a rectangle of an RGBA or BGRA image.
      *
      * @param image the pixels
@@ -286,5 +332,163 @@ public final class Images {
         byte[] out = Check.output(reuse, Check.packedBytes(format, width, height), null);
         PixelConversion.check(PixelConversion.read(bitmap, width, height, format.bytesPerPixel(), out));
         return out;
+    }
+
+    /**
+     * Makes a bitmap of a camera's planes in one pass: the part, turned and mirrored as the transform says, opaque.
+     *
+     * @param planes the planes, of the size of the transform's frame; no other thread may write them meanwhile
+     * @param transform what becomes of them; a view that it has is not looked at, since views scale what they show
+     * @param reuse the bitmap to write, ARGB_8888 and mutable, of exactly {@link FrameTransform#resultWidth} x
+     *     {@link FrameTransform#resultHeight} pixels, or null for a new one
+     * @return the bitmap
+     * @throws NullPointerException when the planes or the transform is null
+     * @throws IllegalArgumentException when the transform is made for another size, the planes no longer fit theirs, or
+     *     the bitmap does not fit; nothing is written then
+     * @throws IllegalStateException when no planes were set
+     */
+    public static @NotNull Bitmap toBitmap(
+            @NotNull YuvPlanes planes, @NotNull FrameTransform transform, @Nullable Bitmap reuse) {
+        int[] picture = described(planes, transform);
+        return TransformPass.toBitmap(
+                planes.yMemory(), planes.uMemory(), planes.vMemory(), picture, transform, reuse);
+    }
+
+    /**
+     * Makes a bitmap of a camera frame in one pass: the part, turned and mirrored as the transform says, opaque.
+     *
+     * @param frame the frame, of the size of the transform's; the transform's rotation counts, not the frame's
+     * @param transform what becomes of it; a view that it has is not looked at, since views scale what they show
+     * @param reuse the bitmap to write, ARGB_8888 and mutable, of exactly {@link FrameTransform#resultWidth} x
+     *     {@link FrameTransform#resultHeight} pixels, or null for a new one
+     * @return the bitmap
+     * @throws NullPointerException when the frame or the transform is null
+     * @throws IllegalArgumentException when the transform is made for another size or the bitmap does not fit; nothing
+     *     is written then
+     * @throws IllegalStateException when the frame was never filled
+     */
+    public static @NotNull Bitmap toBitmap(
+            @NotNull CameraFrame frame, @NotNull FrameTransform transform, @Nullable Bitmap reuse) {
+        Check.notNull("frame", frame);
+        synchronized (frame.lock) {
+            int[] picture = described(frame, transform);
+            byte[] data = frame.data();
+            return TransformPass.toBitmap(data, data, data, picture, transform, reuse);
+        }
+    }
+
+    /**
+     * Makes packed pixels of a camera's planes in one pass: the part, turned and mirrored as the transform says.
+     *
+     * @param planes the planes, of the size of the transform's frame; no other thread may write them meanwhile
+     * @param transform what becomes of them; a view that it has is not looked at
+     * @param format the result's layout, any; alpha is 255
+     * @param reuse the array to write, of exactly the result's size, or null for a new one; not the memory of a plane
+     * @return {@link FrameTransform#resultWidth} x {@link FrameTransform#resultHeight} pixels
+     * @throws NullPointerException when the planes, the transform or the format is null
+     * @throws IllegalArgumentException when the transform is made for another size, the planes no longer fit theirs, or
+     *     the array does not fit; nothing is written then
+     * @throws IllegalStateException when no planes were set
+     */
+    public static byte @NotNull [] toPixels(
+            @NotNull YuvPlanes planes, @NotNull FrameTransform transform, @NotNull PixelFormat format,
+            byte @Nullable [] reuse) {
+        int[] picture = described(planes, transform);
+        return TransformPass.toPixels(
+                planes.yMemory(), planes.uMemory(), planes.vMemory(), picture, transform, format, reuse);
+    }
+
+    /**
+     * Makes packed pixels of a camera frame in one pass: the part, turned and mirrored as the transform says.
+     *
+     * @param frame the frame, of the size of the transform's; the transform's rotation counts, not the frame's
+     * @param transform what becomes of it; a view that it has is not looked at
+     * @param format the result's layout, any; alpha is 255
+     * @param reuse the array to write, of exactly the result's size, or null for a new one; not the frame's own
+     * @return {@link FrameTransform#resultWidth} x {@link FrameTransform#resultHeight} pixels
+     * @throws NullPointerException when the frame, the transform or the format is null
+     * @throws IllegalArgumentException when the transform is made for another size or the array does not fit; nothing
+     *     is written then
+     * @throws IllegalStateException when the frame was never filled
+     */
+    public static byte @NotNull [] toPixels(
+            @NotNull CameraFrame frame, @NotNull FrameTransform transform, @NotNull PixelFormat format,
+            byte @Nullable [] reuse) {
+        Check.notNull("frame", frame);
+        synchronized (frame.lock) {
+            int[] picture = described(frame, transform);
+            byte[] data = frame.data();
+            return TransformPass.toPixels(data, data, data, picture, transform, format, reuse);
+        }
+    }
+
+    private static int[] described(YuvPlanes planes, FrameTransform transform) {
+        Check.notNull("planes", planes);
+        Check.notNull("transform", transform);
+        int[] picture = planes.described();
+        transform.checkFrame(planes.width(), planes.height());
+        return picture;
+    }
+
+    private static int[] described(CameraFrame frame, FrameTransform transform) {
+        Check.notNull("transform", transform);
+        int[] picture = frame.described();
+        transform.checkFrame(frame.width(), frame.height());
+        return picture;
+    }
+
+    /**
+     * Cuts a face out of a camera's planes: a square around it, upright and brought to one size, to be shown or to be
+     * compared with others.
+     *
+     * <p>Where the face has eyes (68 points in the usual order, or five, and their distance), they lie level, at 36 %
+     * of the height, 36 % of the width apart and centred. Otherwise the square is the rectangle's longer side and a
+     * quarter more, about its middle, turned as the frame is and by the face's roll. What lies beyond the picture is
+     * black. Nothing is mirrored.
+     *
+     * @param planes the planes; no other thread may write them meanwhile
+     * @param rotationDegrees by how much the planes must be turned clockwise to be upright: 0, 90, 180 or 270
+     * @param face the face, in the coordinates of the planes as they are
+     * @param size width and height of the result in pixels
+     * @param reuse the bitmap to write, ARGB_8888 and mutable, of exactly {@code size} x {@code size} pixels, or null
+     *     for a new one
+     * @return the face
+     * @throws NullPointerException when the planes or the face is null, or a face without eyes has no rectangle
+     * @throws IllegalArgumentException when the rotation, the size or the bitmap does not fit, the planes no longer fit
+     *     their size, or the rectangle of a face without eyes is empty; nothing is written then
+     * @throws IllegalStateException when no planes were set
+     */
+    public static @NotNull Bitmap face(
+            @NotNull YuvPlanes planes, int rotationDegrees, @NotNull FaceInfo face, int size, @Nullable Bitmap reuse) {
+        Check.notNull("planes", planes);
+        int[] picture = planes.described();
+        return planes.cutter().cut(planes.yMemory(), planes.uMemory(), planes.vMemory(), picture, planes.width(),
+                planes.height(), rotationDegrees, face, size, reuse);
+    }
+
+    /**
+     * Cuts a face out of a camera frame: a square around it, upright and brought to one size; see
+     * {@link #face(YuvPlanes, int, FaceInfo, int, Bitmap)}.
+     *
+     * @param frame the frame; its rotation says how it is turned
+     * @param face the face, in the frame's coordinates
+     * @param size width and height of the result in pixels
+     * @param reuse the bitmap to write, ARGB_8888 and mutable, of exactly {@code size} x {@code size} pixels, or null
+     *     for a new one
+     * @return the face
+     * @throws NullPointerException when the frame or the face is null, or a face without eyes has no rectangle
+     * @throws IllegalArgumentException when the size or the bitmap does not fit, or the rectangle of a face without
+     *     eyes is empty; nothing is written then
+     * @throws IllegalStateException when the frame was never filled
+     */
+    public static @NotNull Bitmap face(
+            @NotNull CameraFrame frame, @NotNull FaceInfo face, int size, @Nullable Bitmap reuse) {
+        Check.notNull("frame", frame);
+        synchronized (frame.lock) {
+            int[] picture = frame.described();
+            byte[] data = frame.data();
+            return frame.cutter().cut(data, data, data, picture, frame.width(), frame.height(), frame.rotationDegrees(),
+                    face, size, reuse);
+        }
     }
 }

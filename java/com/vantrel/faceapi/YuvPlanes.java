@@ -57,6 +57,12 @@ public final class YuvPlanes {
     private int vRowStride;
     private int vPixelStride;
 
+    /** The planes as native code is told of them. */
+    private final int[] numbers = new int[PlaneConversion.NUMBERS];
+
+    /** Cuts faces out of these planes, with arrays that stay for the next face. */
+    private final FaceCutter cutter = new FaceCutter();
+
     /** Creates an object without planes, which must be set before use. */
     public YuvPlanes() {}
 
@@ -188,7 +194,7 @@ public final class YuvPlanes {
                     rowStride);
         }
         Check.length(name, plane.remaining(), (rows - 1L) * rowStride + row, "bytes from its position on");
-        if (!plane.isDirect() && !plane.hasArray()) {
+        if (!PlaneConversion.isReadable(plane)) {
             throw new IllegalArgumentException(name + " must be a direct buffer or show its array");
         }
     }
@@ -221,35 +227,27 @@ public final class YuvPlanes {
         checkPlane("v", v, height / 2, width / 2, vRowStride, vPixelStride);
     }
 
-    ByteBuffer y() {
-        return y;
+    /** The planes as native code takes them, to be given to it with each one's memory; checked now. */
+    int[] described() {
+        checkSet();
+        PlaneConversion.describe(
+                numbers, width, height, y, yRowStride, u, uRowStride, uPixelStride, v, vRowStride, vPixelStride);
+        return numbers;
     }
 
-    ByteBuffer u() {
-        return u;
+    Object yMemory() {
+        return PlaneConversion.memory(y);
     }
 
-    ByteBuffer v() {
-        return v;
+    Object uMemory() {
+        return PlaneConversion.memory(u);
     }
 
-    int yRowStride() {
-        return yRowStride;
+    Object vMemory() {
+        return PlaneConversion.memory(v);
     }
 
-    int uRowStride() {
-        return uRowStride;
-    }
-
-    int uPixelStride() {
-        return uPixelStride;
-    }
-
-    int vRowStride() {
-        return vRowStride;
-    }
-
-    int vPixelStride() {
-        return vPixelStride;
+    FaceCutter cutter() {
+        return cutter;
     }
 }

@@ -56,6 +56,14 @@ public final class Bitmap {
         return new Bitmap(width, height, config, width * config.bytesPerPixel);
     }
 
+    /** Creates an immutable bitmap of 0xAARRGGBB values. */
+    public static Bitmap createBitmap(int[] colors, int width, int height, Config config) {
+        Bitmap bitmap = createBitmap(width, height, config);
+        bitmap.setPixels(colors, 0, width, 0, 0, width, height);
+        bitmap.mutable = false;
+        return bitmap;
+    }
+
     /**
      * Creates a bitmap whose rows lie {@code rowBytes} apart, as a device's graphics memory may have them. Android
      * has no such method: there the system chooses.
@@ -97,47 +105,94 @@ public final class Bitmap {
         return config;
     }
 
-    /** Sets one pixel from a 0xAARRGGBB value; a 16-bit bitmap keeps the high bits and no alpha. */
+    /** Bytes of all rows. */
+    public int getByteCount() {
+        return rowBytes * height;
+    }
+
+    /**
+     * Sets one pixel from a 0xAARRGGBB value. Colours are kept multiplied by alpha; a 16-bit bitmap keeps the high bits
+     * of each, and no alpha.
+     */
     public void setPixel(int x, int y, int color) {
-        int at = offset(x, y);
-        if (config == Config.RGB_565) {
-            pixels.putShort(at, (short) ((color >> 8 & 0xF800) | (color >> 5 & 0x07E0) | (color >> 3 & 0x001F)));
-        } else {
-            pixels.put(at, (byte) (color >> 16));
-            pixels.put(at + 1, (byte) (color >> 8));
-            pixels.put(at + 2, (byte) color);
-            pixels.put(at + 3, (byte) (color >> 24));
+        checkAlive();
+        checkMutable();
+        set(offset(x, y), color);
+    }
+
+    /** Reads one pixel as a 0xAARRGGBB value, colours divided by alpha again. */
+    public int getPixel(int x, int y) {
+        checkAlive();
+        return get(offset(x, y));
+    }
+
+    /** Sets a rectangle from 0xAARRGGBB values, whose rows lie {@code stride} apart from {@code offset} on. */
+    public void setPixels(int[] colors, int offset, int stride, int x, int y, int w, int h) {
+        checkAlive();
+        checkMutable();
+        if (w == 0 || h == 0) {
+            return;
+        }
+        checkPixels(colors.length, offset, stride, x, y, w, h);
+        for (int row = 0; row < h; row++) {
+            for (int column = 0; column < w; column++) {
+                set(offset(x + column, y + row), colors[offset + row * stride + column]);
+            }
         }
     }
 
-    /** Reads one pixel as a 0xAARRGGBB value. */
-    public int getPixel(int x, int y) {
-        int at = offset(x, y);
-        if (config == Config.RGB_565) {
-            int word = pixels.getShort(at);
-            int red = word >> 11 & 0x1F;
-            int green = word >> 5 & 0x3F;
-            int blue = word & 0x1F;
-            return 0xFF000000 | (red << 3 | red >> 2) << 16 | (green << 2 | green >> 4) << 8 | (blue << 3 | blue >> 2);
+    /** Reads a rectangle as 0xAARRGGBB values, whose rows lie {@code stride} apart from {@code offset} on. */
+    public void getPixels(int[] colors, int offset, int stride, int x, int y, int w, int h) {
+        checkAlive();
+        if (w == 0 || h == 0) {
+            return;
         }
-        return (pixels.get(at + 3) & 0xFF) << 24 | (pixels.get(at) & 0xFF) << 16 | (pixels.get(at + 1) & 0xFF) << 8
-                | (pixels.get(at + 2) & 0xFF);
+        checkPixels(colors.length, offset, stride, x, y, w, h);
+        for (int row = 0; row < h; row++) {
+            for (int column = 0; column < w; column++) {
+                colors[offset + row * stride + column] = get(offset(x + column, y + row));
+            }
+        }
+    }
+
+    /** Sets all pixels to a 0xAARRGGBB value. */
+    public void eraseColor(int color) {
+        checkAlive();
+        checkMutable();
+        for (int y = 0; y < height; y++) {
+            for (int x = 0; x < width; x++) {
+                set(offset(x, y), color);
+            }
+        }
     }
 
     /** Copies all rows, as they lie in memory, to the buffer's position and moves that behind them. */
     public void copyPixelsToBuffer(Buffer dst) {
-        if (pixels == null) {
-            throw new IllegalStateException("the bitmap is recycled");
+        checkAlive();
+        ByteBuffer to = bytes(dst);
+        pixels.clear();
+        to.put(pixels);
+    }
+
+    /** Takes all rows, as they lie in memory, from the buffer's position and moves that behind them. */
+    public void copyPixelsFromBuffer(Buffer src) {
+        checkAlive();
+        ByteBuffer from = bytes(src);
+        ByteBuffer rows = from.duplicate();
+        rows.limit(rows.position() + pixels.capacity());
+        pixels.clear();
+        pixels.put(rows);
+        from.position(rows.limit());
+    }
+
+    private ByteBuffer bytes(Buffer buffer) {
+        if (!(buffer instanceof ByteBuffer)) {
+            throw new RuntimeException("the stand-in copies from and to byte buffers only");
         }
-        if (!(dst instanceof ByteBuffer)) {
-            throw new RuntimeException("the stand-in copies to byte buffers only");
-        }
-        if (dst.remaining() < pixels.capacity()) {
+        if (buffer.remaining() < pixels.capacity()) {
             throw new RuntimeException("the buffer is not large enough for the pixels");
         }
-        ByteBuffer all = pixels.duplicate();
-        all.clear();
-        ((ByteBuffer) dst).put(all);
+        return (ByteBuffer) buffer;
     }
 
     /** Gives the pixels up; the bitmap cannot be used afterwards. */
@@ -173,12 +228,68 @@ public final class Bitmap {
         locks--;
     }
 
+    private void set(int at, int color) {
+        int alpha = color >>> 24;
+        int red = times(color >> 16 & 0xFF, alpha);
+        int green = times(color >> 8 & 0xFF, alpha);
+        int blue = times(color & 0xFF, alpha);
+        if (config == Config.RGB_565) {
+            pixels.putShort(at, (short) (red >> 3 << 11 | green >> 2 << 5 | blue >> 3));
+        } else {
+            pixels.put(at, (byte) red);
+            pixels.put(at + 1, (byte) green);
+            pixels.put(at + 2, (byte) blue);
+            pixels.put(at + 3, (byte) alpha);
+        }
+    }
+
+    private int get(int at) {
+        if (config == Config.RGB_565) {
+            int word = pixels.getShort(at);
+            int red = word >> 11 & 0x1F;
+            int green = word >> 5 & 0x3F;
+            int blue = word & 0x1F;
+            return 0xFF000000 | (red << 3 | red >> 2) << 16 | (green << 2 | green >> 4) << 8 | (blue << 3 | blue >> 2);
+        }
+        int alpha = pixels.get(at + 3) & 0xFF;
+        return alpha << 24 | over(pixels.get(at) & 0xFF, alpha) << 16 | over(pixels.get(at + 1) & 0xFF, alpha) << 8
+                | over(pixels.get(at + 2) & 0xFF, alpha);
+    }
+
+    private static int times(int color, int alpha) {
+        return (color * alpha + 127) / 255;
+    }
+
+    private static int over(int color, int alpha) {
+        return alpha == 0 ? 0 : Math.min(255, (color * 255 + alpha / 2) / alpha);
+    }
+
+    private void checkAlive() {
+        if (pixels == null) {
+            throw new IllegalStateException("the bitmap is recycled");
+        }
+    }
+
+    private void checkMutable() {
+        if (!mutable) {
+            throw new IllegalStateException("the bitmap is immutable");
+        }
+    }
+
+    private void checkPixels(int length, int offset, int stride, int x, int y, int w, int h) {
+        if (x < 0 || y < 0 || w < 0 || h < 0 || x + w > width || y + h > height || Math.abs(stride) < w) {
+            throw new IllegalArgumentException("(" + x + ", " + y + "), " + w + " x " + h + " by " + stride
+                    + " does not fit " + width + " x " + height);
+        }
+        int last = offset + (h - 1) * stride;
+        if (offset < 0 || offset + w > length || last < 0 || last + w > length) {
+            throw new ArrayIndexOutOfBoundsException(last);
+        }
+    }
+
     private int offset(int x, int y) {
         if (x < 0 || x >= width || y < 0 || y >= height) {
             throw new IllegalArgumentException("(" + x + ", " + y + ") is outside " + width + " x " + height);
-        }
-        if (pixels == null) {
-            throw new IllegalStateException("the bitmap is recycled");
         }
         return y * rowBytes + x * config.bytesPerPixel;
     }

@@ -4,6 +4,7 @@ import static org.junit.Assert.assertArrayEquals;
 import static org.junit.Assert.assertEquals;
 
 import android.graphics.Bitmap;
+import java.nio.ByteBuffer;
 import java.util.Arrays;
 import java.util.Random;
 import org.junit.Test;
@@ -15,12 +16,21 @@ public class BitmapTest {
 
     private Bitmap randomBitmap(int width, int height, int rowBytes) {
         Bitmap bitmap = Bitmap.createBitmap(width, height, Bitmap.Config.ARGB_8888, rowBytes);
-        for (int y = 0; y < height; y++) {
-            for (int x = 0; x < width; x++) {
-                bitmap.setPixel(x, y, random.nextInt());
-            }
+        // Any bytes, also colours that are larger than their alpha; the padding stays zero.
+        byte[] bytes = new byte[rowBytes * height];
+        for (int i = 0; i < 4 * width * height; i++) {
+            bytes[i / (4 * width) * rowBytes + i % (4 * width)] = (byte) random.nextInt();
         }
+        bitmap.copyPixelsFromBuffer(ByteBuffer.wrap(bytes));
         return bitmap;
+    }
+
+    /** The bytes of a pixel, from red to alpha, as they lie in memory. */
+    private static byte[] pixel(Bitmap bitmap, int x, int y) {
+        ByteBuffer bytes = ByteBuffer.allocate(bitmap.getByteCount());
+        bitmap.copyPixelsToBuffer(bytes);
+        int at = y * bitmap.getRowBytes() + 4 * x;
+        return Arrays.copyOfRange(bytes.array(), at, at + 4);
     }
 
     private static byte[] untouched(int length) {
@@ -35,11 +45,11 @@ public class BitmapTest {
             Bitmap bitmap = randomBitmap(width, 3, 4 * width);
             byte[] expected = untouched(4 * width * 3 + 16);
             for (int i = 0; i < width * 3; i++) {
-                int argb = bitmap.getPixel(i % width, i / width);
-                expected[4 * i] = (byte) argb;
-                expected[4 * i + 1] = (byte) (argb >> 8);
-                expected[4 * i + 2] = (byte) (argb >> 16);
-                expected[4 * i + 3] = (byte) (argb >> 24);
+                byte[] rgba = pixel(bitmap, i % width, i / width);
+                expected[4 * i] = rgba[2];
+                expected[4 * i + 1] = rgba[1];
+                expected[4 * i + 2] = rgba[0];
+                expected[4 * i + 3] = rgba[3];
             }
             byte[] out = untouched(expected.length);
             FaceLibrary.getBGRADataFromBitmap(bitmap, out);
@@ -54,10 +64,10 @@ public class BitmapTest {
             Bitmap bitmap = randomBitmap(width, 3, 4 * width);
             byte[] expected = untouched(3 * width * 3 + 16);
             for (int i = 0; i < width * 3; i++) {
-                int argb = bitmap.getPixel(i % width, i / width);
-                expected[3 * i] = (byte) argb;
-                expected[3 * i + 1] = (byte) (argb >> 8);
-                expected[3 * i + 2] = (byte) (argb >> 16);
+                byte[] rgba = pixel(bitmap, i % width, i / width);
+                expected[3 * i] = rgba[2];
+                expected[3 * i + 1] = rgba[1];
+                expected[3 * i + 2] = rgba[0];
             }
             byte[] out = untouched(expected.length);
             FaceLibrary.getBGRDataFromBitmap(bitmap, out);
@@ -76,9 +86,9 @@ public class BitmapTest {
         FaceLibrary.getBGRADataFromBitmap(bitmap, out);
         for (int i = 0; i < width * height; i++) {
             int x = i % (width + 2);
-            int argb = x < width ? bitmap.getPixel(x, i / (width + 2)) : 0; // the padding is zero
-            assertEquals("pixel " + i, (byte) argb, out[4 * i]);
-            assertEquals("pixel " + i, (byte) (argb >> 16), out[4 * i + 2]);
+            byte[] rgba = x < width ? pixel(bitmap, x, i / (width + 2)) : new byte[4]; // the padding is zero
+            assertEquals("pixel " + i, rgba[2], out[4 * i]);
+            assertEquals("pixel " + i, rgba[0], out[4 * i + 2]);
         }
     }
 

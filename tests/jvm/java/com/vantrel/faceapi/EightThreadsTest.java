@@ -22,10 +22,12 @@ import org.junit.runner.notification.Failure;
 /** The tests of the classes above the native methods, misuse above all, by eight threads at once. */
 public final class EightThreadsTest {
     private static final int THREADS = 8;
-    private static final Class<?>[] CLASSES = {SafeObjectsTest.class, ImagesTest.class, CameraFrameTest.class};
-    /** These count or time what other threads would disturb. */
-    private static final List<String> ALONE =
-            Arrays.asList("forgottenObjectsAreReclaimed", "closingWaitsForCallsOfOtherThreads");
+    private static final Class<?>[] CLASSES = {
+        SafeObjectsTest.class, ImagesTest.class, CameraFrameTest.class, CameraToScreenTest.class};
+    /** These count or time what other threads would disturb, or take long without saying more here. */
+    private static final List<String> ALONE = Arrays.asList("forgottenObjectsAreReclaimed",
+            "closingWaitsForCallsOfOtherThreads", "everyPixelLandsWhereItsPointIsMappedTo",
+            "framesThatTurnOneAnotherDoNotBlock");
 
     private static List<Request> requests() {
         List<Request> requests = new ArrayList<>();

@@ -336,7 +336,7 @@ public final class ImagesTest {
             byte[] bgr = new byte[7 * 5 * 3];
             Random random = new Random(3);
             for (int i = 0; i < 35; i++) {
-                int color = random.nextInt();
+                int color = random.nextInt() | 0xFF000000; // an alpha of less would scale the colours
                 bitmap.setPixel(i % 7, i / 7, color);
                 for (int c = 0; c < 4; c++) {
                     bgra[i * 4 + c] = (byte) (color >> (8 * c));

@@ -1,5 +1,6 @@
 package com.vantrel.faceapi;
 
+import static org.junit.Assert.assertArrayEquals;
 import static org.junit.Assert.assertEquals;
 import static org.junit.Assert.assertSame;
 import static org.junit.Assert.assertThrows;
@@ -105,14 +106,13 @@ public final class YuvPlanesTest {
         planes.checkSet();
         assertEquals(6, planes.width());
         assertEquals(4, planes.height());
-        assertSame(image.planes[0].getBuffer(), planes.y());
-        assertSame(image.planes[1].getBuffer(), planes.u());
-        assertSame(image.planes[2].getBuffer(), planes.v());
-        assertEquals(8, planes.yRowStride());
-        assertEquals(7, planes.uRowStride());
-        assertEquals(2, planes.uPixelStride());
-        assertEquals(4, planes.vRowStride());
-        assertEquals(1, planes.vPixelStride());
+        assertSame(image.planes[0].getBuffer(), planes.yMemory());
+        assertSame(image.planes[1].getBuffer(), planes.uMemory());
+        assertSame(image.planes[2].getBuffer(), planes.vMemory());
+        int[] expected = new int[PlaneConversion.NUMBERS];
+        PlaneConversion.describe(expected, 6, 4, image.planes[0].getBuffer(), 8, image.planes[1].getBuffer(), 7, 2,
+                image.planes[2].getBuffer(), 4, 1);
+        assertArrayEquals(expected, planes.described());
     }
 
     @Test
@@ -134,14 +134,13 @@ public final class YuvPlanesTest {
         ByteBuffer v = bytes(9 * 1 + 5);
         YuvPlanes planes = YuvPlanes.of(6, 4, new Plane(y, 8, 1), new Plane(u, 4, 1), new Plane(v, 9, 2));
         planes.checkSet();
-        assertSame(y, planes.y());
-        assertSame(u, planes.u());
-        assertSame(v, planes.v());
+        assertSame(y.array(), planes.yMemory());
+        assertSame(u, planes.uMemory());
+        assertSame(v, planes.vMemory());
         assertEquals(10, y.position());
-        assertEquals(9, planes.vRowStride());
-        assertEquals(2, planes.vPixelStride());
-        assertEquals(4, planes.uRowStride());
-        assertEquals(1, planes.uPixelStride());
+        int[] expected = new int[PlaneConversion.NUMBERS];
+        PlaneConversion.describe(expected, 6, 4, y, 8, u, 4, 1, v, 9, 2);
+        assertArrayEquals(expected, planes.described());
     }
 
     @Test
@@ -209,11 +208,11 @@ public final class YuvPlanesTest {
         ByteBuffer y = bytes(4);
         planes.set(2, 2, y, 2, 1, bytes(1), 1, 1, bytes(1), 1, 1);
         assertEquals(2, planes.width());
-        assertSame(y, planes.y());
+        assertSame(y, planes.yMemory());
         // What is refused changes nothing.
         assertThrows(IllegalArgumentException.class,
                 () -> planes.set(4, 2, bytes(8), 4, 1, bytes(2), 2, 1, bytes(1), 2, 1));
         assertEquals(2, planes.width());
-        assertSame(y, planes.y());
+        assertSame(y, planes.yMemory());
     }
 }
