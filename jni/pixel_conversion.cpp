@@ -110,12 +110,15 @@ JNIEXPORT jint JNICALL Java_com_vantrel_faceapi_PixelConversion_rotate(JNIEnv* e
                                                                        jint height, jint bytesPerPixel,
                                                                        jint degrees, jbyteArray dst) {
   const std::int64_t bytes = pixels_of(width, height) * bytesPerPixel;
-  if ((bytesPerPixel != 3 && bytesPerPixel != 4) || (degrees != 90 && degrees != 180 && degrees != 270) ||
-      !holds(env, src, bytes) || !holds(env, dst, bytes)) {
+  if ((bytesPerPixel != 1 && bytesPerPixel != 3 && bytesPerPixel != 4) ||
+      (degrees != 90 && degrees != 180 && degrees != 270) || !holds(env, src, bytes) ||
+      !holds(env, dst, bytes)) {
     return kSizes;
   }
   return with_bytes(env, src, dst, [&](unsigned char* in, unsigned char* out) {
-    if (bytesPerPixel == 3) {
+    if (bytesPerPixel == 1) {
+      rotate(Image<1>(width, height, in), degrees, out);
+    } else if (bytesPerPixel == 3) {
       rotate(Image<3>(width, height, in), degrees, out);
     } else {
       rotate(Image<4>(width, height, in), degrees, out);

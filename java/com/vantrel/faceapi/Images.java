@@ -214,6 +214,34 @@ public final class Images {
     }
 
     /**
+     * Rotates an image of any packed layout clockwise. A camera frame is turned by {@link CameraFrame#upright}.
+     *
+     * @param src the source, of exactly the size that its layout takes
+     * @param format its layout: gray, three or four bytes a pixel
+     * @param width width in pixels
+     * @param height height in pixels
+     * @param degrees 90, 180 or 270
+     * @param reuse the array to write, or null for a new one; not {@code src}
+     * @return the result; with 90 and 270 its width is {@code height} and its height {@code width}
+     * @throws NullPointerException when the source or the format is null
+     * @throws IllegalArgumentException when a size, the format or the angle does not fit
+     */
+    public static byte @NotNull [] rotate(
+            byte @NotNull [] src, @NotNull PixelFormat format, int width, int height, int degrees,
+            byte @Nullable [] reuse) {
+        Check.packedImage("src", src, Check.notNull("format", format), width, height);
+        if (format.isSemiPlanar()) {
+            throw Check.refusal("format", "gray or of three or four bytes a pixel", format);
+        }
+        if (degrees != 90 && degrees != 180 && degrees != 270) {
+            throw Check.refusal("degrees", "90, 180 or 270", degrees);
+        }
+        byte[] out = Check.output(reuse, src.length, src);
+        PixelConversion.check(PixelConversion.rotate(src, width, height, format.bytesPerPixel(), degrees, out));
+        return out;
+    }
+
+    /**
      * Averages the luma of a rectangle of a camera frame.
      *
      * @param frame the frame

@@ -44,7 +44,7 @@ final class PixelConversion {
     /** Converts packed RGBA (or BGRA) pixels; the arrays are two. */
     static native int convert(byte[] src, int width, int height, byte[] dst, int conversion);
 
-    /** Turns packed pixels of 3 or 4 bytes clockwise by 90, 180 or 270 degrees; the arrays are two. */
+    /** Turns packed pixels of 1, 3 or 4 bytes clockwise by 90, 180 or 270 degrees; the arrays are two. */
     static native int rotate(byte[] src, int width, int height, int bytesPerPixel, int degrees, byte[] dst);
 
     /** Reads an ARGB_8888 bitmap of the given sizes, whatever its row stride, as BGR or, with 4 bytes, BGRA. */

@@ -329,6 +329,43 @@ public final class ImagesTest {
     }
 
     @Test
+    public void imagesOfAnyPixelSizeAreTurned() {
+        Random random = new Random(8);
+        PixelFormat[] formats = {
+            PixelFormat.GRAY, PixelFormat.BGR, PixelFormat.RGB, PixelFormat.BGRA, PixelFormat.RGBA};
+        for (PixelFormat format : formats) {
+            int size = format.bytesPerPixel();
+            for (int width = 1; width <= 35; width++) {
+                int height = 1 + random.nextInt(35);
+                byte[] src = new byte[width * height * size];
+                random.nextBytes(src);
+                for (int degrees = 90; degrees <= 270; degrees += 90) {
+                    byte[] expected = new byte[src.length];
+                    int outWidth = degrees == 180 ? width : height;
+                    for (int y = 0; y < height; y++) {
+                        for (int x = 0; x < width; x++) {
+                            int toX = degrees == 90 ? height - 1 - y : degrees == 180 ? width - 1 - x : y;
+                            int toY = degrees == 90 ? x : degrees == 180 ? height - 1 - y : width - 1 - x;
+                            System.arraycopy(
+                                    src, (y * width + x) * size, expected, (toY * outWidth + toX) * size, size);
+                        }
+                    }
+                    byte[] out = new byte[src.length];
+                    assertSame(out, Images.rotate(src, format, width, height, degrees, out));
+                    assertArrayEquals(format + " " + width + " x " + height + " by " + degrees, expected, out);
+                    assertArrayEquals(expected, Images.rotate(src, format, width, height, degrees, null));
+                }
+            }
+        }
+        byte[] src = new byte[24];
+        refused("src.length", () -> Images.rotate(src, PixelFormat.RGBA, 3, 3, 90, null));
+        refused("degrees", () -> Images.rotate(src, PixelFormat.RGBA, 3, 2, 0, null));
+        refused("format", () -> Images.rotate(src, PixelFormat.NV21, 4, 4, 90, null));
+        refused("reuse", () -> Images.rotate(src, PixelFormat.RGBA, 3, 2, 90, src));
+        refused("reuse.length", () -> Images.rotate(src, PixelFormat.RGBA, 3, 2, 90, new byte[23]));
+    }
+
+    @Test
     public void bitmapsOfAnyStrideGiveTheSamePixels() {
         for (int padding : new int[] {0, 4, 12}) {
             Bitmap bitmap = Bitmap.createBitmap(7, 5, Bitmap.Config.ARGB_8888, 7 * 4 + padding);

@@ -262,7 +262,7 @@ public final class PackageTest {
         Pattern block = Pattern.compile("<pre>\\{@code\n(.*?)\n \\* }</pre>", Pattern.DOTALL);
         StringBuilder methods = new StringBuilder();
         int examples = 0;
-        for (String name : new String[] {"FaceDetector", "CameraFrame"}) {
+        for (String name : new String[] {"FaceDetector", "CameraFrame", "YuvPlanes"}) {
             File file = new File(SOURCE, "java/com/vantrel/faceapi/" + name + ".java");
             Matcher example = block.matcher(new String(Files.readAllBytes(file.toPath()), StandardCharsets.UTF_8));
             while (example.find()) {
@@ -270,13 +270,14 @@ public final class PackageTest {
                         .append(example.group(1).replaceAll("(?m)^ \\* ?", "    ")).append("\n  }\n");
             }
         }
-        assertTrue("the examples were not found", examples >= 2);
+        assertTrue("the examples were not found", examples >= 3);
         Path folder = Files.createDirectories(new File(System.getProperty("kyface.work"), "examples").toPath());
         Path source = folder.resolve("Examples.java");
         Files.write(source, ("import com.vantrel.faceapi.*;\nimport com.vantrel.faceapi.model.*;\n"
                 + "import java.nio.ByteBuffer;\nabstract class Examples {\n  CameraFrame frame;\n"
                 + "  int width, height, yRowStride, uRowStride, uPixelStride, vRowStride, vPixelStride, rotation;\n"
-                + "  ByteBuffer y, u, v;\n" + methods + "}\n").getBytes(StandardCharsets.UTF_8));
+                + "  ByteBuffer y, u, v;\n  android.media.Image image;\n  android.graphics.Bitmap bitmap;\n"
+                + "  FrameTransform transform;\n" + methods + "}\n").getBytes(StandardCharsets.UTF_8));
         run(System.getProperty("java.home") + "/bin/javac", "--release", "8", "-Xlint:-options", "-d",
                 folder.toString(), "-cp",
                 extracted("classes.jar") + File.pathSeparator + System.getProperty("kyface.android"),
