@@ -1,6 +1,6 @@
 // Mean gray levels: one sum over three pixel layouts.
 
-#include "brightness.h"
+#include "brightness/brightness.h"
 #include "region.h"
 
 namespace kyface::brightness {

@@ -3,10 +3,10 @@
 
 #include <cstdint>
 
-#include "gamma_planes.h"
-#include "lab_tables.h"
 #include "luminance_tables.h"
 #include "region.h"
+#include "simd/gamma_planes.h"
+#include "simd/lab_tables.h"
 
 namespace kyface::brightness {
 

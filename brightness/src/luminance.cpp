@@ -6,11 +6,11 @@
 #include <cstddef>
 #include <cstdint>
 
-#include "brightness.h"
-#include "lab_tables.h"
+#include "brightness/brightness.h"
 #include "lightness_sum.h"
 #include "luminance_tables.h"
 #include "region.h"
+#include "simd/lab_tables.h"
 
 std::atomic<uint16_t> sRGBGammaTab[256];
 std::atomic<uint16_t> labCbrtTab[3072];

@@ -7,9 +7,9 @@
 #include <cstdio>
 #include <cstring>
 
-#include "clip.h"
-#include "loop.h"
-#include "pixel.h"
+#include "brightness/clip.h"
+#include "simd/loop.h"
+#include "simd/pixel.h"
 
 namespace kyface::brightness {
 

@@ -2,7 +2,7 @@
 #pragma once
 
 #pragma GCC visibility push(default)
-#include "kyface_api.h"
+#include "kyface_api/kyface_api.h"
 #pragma GCC visibility pop
 
-#include "ky_engine.h"
+#include "engine/ky_engine.h"

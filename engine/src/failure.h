@@ -1,7 +1,7 @@
 /// What the engine throws inside; the C interface turns it into its result code.
 #pragma once
 
-#include "ky_engine.h"
+#include "engine/ky_engine.h"
 
 namespace kyengine {
 

@@ -1,7 +1,7 @@
 // Colour conversions of whole camera frames. Their messages are written whatever the debug switch says.
-#include "bridge_log.h"
-#include "frame.h"
-#include "image_view.h"
+#include "base/log.h"
+#include "frame/frame.h"
+#include "frame/image_view.h"
 
 using kyface::Image;
 using kyface::view_420;

@@ -1,9 +1,9 @@
 // Crop and rotation of whole camera frames.
 #include <cstdint>
 
-#include "bridge_log.h"
-#include "frame.h"
-#include "image_view.h"
+#include "base/log.h"
+#include "frame/frame.h"
+#include "frame/image_view.h"
 
 using kyface::Image;
 

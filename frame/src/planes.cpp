@@ -1,4 +1,4 @@
-#include "planes.h"
+#include "frame/planes.h"
 
 #include <algorithm>
 #include <cstdint>

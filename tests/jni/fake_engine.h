@@ -5,7 +5,7 @@
 #include <vector>
 
 #include "fake_vm.h"
-#include "kyface_api.h"
+#include "kyface_api/kyface_api.h"
 
 namespace fake {
 

@@ -4,8 +4,8 @@
 #include <cstdlib>
 
 #include "bridge_test.h"
-#include "frame.h"
-#include "frame_reference.h"
+#include "frame/frame.h"
+#include "tests/support/frame_reference.h"
 
 namespace {
 

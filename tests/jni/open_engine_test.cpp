@@ -2,10 +2,10 @@
 // never gives back stays in the engine's tables; tests/leaks.supp says what that is.
 #include <gtest/gtest.h>
 
+#include "engine/ky_engine.h"
 #include "face_library.h"
 #include "fake_vm.h"
-#include "ky_engine.h"
-#include "picture.h"
+#include "tests/engine/picture.h"
 
 namespace {
 

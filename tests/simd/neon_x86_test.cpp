@@ -8,7 +8,7 @@
 #include <random>
 #include <type_traits>
 
-#include "neon.h"
+#include "simd/neon.h"
 
 namespace {
 

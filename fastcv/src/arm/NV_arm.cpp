@@ -14,7 +14,7 @@
 // Shifts floor. Chroma belongs to a 2 x 2 block and is made from its top-left pixel alone.
 
 #include "entry.h"
-#include "loop.h"
+#include "simd/loop.h"
 
 namespace HPC::fastcv {
 namespace {

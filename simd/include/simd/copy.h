@@ -4,9 +4,9 @@
 #include <cstddef>
 #include <cstring>
 
-#include "neon.h"
-#include "overlap.h"
-#include "registers.h"
+#include "simd/neon.h"
+#include "simd/overlap.h"
+#include "simd/registers.h"
 
 namespace HPC::fastcv::arm {
 

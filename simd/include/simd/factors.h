@@ -1,7 +1,7 @@
 /// Constants that take no register each.
 #pragma once
 
-#include "neon.h"
+#include "simd/neon.h"
 
 namespace HPC::fastcv::arm {
 

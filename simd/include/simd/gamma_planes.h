@@ -3,9 +3,9 @@
 
 #include <cstdint>
 
-#include "lab_tables.h"
-#include "loop.h"
-#include "neon.h"
+#include "simd/lab_tables.h"
+#include "simd/loop.h"
+#include "simd/neon.h"
 
 namespace HPC::fastcv::arm {
 

@@ -9,8 +9,8 @@
 #include <type_traits>
 #include <utility>
 
-#include "overlap.h"
-#include "pixel.h"
+#include "simd/overlap.h"
+#include "simd/pixel.h"
 
 /// Keeps the compiler from unrolling or vectorising the loop that follows.
 #if defined(__clang__)

@@ -7,7 +7,7 @@
 #else
 #define SIMDE_ENABLE_NATIVE_ALIASES
 #include <simde/arm/neon.h>
-#include "neon_x86.h"
+#include "simd/neon_x86.h"
 #ifndef vdivq_f32
 inline float32x4_t vdivq_f32(float32x4_t a, float32x4_t b) { return a / b; }
 #endif

@@ -4,7 +4,7 @@
 
 #include <type_traits>
 
-#include "neon.h"
+#include "simd/neon.h"
 
 namespace HPC::fastcv::arm {
 

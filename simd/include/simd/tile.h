@@ -11,8 +11,8 @@
 #include <type_traits>
 #include <utility>
 
-#include "neon.h"
-#include "registers.h"
+#include "simd/neon.h"
+#include "simd/registers.h"
 
 /// For what must not be a call: a tile lives in registers, its indices are constants. An instrumented build,
 /// which is in no hurry, lets them be calls.

@@ -5,7 +5,7 @@
 #include <climits>
 #include <cstdint>
 
-#include "fastcv.h"
+#include "fastcv/fastcv.h"
 
 namespace kyface {
 

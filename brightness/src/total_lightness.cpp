@@ -1,4 +1,4 @@
-#include "total_lightness.h"
+#include "brightness/total_lightness.h"
 
 #include <algorithm>
 #include <limits>

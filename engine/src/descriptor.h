@@ -10,7 +10,7 @@
 #include <new>
 #include <span>
 
-#include "ky_engine.h"
+#include "engine/ky_engine.h"
 
 namespace kyengine {
 
