@@ -6,9 +6,9 @@
 #include <algorithm>
 #include <cmath>
 
-#include "brightness/brightness.h"
+#include "brightness.h"
 #include "fuzz_input.h"
-#include "tests/support/guarded_image.h"
+#include "guarded_image.h"
 
 namespace {
 

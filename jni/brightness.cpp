@@ -1,13 +1,13 @@
 // Native methods of FaceLibrary that measure brightness.
-#include "brightness/brightness.h"
+#include "brightness.h"
 
 #include <jni.h>
 
 #include <algorithm>
 #include <cstdint>
 
-#include "base/log.h"
-#include "brightness/clip.h"
+#include "bridge_log.h"
+#include "clip.h"
 #include "pinned.h"
 
 namespace {

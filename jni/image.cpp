@@ -2,8 +2,8 @@
 #include <android/bitmap.h>
 #include <jni.h>
 
-#include "base/log.h"
-#include "frame/frame.h"
+#include "bridge_log.h"
+#include "frame.h"
 #include "pinned.h"
 
 namespace {

@@ -6,7 +6,7 @@
 #include <iterator>
 #include <utility>
 
-#include "base/log.h"
+#include "bridge_log.h"
 
 namespace {
 

@@ -1,7 +1,7 @@
 /// What the checks of the front-ends share.
 #pragma once
 
-#include "fastcv/fastcv.h"
+#include "fastcv.h"
 
 namespace HPC::fastcv {
 

@@ -7,7 +7,7 @@
 #include <thread>
 #include <vector>
 
-#include "brightness/brightness.h"
+#include "brightness.h"
 
 namespace {
 

@@ -19,7 +19,7 @@
 #include <string>
 #include <vector>
 
-#include "fastcv/fastcv.h"
+#include "fastcv.h"
 
 namespace {
 

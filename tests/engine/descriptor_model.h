@@ -6,7 +6,7 @@
 #include <random>
 #include <vector>
 
-#include "engine/src/descriptor.h"
+#include "descriptor.h"
 
 namespace kyengine::test {
 

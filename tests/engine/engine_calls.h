@@ -5,8 +5,8 @@
 
 #include <vector>
 
-#include "engine/ky_engine.h"
-#include "kyface_api/kyface_api.h"
+#include "ky_engine.h"
+#include "kyface_api.h"
 #include "picture.h"
 
 namespace kyengine::test {

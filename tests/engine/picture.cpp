@@ -8,7 +8,7 @@
 #include <iterator>
 #include <stdexcept>
 
-#include "engine/ky_engine.h"
+#include "ky_engine.h"
 
 namespace kyengine::test {
 namespace {

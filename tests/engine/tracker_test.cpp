@@ -101,6 +101,22 @@ TEST(TrackerTest, OneIdentityThroughAPan) {
   }
 }
 
+TEST(TrackerTest, DefaultSearchesAsManyPixelsInEveryFrame) {
+  // The portrait's face has 88 pixels. Of a frame's height of 480 a sixth is what is found, whatever its
+  // size.
+  const auto finds = [](int config, int face, int width, int height) {
+    const Picture view = View(Portrait(), 222, 126, face / 88.0, 0, 2 * face);
+    const Tracker tracker(config);
+    return TrackOne(tracker, Part(view, 0, 0, width, height)) != 0;
+  };
+  EXPECT_TRUE(finds(KY_CONFIG_DEFAULT, 88, 640, 480));
+  EXPECT_FALSE(finds(KY_CONFIG_DEFAULT, 50, 640, 480));
+  EXPECT_TRUE(finds(KY_CONFIG_DEFAULT, 46, 320, 240));
+  EXPECT_FALSE(finds(KY_CONFIG_DEFAULT, 88, 1280, 720));
+  EXPECT_TRUE(finds(KY_CONFIG_DEFAULT, 156, 1280, 720));
+  EXPECT_TRUE(finds(50, 50, 640, 480)) << "a smaller size on demand";
+}
+
 TEST(TrackerTest, FollowsInTurnedFrames) {
   for (const int orientation : {KY_ORIENTATION_90, KY_ORIENTATION_180, KY_ORIENTATION_270}) {
     const EveryNth tracker(100);

@@ -7,8 +7,8 @@
 #include <limits>
 #include <vector>
 
-#include "fastcv/fastcv.h"
-#include "tests/support/death.h"
+#include "death.h"
+#include "fastcv.h"
 
 namespace {
 

@@ -6,9 +6,9 @@
 #include <climits>
 #include <vector>
 
-#include "fastcv/fastcv.h"
-#include "tests/support/cvt_families.h"
-#include "tests/support/guarded_image.h"
+#include "cvt_families.h"
+#include "fastcv.h"
+#include "guarded_image.h"
 
 using namespace HPC::fastcv;
 

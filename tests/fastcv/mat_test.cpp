@@ -9,7 +9,7 @@
 #include <type_traits>
 #include <utility>
 
-#include "fastcv/fastcv.h"
+#include "fastcv.h"
 
 namespace {
 

@@ -6,8 +6,8 @@
 #include <string>
 #include <vector>
 
-#include "fastcv/kernels.h"
-#include "tests/support/guarded_image.h"
+#include "guarded_image.h"
+#include "kernels.h"
 
 namespace {
 

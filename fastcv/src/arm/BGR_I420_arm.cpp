@@ -23,7 +23,7 @@
 
 #include "entry.h"
 #include "kernel_assert.h"
-#include "simd/loop.h"
+#include "loop.h"
 
 namespace HPC::fastcv {
 namespace {

@@ -17,7 +17,7 @@
 #include <cmath>
 
 #include "entry.h"
-#include "simd/loop.h"
+#include "loop.h"
 
 namespace HPC::fastcv {
 namespace {

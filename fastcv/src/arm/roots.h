@@ -4,8 +4,8 @@
 #include <cmath>
 #include <cstdint>
 
-#include "simd/factors.h"
-#include "simd/neon.h"
+#include "factors.h"
+#include "neon.h"
 
 namespace HPC::fastcv::arm {
 

@@ -15,8 +15,8 @@
 
 #include "entry.h"
 #include "kernel_assert.h"
-#include "simd/loop.h"
-#include "simd/tile.h"
+#include "loop.h"
+#include "tile.h"
 
 namespace HPC::fastcv {
 namespace arm {

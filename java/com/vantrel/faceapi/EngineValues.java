@@ -29,15 +29,27 @@ public final class EngineValues {
     /** Faces are upright once the frame is turned clockwise by 270 degrees. */
     public static final int ORIENTATION_270 = 270;
 
-    /** Looks for faces of 80 pixels and more, in frames of up to {@link #SMALL_FRAME_PIXELS} for those of 40 too. */
+    // Or the size of the smallest faces that are to be found, in pixels of the frame, from MIN_SMALLEST_FACE to
+    // MAX_SMALLEST_FACE: half the size takes four times the work.
+    /** A detector finds faces from {@link #DEFAULT_SMALLEST_FACE} on, a tracker as {@link #TRACKED_PIXELS} allows. */
     public static final int CONFIG_DEFAULT = 0;
     /** Looks for faces of 80 pixels and more. */
     public static final int CONFIG_LARGE_FACES = 1;
     /** Looks for faces of 40 pixels and more, for four times the work. */
     public static final int CONFIG_SMALL_FACES = 2;
+    /** The smallest size of the smallest faces that a configuration may ask for, in pixels. */
+    public static final int MIN_SMALLEST_FACE = 20;
+    /** The largest size of the smallest faces that a configuration may ask for, in pixels. */
+    public static final int MAX_SMALLEST_FACE = 8192;
 
-    /** The largest frame, in pixels, that {@link #CONFIG_DEFAULT} enlarges to find small faces. */
-    public static final int SMALL_FRAME_PIXELS = 76800;
+    /** The smallest faces that a detector finds with {@link #CONFIG_DEFAULT}, in pixels, whatever the frame's size. */
+    public static final int DEFAULT_SMALLEST_FACE = 36;
+    /**
+     * The most pixels of the picture that a tracker searches with {@link #CONFIG_DEFAULT}; frames are reduced or
+     * enlarged to it. Its smallest faces have 80 pixels in frames of 640 x 480, 139 in those of 1280 x 720 and 208 in
+     * those of 1920 x 1080.
+     */
+    public static final int TRACKED_PIXELS = 307200;
     /** The longest side of a frame, in pixels. */
     public static final int MAX_FRAME_SIDE = 8192;
 
@@ -97,7 +109,7 @@ public final class EngineValues {
     public static final int ERROR_STRIDE = -5;
     /** The orientation is none of those above. */
     public static final int ERROR_ORIENTATION = -6;
-    /** The configuration is none of those above. */
+    /** The configuration is none of those above, and no size of a smallest face. */
     public static final int ERROR_CONFIG = -7;
     /** A setting is outside its range. */
     public static final int ERROR_RANGE = -8;

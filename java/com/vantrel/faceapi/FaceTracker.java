@@ -25,7 +25,8 @@ public final class FaceTracker extends FaceFinder {
      * Creates a tracker.
      *
      * @param modelPath the model file; null for the engine's built-in model
-     * @param config engine flags, 0 for the engine's defaults
+     * @param config 0 for the engine's defaults, a configuration of the engine's, or with the open engine the size of
+     *     the smallest faces that are to be found, in pixels, from 20 on
      * @throws FaceEngineException when the engine cannot create it
      */
     public FaceTracker(@Nullable String modelPath, int config) {
@@ -36,7 +37,8 @@ public final class FaceTracker extends FaceFinder {
      * Creates a tracker of an engine that has numbers of its own.
      *
      * @param modelPath the model file; null for the engine's built-in model
-     * @param config engine flags, 0 for the engine's defaults
+     * @param config 0 for the engine's defaults, a configuration of the engine's, or with the open engine the size of
+     *     the smallest faces that are to be found, in pixels, from 20 on
      * @param profile the engine's numbers
      * @throws NullPointerException when the profile is null
      * @throws FaceEngineException when the engine cannot create it

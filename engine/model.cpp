@@ -1,0 +1,136 @@
+#include "model.h"
+
+#include <dlib/serialize.h>
+
+#include <filesystem>
+#include <fstream>
+#include <map>
+#include <mutex>
+#include <string>
+#include <system_error>
+#include <tuple>
+#include <utility>
+#include <vector>
+
+#include "failure.h"
+
+namespace kyengine {
+namespace {
+
+using Detector = dlib::frontal_face_detector;
+using DlibScanner = dlib::scan_fhog_pyramid<dlib::pyramid_down<6>>;
+using Weights = Detector::feature_vector_type;
+
+/// Unpacking the built-in detector takes long. It is never destroyed: threads may search until the process is
+/// gone.
+const std::shared_ptr<const Filters>& BuiltInDetector() {
+  static const auto& detector = *new auto(std::make_shared<const Filters>(dlib::get_frontal_face_detector()));
+  return detector;
+}
+
+/// Reads a detector that dlib serialized. dlib's own reading takes the sizes in the file on trust; this
+/// checks that the parts fit one another before they are put together.
+Detector ReadDetector(std::istream& in) {
+  int version = 0;
+  dlib::deserialize(version, in);
+  Require(version == 1 || version == 2, KY_ERROR_MODEL);
+
+  DlibScanner scanner;
+  dlib::test_box_overlap overlap;
+  std::vector<Weights> weights;
+  deserialize(scanner, in);
+  if (version == 1) {
+    deserialize(weights.emplace_back(), in);
+    deserialize(overlap, in);
+  } else {
+    deserialize(overlap, in);
+    unsigned long count = 0;
+    dlib::deserialize(count, in);
+    constexpr unsigned long kMostFilters = 1000;
+    Require(count <= kMostFilters, KY_ERROR_MODEL);
+    weights.resize(count);
+    for (Weights& w : weights) {
+      deserialize(w, in);
+    }
+  }
+
+  constexpr unsigned long kLongestSide = KY_MAX_FRAME_SIDE;
+  const unsigned long cell = scanner.get_cell_size();
+  const auto window_fits = [cell](unsigned long side) { return side >= cell && side <= kLongestSide; };
+  Require(cell >= kSmallestCell && cell <= kLargestCell && scanner.get_padding() <= kLongestSide,
+          KY_ERROR_MODEL);
+  Require(
+      window_fits(scanner.get_detection_window_width()) && window_fits(scanner.get_detection_window_height()),
+      KY_ERROR_MODEL);
+  Require(!weights.empty(), KY_ERROR_MODEL);
+  for (const Weights& w : weights) {
+    Require(w.size() == scanner.get_num_dimensions() + 1, KY_ERROR_MODEL);
+  }
+  return {scanner, overlap, weights};
+}
+
+std::ifstream Open(const std::string& path, ky_result_t code) {
+  std::ifstream in(path, std::ios::binary);
+  Require(in.is_open(), code);
+  return in;
+}
+
+bool Exists(const std::string& path) {
+  std::error_code ignored;
+  return std::filesystem::exists(path, ignored);
+}
+
+/// Runs `read`; false when it threw, which is how dlib says that a file holds something else. A size in such
+/// a file may also be one that no memory suffices for.
+template <typename Read>
+bool Reads(Read read) {
+  try {
+    read();
+    return true;
+  } catch (const Failure&) {
+    return false;
+  } catch (const std::exception&) {
+    return false;
+  }
+}
+
+}  // namespace
+
+std::shared_ptr<const LandmarkModel> LoadLandmarks(const char* path, ky_result_t misfit) {
+  // A file that was replaced is another file.
+  using File = std::tuple<std::string, uintmax_t, std::filesystem::file_time_type>;
+  static std::mutex mutex;
+  static std::map<File, std::weak_ptr<const LandmarkModel>> loaded;
+
+  std::ifstream in = Open(path, KY_ERROR_MODEL_FILE);
+  std::error_code ignored;
+  const File file(path, std::filesystem::file_size(path, ignored),
+                  std::filesystem::last_write_time(path, ignored));
+  const std::lock_guard lock(mutex);
+  std::erase_if(loaded, [](const auto& entry) { return entry.second.expired(); });
+  if (const auto found = loaded.find(file); found != loaded.end()) {
+    if (auto model = found->second.lock()) {
+      return model;
+    }
+  }
+  std::shared_ptr<const LandmarkModel> model;
+  Require(Reads([&] { model = std::make_shared<const LandmarkModel>(in); }), misfit);
+  loaded[file] = model;
+  return model;
+}
+
+Model LoadModel(const char* path) {
+  if (path == nullptr) {
+    return {BuiltInDetector(), nullptr};
+  }
+  std::ifstream in = Open(path, KY_ERROR_MODEL_FILE);
+  Detector detector;
+  if (Reads([&] { detector = ReadDetector(in); })) {
+    const std::string beside = std::string(path) + KY_LANDMARKS_SUFFIX;
+    return {std::make_shared<const Filters>(detector),
+            Exists(beside) ? LoadLandmarks(beside.c_str(), KY_ERROR_LANDMARK_MODEL) : nullptr};
+  }
+  return {BuiltInDetector(), LoadLandmarks(path, KY_ERROR_MODEL)};
+}
+
+}  // namespace kyengine

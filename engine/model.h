@@ -1,0 +1,23 @@
+/// Loading of the models that a detector or tracker works with.
+#pragma once
+
+#include "landmarks.h"
+#include "scanner.h"
+
+#include <memory>
+
+namespace kyengine {
+
+struct Model {
+  std::shared_ptr<const Filters> detector;
+  std::shared_ptr<const LandmarkModel> landmarks;  ///< null when there is none
+};
+
+/// Loads what `path` names, as `ky_engine.h` describes; throws Failure.
+Model LoadModel(const char* path);
+
+/// Loads a landmark model; throws Failure, with the code `misfit` when the file holds something else. Handles
+/// created from one file share it: such models are large.
+std::shared_ptr<const LandmarkModel> LoadLandmarks(const char* path, ky_result_t misfit);
+
+}  // namespace kyengine

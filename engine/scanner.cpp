@@ -1,0 +1,158 @@
+#include "scanner.h"
+
+#include <algorithm>
+#include <tuple>
+
+namespace kyengine {
+namespace {
+
+using Pyramid = dlib::pyramid_down<6>;
+using Weights = Filters::Detector::feature_vector_type;
+
+}  // namespace
+
+Filters::Filters(const Detector& detector) : overlap(detector.get_overlap_tester()) {
+  const auto& scanner = detector.get_scanner();
+  cell = static_cast<int>(scanner.get_cell_size());
+  window_width = static_cast<int>(scanner.get_detection_window_width());
+  window_height = static_cast<int>(scanner.get_detection_window_height());
+  taps_across = static_cast<int>(scanner.get_fhog_window_width());
+  taps_down = static_cast<int>(scanner.get_fhog_window_height());
+  padding = scanner.get_padding();
+  most_levels = scanner.get_max_pyramid_levels();
+  least_width = scanner.get_min_pyramid_layer_width();
+  least_height = scanner.get_min_pyramid_layer_height();
+
+  struct Part {
+    size_t filter;
+    std::vector<float> row;
+    std::vector<float> column;
+  };
+  std::vector<std::vector<Part>> parts(kFeatures);
+  for (size_t filter = 0; filter < detector.num_detectors(); ++filter) {
+    const Weights& weights = detector.get_w(filter);
+    biases.push_back(weights(weights.size() - 1));
+    const auto bank = scanner.build_fhog_filterbank(weights);
+    for (size_t feature = 0; feature < parts.size(); ++feature) {
+      for (size_t i = 0; i < bank.row_filters[feature].size(); ++i) {
+        const auto& row = bank.row_filters[feature][i];
+        const auto& column = bank.col_filters[feature][i];
+        parts[feature].push_back({filter, {row.begin(), row.end()}, {column.begin(), column.end()}});
+      }
+    }
+  }
+
+  for (size_t feature = 0; feature < parts.size(); ++feature) {
+    const std::vector<Part>& of_feature = parts[feature];
+    for (size_t first = 0; first < of_feature.size(); first += kMostTogether) {
+      Group& group = groups.emplace_back();
+      group.feature = static_cast<int>(feature);
+      group.size = std::min(kMostTogether, of_feature.size() - first);
+      for (size_t tap = 0; tap < static_cast<size_t>(taps_across); ++tap) {
+        for (size_t i = 0; i < group.size; ++i) {
+          group.rows.push_back(of_feature[first + i].row[tap]);
+        }
+      }
+      for (size_t i = 0; i < group.size; ++i) {
+        group.filters[i] = of_feature[first + i].filter;
+        group.columns[i] = of_feature[first + i].column;
+      }
+    }
+  }
+}
+
+void Scanner::ScanTile(int rows, int column) {
+  const int taps = filters_->taps_down;
+  const int rows_in = rows + taps - 1;
+  const size_t part = static_cast<size_t>(rows_in) * kTileColumns;
+  const size_t tile = static_cast<size_t>(rows) * kTileColumns;
+  rows_.resize(kMostTogether * part);
+  sums_.assign(filters_->biases.size() * tile, 0);
+  for (const Filters::Group& group : filters_->groups) {
+    ApplyRows(map_.Row(group.feature, 0) + column, map_.stride(), group.rows.data(),
+              static_cast<int>(group.size), filters_->taps_across, rows_in, kTileColumns, rows_.data());
+    for (size_t i = 0; i < group.size; ++i) {
+      AddColumn(&rows_[i * part], kTileColumns, group.columns[i].data(), taps, rows,
+                &sums_[group.filters[i] * tile]);
+    }
+  }
+}
+
+void Scanner::ScanLevel(const GrayImage& picture, unsigned int level, double least) {
+  const Filters& f = *filters_;
+  const int cells_down = FeatureMap::CellsOf(static_cast<int>(picture.nr()), f.cell);
+  const int cells_across = FeatureMap::CellsOf(static_cast<int>(picture.nc()), f.cell);
+  if (cells_down < 1 || cells_across < 1) {
+    return;
+  }
+  const Pyramid pyramid;
+  const dlib::default_fhog_feature_extractor features;
+  // The filters are centred, on the later of two middle cells where their size is even.
+  const int above = (f.taps_down - 1) / 2;
+  const int before = (f.taps_across - 1) / 2;
+  const int across = (cells_across + kTileColumns - 1) / kTileColumns * kTileColumns;
+  for (int top = 0; top < cells_down; top += kTileRows) {
+    const int rows = std::min(kTileRows, cells_down - top);
+    const int whole_rows = (rows + kRowsTogether - 1) / kRowsTogether * kRowsTogether;
+    map_.Compute(picture, f.cell, top - above, whole_rows + f.taps_down - 1, before,
+                 across - cells_across + f.taps_across - 1 - before);
+    for (int left = 0; left < across; left += kTileColumns) {
+      ScanTile(whole_rows, left);
+      const int columns = std::min(kTileColumns, cells_across - left);
+      for (size_t filter = 0; filter < f.biases.size(); ++filter) {
+        for (int y = 0; y < rows; ++y) {
+          const float* const scores =
+              &sums_[(filter * static_cast<size_t>(whole_rows) + static_cast<size_t>(y)) * kTileColumns];
+          for (int x = 0; x < columns; ++x) {
+            if (scores[x] < f.biases[filter] + least) {
+              continue;
+            }
+            const dlib::point centre(left + x + f.taps_across / 2, top + y + f.taps_down / 2);
+            const dlib::rectangle box = features.feats_to_image(
+                dlib::centered_rect(centre, static_cast<unsigned long>(f.taps_across) - 2 * f.padding,
+                                    static_cast<unsigned long>(f.taps_down) - 2 * f.padding),
+                f.cell, f.taps_down, f.taps_across);
+            dlib::rect_detection& detection = found_.emplace_back();
+            detection.detection_confidence = scores[x] - f.biases[filter];
+            detection.weight_index = filter;
+            detection.rect = pyramid.rect_up(dlib::drectangle(box), level);
+          }
+        }
+      }
+    }
+  }
+}
+
+std::vector<dlib::rect_detection> Scanner::Find(GrayImage& picture, double least) {
+  found_.clear();
+  const Pyramid pyramid;
+  dlib::rectangle size = dlib::get_rect(picture);
+  for (unsigned int level = 0;;) {
+    ScanLevel(picture, level, least);
+    size = pyramid.rect_down(dlib::drectangle(size));
+    ++level;
+    if (size.width() < filters_->least_width || size.height() < filters_->least_height ||
+        level >= filters_->most_levels) {
+      break;
+    }
+    // A level is the one before in 5/6 of its size.
+    next_.set_size(picture.nr() * 5 / 6, picture.nc() * 5 / 6);
+    resizer_.Resize(picture, next_);
+    swap(picture, next_);
+  }
+
+  std::sort(found_.begin(), found_.end(), [](const auto& a, const auto& b) {
+    return std::tuple(-a.detection_confidence, a.weight_index, a.rect.top(), a.rect.left()) <
+           std::tuple(-b.detection_confidence, b.weight_index, b.rect.top(), b.rect.left());
+  });
+  std::vector<dlib::rect_detection> kept;
+  for (const dlib::rect_detection& detection : found_) {
+    if (std::none_of(kept.begin(), kept.end(),
+                     [&](const auto& other) { return filters_->overlap(other.rect, detection.rect); })) {
+      kept.push_back(detection);
+    }
+  }
+  return kept;
+}
+
+}  // namespace kyengine
