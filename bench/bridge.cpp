@@ -17,9 +17,9 @@
 #include <string>
 #include <vector>
 
-#include "frame.h"
-#include "kernels.h"
-#include "kyface_api.h"
+#include "fastcv/kernels.h"
+#include "frame/frame.h"
+#include "kyface_api/kyface_api.h"
 #include "lap.h"
 
 extern "C" {

@@ -1,12 +1,12 @@
 // This project's own operations, taken from the lists of instances that exist.
 
-#include "fastcv.h"
+#include "fastcv/fastcv.h"
 
 #include <cctype>
 #include <string_view>
 
-#include "brightness.h"
-#include "kernels.h"
+#include "brightness/brightness.h"
+#include "fastcv/kernels.h"
 #include "operation.h"
 
 namespace bench {

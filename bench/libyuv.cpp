@@ -90,6 +90,41 @@ void cropped(const Frame& f) {
 
 void copied(const Frame& f) { libyuv::CopyPlane(f.in, f.width, f.out, f.width, f.width, f.height); }
 
+/// A camera's planes converted, then turned, with rows of their own between the two. `mode` 0 converts alone.
+void addPlanes(std::vector<Operation>& operations, bool pairs, libyuv::RotationMode mode, bool mirrored) {
+  std::string name = pairs ? "pairs-to-RGBA" : "planes-to-RGBA";
+  name += mode != libyuv::kRotate0 ? "-" + std::to_string(static_cast<int>(mode)) : "";
+  name += mirrored ? "-mirrored" : "";
+  operations.push_back({name, "libyuv", 1.5 + 4, [=](Size size) {
+                          const int padding = 64;
+                          const int stride = size.width + padding;
+                          const int chromaStride = (pairs ? size.width : size.width / 2) + padding;
+                          const auto bytes = [](int rows, int row) {
+                            return static_cast<size_t>(rows) * static_cast<size_t>(row);
+                          };
+                          const auto luma = samples<unsigned char>(bytes(size.height, stride));
+                          const size_t plane = bytes(size.height / 2, chromaStride);
+                          const auto chroma = samples<unsigned char>(2 * plane);
+                          const auto upright = samples<unsigned char>(size.pixels() * 4);
+                          const auto out = samples<unsigned char>(size.pixels() * 4);
+                          const bool direct = mode == libyuv::kRotate0 && !mirrored;
+                          const Size turned = direct ? size : rotatedBy(mode == 0 ? 180 : mode, size);
+                          return [=] {
+                            libyuv::Android420ToABGR(luma.get(), stride, chroma.get() + (pairs ? 1 : plane),
+                                                     chromaStride, chroma.get(), chromaStride, pairs ? 2 : 1,
+                                                     (direct ? out : upright).get(), size.width * 4,
+                                                     size.width, size.height);
+                            if (mirrored) {
+                              libyuv::ARGBMirror(upright.get(), size.width * 4, out.get(), size.width * 4,
+                                                 size.width, size.height);
+                            } else if (!direct) {
+                              libyuv::ARGBRotate(upright.get(), size.width * 4, out.get(), turned.width * 4,
+                                                 size.width, size.height, mode);
+                            }
+                          };
+                        }});
+}
+
 }  // namespace
 
 void addLibyuv(std::vector<Operation>& operations) {
@@ -143,6 +178,12 @@ void addLibyuv(std::vector<Operation>& operations) {
   conversion("crop-u8x1", 1, 1, cropped<1>);
   conversion("crop-u8x3", 3, 3, cropped<3>);
   conversion("crop-u8x4", 4, 4, cropped<4>);
+  for (const bool pairs : {true, false}) {
+    for (const RotationMode mode : {kRotate0, kRotate90, kRotate180, kRotate270}) {
+      addPlanes(operations, pairs, mode, false);
+    }
+    addPlanes(operations, pairs, kRotate0, true);
+  }
 }
 
 }  // namespace bench

@@ -32,6 +32,7 @@ void addFloor(std::vector<Operation>& operations) {
 std::vector<Operation> operationsMatching(const std::string& pattern, [[maybe_unused]] bool own) {
   std::vector<Operation> operations;
   addFastcv(operations);
+  addPlanes(operations);
 #ifdef BENCH_PEERS
   if (!own) {
     addLibyuv(operations);

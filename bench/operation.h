@@ -70,6 +70,7 @@ std::shared_ptr<T> samples(size_t count, Range range = {0, sizeof(T) == 1 ? 255.
 
 /// The operations of each library.
 void addFastcv(std::vector<Operation>& operations);
+void addPlanes(std::vector<Operation>& operations);
 void addLibyuv(std::vector<Operation>& operations);
 void addOpencv(std::vector<Operation>& operations);
 /// For every traffic among `operations`, a plain copy that reads and writes as much: what no operation can

@@ -1,6 +1,6 @@
 # A library with the face engine's symbols and soname, to link against where the engine itself is not at hand. Nothing
 # in it works, and it is never packaged. Its symbols are those that kyface_api.h declares.
-file(READ ${PROJECT_SOURCE_DIR}/jni/kyface_api.h header)
+file(READ ${PROJECT_SOURCE_DIR}/kyface_api/include/kyface_api/kyface_api.h header)
 string(REGEX MATCHALL "\nk?[a-z_* ]+[ *](ky_[a-z_]+)\\(" declarations "${header}")
 set(stub "/* Generated from kyface_api.h. */\n")
 foreach(declaration IN LISTS declarations)

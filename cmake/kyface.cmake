@@ -29,27 +29,21 @@ endif()
 add_library(kyface_warnings INTERFACE)
 target_compile_options(kyface_warnings INTERFACE -Wall -Wextra -Wpedantic -Wshadow -Wcast-qual -Wvla -Werror)
 
-# The instruction set that the kernels and their tests need. On x86-64 the NEON intrinsics compile through SIMDe, and
-# FMA keeps their fused multiply-adds fused. Contraction is off so that only the written fused multiply-adds fuse.
-add_library(kyface_simd INTERFACE)
-target_compile_options(kyface_simd INTERFACE -ffp-contract=off -fno-math-errno)
+# The arithmetic that everything here is compiled to, tests included. On x86-64 the NEON intrinsics compile through
+# SIMDe, and FMA keeps their fused multiply-adds fused. Contraction is off so that only the written fused multiply-adds
+# fuse.
+add_library(kyface_arithmetic INTERFACE)
+target_compile_options(kyface_arithmetic INTERFACE -ffp-contract=off -fno-math-errno)
 if(CMAKE_SYSTEM_PROCESSOR MATCHES "x86_64|AMD64")
   # With clang SIMDe takes MMX for 64-bit vectors, after which a caller's long double is NaN.
-  target_compile_options(kyface_simd INTERFACE -mavx2 -mfma $<$<CXX_COMPILER_ID:Clang>:-mno-mmx>)
-  if(ANDROID)
-    # SIMDe is headers alone and knows Android; only its own folder must be seen of this machine's headers.
-    find_path(KYFACE_SIMDE simde/arm/neon.h NO_CMAKE_FIND_ROOT_PATH REQUIRED)
-    file(MAKE_DIRECTORY ${CMAKE_BINARY_DIR}/simde)
-    file(CREATE_LINK ${KYFACE_SIMDE}/simde ${CMAKE_BINARY_DIR}/simde/simde SYMBOLIC)
-    target_include_directories(kyface_simd SYSTEM INTERFACE ${CMAKE_BINARY_DIR}/simde)
-  endif()
+  target_compile_options(kyface_arithmetic INTERFACE -mavx2 -mfma $<$<CXX_COMPILER_ID:Clang>:-mno-mmx>)
 endif()
 
 # What the shipped library is compiled with.
 add_library(kyface_options INTERFACE)
 target_compile_options(kyface_options INTERFACE $<$<COMPILE_LANGUAGE:CXX>:-fno-exceptions -fno-rtti
                                                 -fvisibility-inlines-hidden> -fvisibility=hidden)
-target_link_libraries(kyface_options INTERFACE kyface_warnings kyface_simd kyface_coverage)
+target_link_libraries(kyface_options INTERFACE kyface_warnings kyface_arithmetic kyface_coverage)
 
 # Hardening of a shared library: read-only relocations, everything bound at load, nothing left undefined.
 add_library(kyface_link INTERFACE)

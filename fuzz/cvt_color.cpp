@@ -7,10 +7,10 @@
 #include <vector>
 
 #include "assertion.h"
-#include "cvt_families.h"
-#include "fastcv.h"
+#include "fastcv/fastcv.h"
 #include "fuzz_input.h"
-#include "guarded_image.h"
+#include "tests/support/cvt_families.h"
+#include "tests/support/guarded_image.h"
 
 namespace {
 

@@ -4,10 +4,10 @@
 #include <algorithm>
 #include <cmath>
 
+#include "engine/ky_engine.h"
 #include "fuzz_input.h"
-#include "guarded_image.h"
-#include "ky_engine.h"
-#include "kyface_api.h"
+#include "kyface_api/kyface_api.h"
+#include "tests/support/guarded_image.h"
 
 namespace {
 

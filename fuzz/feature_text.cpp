@@ -6,8 +6,8 @@
 #include <string>
 
 #include "fuzz_input.h"
-#include "guarded_image.h"
-#include "kyface_api.h"
+#include "kyface_api/kyface_api.h"
+#include "tests/support/guarded_image.h"
 
 namespace {
 

@@ -1,15 +1,15 @@
 // The frame helpers with any scalars, over buffers that hold what valid ones describe: the pixels that the
 // formulas give or, where the sizes are refused or hold nothing, no byte touched.
 
-#include "frame.h"
+#include "frame/frame.h"
 
 #include <algorithm>
 #include <vector>
 
 #include "assertion.h"
-#include "frame_reference.h"
 #include "fuzz_input.h"
-#include "guarded_image.h"
+#include "tests/support/frame_reference.h"
+#include "tests/support/guarded_image.h"
 
 namespace {
 

@@ -7,9 +7,9 @@
 #include <vector>
 
 #include "assertion.h"
-#include "fastcv.h"
+#include "fastcv/fastcv.h"
 #include "fuzz_input.h"
-#include "guarded_image.h"
+#include "tests/support/guarded_image.h"
 
 namespace {
 

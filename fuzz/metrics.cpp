@@ -6,9 +6,9 @@
 #include <algorithm>
 #include <cmath>
 
-#include "brightness.h"
+#include "brightness/brightness.h"
 #include "fuzz_input.h"
-#include "guarded_image.h"
+#include "tests/support/guarded_image.h"
 
 namespace {
 

@@ -1,13 +1,13 @@
 // Native methods of FaceLibrary that measure brightness.
-#include "brightness.h"
+#include "brightness/brightness.h"
 
 #include <jni.h>
 
 #include <algorithm>
 #include <cstdint>
 
-#include "bridge_log.h"
-#include "clip.h"
+#include "base/log.h"
+#include "brightness/clip.h"
 #include "pinned.h"
 
 namespace {

@@ -3,7 +3,7 @@
 
 #include <jni.h>
 
-#include "kyface_api.h"
+#include "kyface_api/kyface_api.h"
 #include "pinned.h"
 
 namespace kyface {

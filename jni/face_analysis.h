@@ -6,10 +6,10 @@
 
 #include <jni.h>
 
-#include "bridge_log.h"
+#include "base/log.h"
 #include "engine_values.h"
 #include "java_model.h"
-#include "kyface_api.h"
+#include "kyface_api/kyface_api.h"
 #include "pinned.h"
 
 namespace kyface {

@@ -2,8 +2,8 @@
 #include <android/bitmap.h>
 #include <jni.h>
 
-#include "bridge_log.h"
-#include "frame.h"
+#include "base/log.h"
+#include "frame/frame.h"
 #include "pinned.h"
 
 namespace {

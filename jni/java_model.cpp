@@ -6,7 +6,7 @@
 #include <iterator>
 #include <utility>
 
-#include "bridge_log.h"
+#include "base/log.h"
 
 namespace {
 

@@ -8,7 +8,7 @@
 
 #include <jni.h>
 
-#include "kyface_api.h"
+#include "kyface_api/kyface_api.h"
 
 /// Looks up the Java classes, constructors and fields. Returns a non-negative value, or -1 after logging the
 /// first that is missing; what was found before it stays registered.

@@ -6,9 +6,9 @@
 #include <climits>
 #include <cstdint>
 
-#include "image_view.h"
+#include "brightness/total_lightness.h"
+#include "frame/image_view.h"
 #include "pinned.h"
-#include "total_lightness.h"
 
 namespace {
 

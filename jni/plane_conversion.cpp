@@ -5,8 +5,8 @@
 #include <array>
 #include <cstdint>
 
+#include "frame/planes.h"
 #include "pinned.h"
-#include "planes.h"
 
 namespace {
 

@@ -1,10 +1,10 @@
 // Native methods of FaceLibrary over the engine's video tracker.
 #include <jni.h>
 
-#include "bridge_log.h"
+#include "base/log.h"
 #include "engine_values.h"
 #include "face_analysis.h"
-#include "kyface_api.h"
+#include "kyface_api/kyface_api.h"
 #include "pinned.h"
 
 namespace {

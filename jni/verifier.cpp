@@ -3,10 +3,10 @@
 
 #include <cstdint>
 
-#include "bridge_log.h"
+#include "base/log.h"
 #include "engine_values.h"
 #include "java_model.h"
-#include "kyface_api.h"
+#include "kyface_api/kyface_api.h"
 #include "pinned.h"
 
 namespace {

@@ -6,7 +6,7 @@
 WEIGHTS_FOLDER holds face_recognition_model.bin and its weights manifest, as the npm package @vladmandic/face-api has
 them: dlib's face descriptor, its numbers quantised to bytes but for some filters. With --landmarks a landmark model
 serialized by dlib goes behind the descriptor, so that one file is all that a verifier needs. The format is described
-in engine/descriptor.h.
+in engine/src/descriptor.h.
 """
 
 import argparse

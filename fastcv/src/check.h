@@ -1,7 +1,7 @@
 /// What the checks of the front-ends share.
 #pragma once
 
-#include "fastcv.h"
+#include "fastcv/fastcv.h"
 
 namespace HPC::fastcv {
 

@@ -2,10 +2,10 @@
 
 #include <cmath>
 
+#include "arm/rotate.h"
 #include "check.h"
-#include "fastcv.h"
-#include "kernels.h"
-#include "rotate.h"
+#include "fastcv/fastcv.h"
+#include "fastcv/kernels.h"
 
 namespace HPC::fastcv {
 namespace {

@@ -1,8 +1,8 @@
 // cvtColor: the checks of the three families of conversions, and the kernel behind each conversion.
 
 #include "check.h"
-#include "fastcv.h"
-#include "kernels.h"
+#include "fastcv/fastcv.h"
+#include "fastcv/kernels.h"
 
 namespace HPC::fastcv {
 namespace {

@@ -7,7 +7,7 @@
 #include <thread>
 #include <vector>
 
-#include "brightness.h"
+#include "brightness/brightness.h"
 
 namespace {
 

@@ -5,10 +5,10 @@
 #include <cmath>
 #include <vector>
 
-#include "brightness.h"
-#include "lab_reference.h"
-#include "lightness_sum.h"
-#include "luminance_tables.h"
+#include "brightness/brightness.h"
+#include "brightness/src/lightness_sum.h"
+#include "brightness/src/luminance_tables.h"
+#include "tests/support/lab_reference.h"
 
 namespace {
 

@@ -8,10 +8,10 @@
 #include <string>
 #include <vector>
 
-#include "brightness.h"
-#include "guarded_image.h"
-#include "lab_reference.h"
-#include "sparse_memory.h"
+#include "brightness/brightness.h"
+#include "tests/support/guarded_image.h"
+#include "tests/support/lab_reference.h"
+#include "tests/support/sparse_memory.h"
 
 // The same metrics for callers whose declarations lack the `const`.
 using PlainMetric = unsigned char(unsigned char*, int, int, int, int, int, int, int, int);

@@ -13,7 +13,7 @@ TYPES = ["unsigned char", "float"]
 CONVERSIONS = range(22)
 MESSAGE = re.compile(r"HPC::fastcv::\w+ has no such instance")
 
-HEAD = '#include "fastcv.h"\nnamespace HPC::fastcv {\nconstexpr EcoEnv_t kOther = static_cast<EcoEnv_t>(1);\n'
+HEAD = '#include "fastcv/fastcv.h"\nnamespace HPC::fastcv {\nconstexpr EcoEnv_t kOther = static_cast<EcoEnv_t>(1);\n'
 
 
 def run(command, text):
@@ -25,7 +25,7 @@ def run(command, text):
 
 def listed(command, macro):
     """The argument lists that a macro of the header gives, as tuples of text."""
-    result = run([*command, "-E", "-P"], f'#include "fastcv.h"\n{macro}(LISTED)\n')
+    result = run([*command, "-E", "-P"], f'#include "fastcv/fastcv.h"\n{macro}(LISTED)\n')
     if result.returncode != 0:
         sys.exit(result.stdout)
     return {tuple(part.strip() for part in found.split(",")) for found in re.findall(r"LISTED\(([^)]*)\)", result.stdout)}
@@ -60,7 +60,7 @@ def cases(command):
 
 
 def enumerators(command):
-    text = run([*command, "-E", "-P"], '#include "fastcv.h"\n').stdout
+    text = run([*command, "-E", "-P"], '#include "fastcv/fastcv.h"\n').stdout
     return [(int(value), name) for name, value in re.findall(r"\b(CVT_\w+) = (\d+)", text)]
 
 

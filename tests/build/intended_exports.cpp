@@ -1,11 +1,11 @@
 // Refers to every C++ function that the shared library is meant to export. It is compiled, not linked: what
 // its object leaves undefined is the list.
 
-#include "brightness.h"
-#include "cvt_kernels.h"
-#include "fastcv.h"
-#include "frame.h"
-#include "kernels.h"
+#include "brightness/brightness.h"
+#include "fastcv/fastcv.h"
+#include "fastcv/kernels.h"
+#include "frame/frame.h"
+#include "tests/support/cvt_kernels.h"
 
 using PlainMetric = unsigned char(unsigned char*, int, int, int, int, int, int, int, int);
 using HeaderMetric = unsigned char(const unsigned char*, int, int, int, int, int, int, int, int);

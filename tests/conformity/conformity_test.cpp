@@ -19,7 +19,7 @@
 #include <string>
 #include <vector>
 
-#include "fastcv.h"
+#include "fastcv/fastcv.h"
 
 namespace {
 

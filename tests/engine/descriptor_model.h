@@ -6,7 +6,7 @@
 #include <random>
 #include <vector>
 
-#include "descriptor.h"
+#include "engine/src/descriptor.h"
 
 namespace kyengine::test {
 

@@ -1,5 +1,5 @@
 // The face descriptor's network against its definition, and its model files.
-#include "descriptor.h"
+#include "engine/src/descriptor.h"
 
 #include <gtest/gtest.h>
 
@@ -14,7 +14,7 @@
 #include <vector>
 
 #include "descriptor_model.h"
-#include "guarded_image.h"
+#include "tests/support/guarded_image.h"
 
 namespace kyengine::test {
 namespace {

@@ -5,8 +5,8 @@
 
 #include <vector>
 
-#include "ky_engine.h"
-#include "kyface_api.h"
+#include "engine/ky_engine.h"
+#include "kyface_api/kyface_api.h"
 #include "picture.h"
 
 namespace kyengine::test {

@@ -1,5 +1,5 @@
 // Model files: detectors and landmark models that dlib serialized, and everything else.
-#include "dlib_config.h"
+#include "engine/src/dlib_config.h"
 // The configuration of dlib comes first.
 #include <dlib/image_processing/frontal_face_detector.h>
 #include <dlib/image_processing/shape_predictor.h>

@@ -8,7 +8,7 @@
 #include <iterator>
 #include <stdexcept>
 
-#include "ky_engine.h"
+#include "engine/ky_engine.h"
 
 namespace kyengine::test {
 namespace {

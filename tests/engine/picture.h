@@ -6,7 +6,7 @@
 #include <string>
 #include <vector>
 
-#include "kyface_api.h"
+#include "kyface_api/kyface_api.h"
 
 namespace kyengine::test {
 

@@ -1,5 +1,5 @@
 // The search itself, against dlib's own: gradients, features, resized pictures and detections.
-#include "scanner.h"
+#include "engine/src/scanner.h"
 
 #include <dlib/image_transforms.h>
 #include <gtest/gtest.h>
@@ -9,7 +9,7 @@
 #include <random>
 #include <vector>
 
-#include "guarded_image.h"
+#include "tests/support/guarded_image.h"
 #include "picture.h"
 
 namespace kyengine::test {

@@ -9,7 +9,7 @@
 #include <string>
 
 #include "engine_calls.h"
-#include "guarded_image.h"
+#include "tests/support/guarded_image.h"
 
 namespace kyengine::test {
 namespace {

@@ -7,9 +7,9 @@
 #include <cstdlib>
 #include <vector>
 
-#include "kernels.h"
-#include "neon.h"
-#include "packed_kernel.h"
+#include "fastcv/kernels.h"
+#include "simd/neon.h"
+#include "tests/support/packed_kernel.h"
 
 namespace {
 

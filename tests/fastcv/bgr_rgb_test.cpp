@@ -4,8 +4,8 @@
 
 #include <vector>
 
-#include "kernels.h"
-#include "packed_kernel.h"
+#include "fastcv/kernels.h"
+#include "tests/support/packed_kernel.h"
 
 namespace {
 

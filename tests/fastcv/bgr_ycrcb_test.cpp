@@ -6,8 +6,8 @@
 #include <cmath>
 #include <vector>
 
-#include "kernels.h"
-#include "packed_kernel.h"
+#include "fastcv/kernels.h"
+#include "tests/support/packed_kernel.h"
 
 namespace {
 

@@ -7,8 +7,8 @@
 #include <limits>
 #include <vector>
 
-#include "death.h"
-#include "fastcv.h"
+#include "fastcv/fastcv.h"
+#include "tests/support/death.h"
 
 namespace {
 

@@ -14,9 +14,9 @@
 #include <string>
 #include <vector>
 
-#include "guarded_image.h"
-#include "kernels.h"
-#include "sparse_memory.h"
+#include "fastcv/kernels.h"
+#include "tests/support/guarded_image.h"
+#include "tests/support/sparse_memory.h"
 
 namespace {
 

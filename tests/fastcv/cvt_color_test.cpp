@@ -10,9 +10,9 @@
 #include <string>
 #include <vector>
 
-#include "cvt_kernels.h"
-#include "fastcv.h"
-#include "kernels.h"
+#include "fastcv/fastcv.h"
+#include "fastcv/kernels.h"
+#include "tests/support/cvt_kernels.h"
 
 namespace {
 

@@ -6,11 +6,11 @@
 #include <cstring>
 #include <vector>
 
-#include "cvt_families.h"
-#include "fastcv.h"
-#include "frame.h"
-#include "guarded_image.h"
-#include "sparse_memory.h"
+#include "fastcv/fastcv.h"
+#include "frame/frame.h"
+#include "tests/support/cvt_families.h"
+#include "tests/support/guarded_image.h"
+#include "tests/support/sparse_memory.h"
 
 using namespace HPC::fastcv;
 

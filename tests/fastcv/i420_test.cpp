@@ -7,10 +7,10 @@
 #include <string>
 #include <vector>
 
-#include "assertion_report.h"
-#include "fastcv.h"
-#include "guarded_image.h"
-#include "kernels.h"
+#include "fastcv/fastcv.h"
+#include "fastcv/kernels.h"
+#include "tests/support/assertion_report.h"
+#include "tests/support/guarded_image.h"
 
 namespace {
 

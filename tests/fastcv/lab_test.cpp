@@ -10,12 +10,12 @@
 #include <string>
 #include <vector>
 
-#include "fastcv.h"
-#include "guarded_image.h"
-#include "kernels.h"
-#include "lab_reference.h"
-#include "lab_tables.h"
-#include "roots.h"
+#include "fastcv/fastcv.h"
+#include "fastcv/kernels.h"
+#include "fastcv/src/arm/roots.h"
+#include "simd/lab_tables.h"
+#include "tests/support/guarded_image.h"
+#include "tests/support/lab_reference.h"
 
 namespace {
 

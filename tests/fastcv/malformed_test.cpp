@@ -6,9 +6,9 @@
 #include <climits>
 #include <vector>
 
-#include "cvt_families.h"
-#include "fastcv.h"
-#include "guarded_image.h"
+#include "fastcv/fastcv.h"
+#include "tests/support/cvt_families.h"
+#include "tests/support/guarded_image.h"
 
 using namespace HPC::fastcv;
 

@@ -9,7 +9,7 @@
 #include <type_traits>
 #include <utility>
 
-#include "fastcv.h"
+#include "fastcv/fastcv.h"
 
 namespace {
 

@@ -6,8 +6,8 @@
 #include <string>
 #include <vector>
 
-#include "guarded_image.h"
-#include "kernels.h"
+#include "fastcv/kernels.h"
+#include "tests/support/guarded_image.h"
 
 namespace {
 

@@ -4,9 +4,9 @@
 #include <cstring>
 #include <vector>
 
-#include "cvt_families.h"
-#include "fastcv.h"
-#include "guarded_image.h"
+#include "fastcv/fastcv.h"
+#include "tests/support/cvt_families.h"
+#include "tests/support/guarded_image.h"
 
 using namespace HPC::fastcv;
 

@@ -9,9 +9,9 @@
 #include <string>
 #include <vector>
 
-#include "death.h"
-#include "guarded_image.h"
-#include "kernels.h"
+#include "fastcv/kernels.h"
+#include "tests/support/death.h"
+#include "tests/support/guarded_image.h"
 
 namespace {
 

@@ -8,10 +8,10 @@
 #include <string>
 #include <vector>
 
-#include "death.h"
-#include "guarded_image.h"
-#include "kernels.h"
-#include "sparse_memory.h"
+#include "fastcv/kernels.h"
+#include "tests/support/death.h"
+#include "tests/support/guarded_image.h"
+#include "tests/support/sparse_memory.h"
 
 // Refusing memory takes an allocator of one's own, which a sanitizer already is.
 #if defined(__has_feature)

@@ -5,9 +5,9 @@
 #include <algorithm>
 #include <vector>
 
-#include "assertion_report.h"
-#include "guarded_image.h"
-#include "kernels.h"
+#include "fastcv/kernels.h"
+#include "tests/support/assertion_report.h"
+#include "tests/support/guarded_image.h"
 
 namespace {
 

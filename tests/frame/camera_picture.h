@@ -6,9 +6,9 @@
 #include <memory>
 #include <vector>
 
-#include "frame_reference.h"
-#include "guarded_image.h"
-#include "planes.h"
+#include "frame/planes.h"
+#include "tests/support/frame_reference.h"
+#include "tests/support/guarded_image.h"
 
 namespace kyface::test {
 

@@ -1,6 +1,6 @@
 // One pass over a camera's planes, against the planes turned and converted step by step.
 
-#include "planes.h"
+#include "frame/planes.h"
 
 #include <gtest/gtest.h>
 

@@ -1,7 +1,7 @@
 /// Which conversions of `cvtColor` make or take YUV 4:2:0 buffers; all others are of packed images.
 #pragma once
 
-#include "fastcv.h"
+#include "fastcv/fastcv.h"
 
 namespace kyface::test {
 

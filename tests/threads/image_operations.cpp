@@ -2,12 +2,12 @@
 
 #include <algorithm>
 
-#include "brightness.h"
-#include "cvt_families.h"
-#include "fastcv.h"
-#include "frame.h"
-#include "guarded_image.h"
+#include "brightness/brightness.h"
+#include "fastcv/fastcv.h"
+#include "frame/frame.h"
 #include "operation.h"
+#include "tests/support/cvt_families.h"
+#include "tests/support/guarded_image.h"
 
 namespace threads {
 

@@ -1,8 +1,8 @@
 #include <type_traits>
 
-#include "bridge_test.h"
-#include "frame_reference.h"
 #include "operation.h"
+#include "tests/jni/bridge_test.h"
+#include "tests/support/frame_reference.h"
 
 namespace threads {
 

@@ -6,8 +6,8 @@
 #include <barrier>
 #include <thread>
 
-#include "bridge_test.h"
 #include "operation.h"
+#include "tests/jni/bridge_test.h"
 
 namespace {
 

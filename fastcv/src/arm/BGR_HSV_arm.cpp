@@ -23,7 +23,7 @@
 #include <cmath>
 
 #include "entry.h"
-#include "loop.h"
+#include "simd/loop.h"
 
 namespace HPC::fastcv {
 namespace {

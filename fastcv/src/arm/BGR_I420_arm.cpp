@@ -23,7 +23,7 @@
 
 #include "entry.h"
 #include "kernel_assert.h"
-#include "loop.h"
+#include "simd/loop.h"
 
 namespace HPC::fastcv {
 namespace {

@@ -16,11 +16,11 @@
 #include <cstring>
 
 #include "entry.h"
-#include "factors.h"
-#include "gamma_planes.h"
-#include "lab_tables.h"
-#include "loop.h"
 #include "roots.h"
+#include "simd/factors.h"
+#include "simd/gamma_planes.h"
+#include "simd/lab_tables.h"
+#include "simd/loop.h"
 
 namespace HPC::fastcv {
 namespace {

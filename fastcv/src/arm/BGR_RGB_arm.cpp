@@ -1,7 +1,7 @@
 // Channel reorderings: alpha added or dropped, red and blue swapped. Values are moved bit for bit.
 
 #include "entry.h"
-#include "loop.h"
+#include "simd/loop.h"
 
 namespace HPC::fastcv {
 namespace {

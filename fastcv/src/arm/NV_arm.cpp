@@ -7,14 +7,12 @@
 //   U = ((65 B - 43 G - 22 R + 64) >> 7) + 128, clamped to a byte
 //   V = ((-12 B - 55 G + 67 R + 64) >> 7) + 128, clamped to a byte
 //
-//   B = (64 Y + 110 U + 32) >> 6, clamped to a byte
-//   G = (64 Y - 24 U - 44 V + 32) >> 6, clamped
-//   R = (64 Y + 86 V + 32) >> 6, clamped
-//
-// Shifts floor. Chroma belongs to a 2 x 2 block and is made from its top-left pixel alone.
+// The way back is in simd/nv_decode.h. Shifts floor. Chroma belongs to a 2 x 2 block and is made from its
+// top-left pixel alone.
 
 #include "entry.h"
-#include "loop.h"
+#include "simd/loop.h"
+#include "simd/nv_decode.h"
 
 namespace HPC::fastcv {
 namespace {
@@ -24,135 +22,10 @@ using namespace arm;
 constexpr int kYB = 16, kYG = 74, kYR = 38;
 constexpr int kUB = 65, kUG = -43, kUR = -22;
 constexpr int kVB = -12, kVG = -55, kVR = 67;
-constexpr int kBU = 110;
-constexpr int kGU = -24, kGV = -44;
-constexpr int kRV = 86;
 constexpr int kEncodeShift = 7;
-constexpr int kDecodeShift = 6;
 
 enum class Order { kBGR, kRGB };
 enum class Chroma { kVU, kUV };
-
-// What a chroma sample adds to a colour channel. As 64 Y is a multiple of 64, (64 Y + t + 32) >> 6 is
-// Y + ((t + 32) >> 6), and the added term, -220 to 218, splits into two bytes of which one is 0: adding the
-// one and subtracting the other, both saturating, is the clamped sum for 16 pixels at once.
-struct Term {
-  uint8x16_t plus;
-  uint8x16_t minus;
-};
-
-// The terms of 16 chroma samples from t and -1 - t, their products in 16 bits, which reach at most 110 * 128
-// = 14080.
-inline Term termOf(int16x8_t low, int16x8_t high, int16x8_t lowComplement, int16x8_t highComplement) {
-  // The negative part is -((t + 32) >> 6) = (31 - t) >> 6, which is the rounding shift of -1 - t.
-  return {roundingShiftToBytes<kDecodeShift>(low, high),
-          roundingShiftToBytes<kDecodeShift>(lowComplement, highComplement)};
-}
-
-inline int16x8_t asSigned(uint16x8_t v) { return vreinterpretq_s16_u16(v); }
-
-// weight * (stored - 128): the product with the stored byte, which a core finds faster than with a 16-bit
-// difference, less that with 128.
-inline Term termOf(uint8x16_t stored, int weight) {
-  const uint8x16_t w = vdupq_n_u8(static_cast<unsigned char>(weight));
-  const int16x8_t low = asSigned(vmull_u8(vget_low_u8(stored), vget_low_u8(w)));
-  const int16x8_t high = asSigned(vmull_high_u8(stored, w));
-  const int16x8_t offset = vdupq_n_s16(static_cast<int16_t>(weight * 128));
-  const int16x8_t complement = vdupq_n_s16(static_cast<int16_t>(weight * 128 - 1));
-  return termOf(vsubq_s16(low, offset), vsubq_s16(high, offset), vsubq_s16(complement, low),
-                vsubq_s16(complement, high));
-}
-
-// -weight1 * (stored1 - 128) - weight2 * (stored2 - 128)
-inline Term negativeTermOf(uint8x16_t stored1, int weight1, uint8x16_t stored2, int weight2) {
-  const uint8x16_t w1 = vdupq_n_u8(static_cast<unsigned char>(weight1));
-  const uint8x16_t w2 = vdupq_n_u8(static_cast<unsigned char>(weight2));
-  const int16x8_t low = asSigned(
-      vmlal_u8(vmull_u8(vget_low_u8(stored1), vget_low_u8(w1)), vget_low_u8(stored2), vget_low_u8(w2)));
-  const int16x8_t high = asSigned(vmlal_high_u8(vmull_high_u8(stored1, w1), stored2, w2));
-  const int16x8_t offset = vdupq_n_s16(static_cast<int16_t>((weight1 + weight2) * 128));
-  const int16x8_t complement = vdupq_n_s16(static_cast<int16_t>((weight1 + weight2) * 128 + 1));
-  return termOf(vsubq_s16(offset, low), vsubq_s16(offset, high), vsubq_s16(low, complement),
-                vsubq_s16(high, complement));
-}
-
-// Spreads 16 chroma terms over the 32 pixels of a row: those of the first or of the second 16.
-template <bool second>
-inline Term spread(const Term& term) {
-  if constexpr (second) {
-    return {vzip2q_u8(term.plus, term.plus), vzip2q_u8(term.minus, term.minus)};
-  } else {
-    return {vzip1q_u8(term.plus, term.plus), vzip1q_u8(term.minus, term.minus)};
-  }
-}
-
-inline uint8x16_t addTerm(uint8x16_t luma, const Term& term) {
-  return vqsubq_u8(vqaddq_u8(luma, term.plus), term.minus);
-}
-
-template <int nc, Order order, typename T, typename V>
-inline auto arranged(V b, V g, V r) {
-  return order == Order::kBGR ? pixelsOf<nc, T>(b, g, r) : pixelsOf<nc, T>(r, g, b);
-}
-
-// One row pair of a decoding: 32 columns a block.
-template <int nc, Order order, Chroma chroma>
-struct DecodePair {
-  static constexpr int kBlock = 32;
-
-  const unsigned char* luma0;
-  const unsigned char* luma1;
-  const unsigned char* pairs;
-  unsigned char* out0;
-  unsigned char* out1;
-
-  template <int n>
-  void block(ptrdiff_t x, Blocks<n>) const {
-    const uint8x16x2_t stored = vld2q_u8(pairs + x);
-    const uint8x16_t u8 = stored.val[chroma == Chroma::kVU ? 1 : 0];
-    const uint8x16_t v8 = stored.val[chroma == Chroma::kVU ? 0 : 1];
-    const Term b = termOf(u8, kBU);
-    const Term g = negativeTermOf(u8, -kGU, v8, -kGV);
-    const Term r = termOf(v8, kRV);
-    half(x, spread<false>(b), spread<false>(g), spread<false>(r));
-    half(x + 16, spread<true>(b), spread<true>(g), spread<true>(r));
-  }
-
-  void step(ptrdiff_t x) const {
-    const int u = pairs[x + (chroma == Chroma::kVU ? 1 : 0)] - 128;
-    const int v = pairs[x + (chroma == Chroma::kVU ? 0 : 1)] - 128;
-    const int b = kBU * u;
-    const int g = kGU * u + kGV * v;
-    const int r = kRV * v;
-    for (ptrdiff_t column = x; column < x + 2; ++column) {
-      pixel(luma0[column], b, g, r, out0 + column * nc);
-      pixel(luma1[column], b, g, r, out1 + column * nc);
-    }
-  }
-
- private:
-  void half(ptrdiff_t x, const Term& b, const Term& g, const Term& r) const {
-    const uint8x16_t y0 = vld1q_u8(luma0 + x);
-    const uint8x16_t y1 = vld1q_u8(luma1 + x);
-    storePixels(out0 + x * nc,
-                arranged<nc, order, unsigned char>(addTerm(y0, b), addTerm(y0, g), addTerm(y0, r)));
-    storePixels(out1 + x * nc,
-                arranged<nc, order, unsigned char>(addTerm(y1, b), addTerm(y1, g), addTerm(y1, r)));
-  }
-
-  static void pixel(int y, int b, int g, int r, unsigned char* out) {
-    constexpr int kHalf = 1 << (kDecodeShift - 1);
-    const int scaled = (y << kDecodeShift) + kHalf;
-    const unsigned char blue = clampToByte((scaled + b) >> kDecodeShift);
-    const unsigned char green = clampToByte((scaled + g) >> kDecodeShift);
-    const unsigned char red = clampToByte((scaled + r) >> kDecodeShift);
-    if constexpr (order == Order::kBGR) {
-      storePixel<nc>(out, blue, green, red);
-    } else {
-      storePixel<nc>(out, red, green, blue);
-    }
-  }
-};
 
 // One row pair of an encoding: 16 columns a block.
 template <int nc, Order order, Chroma chroma>
@@ -259,14 +132,28 @@ struct EncodePair {
 template <int nc, Order order, Chroma chroma>
 inline void decode(int height, int width, int inWidthStride, const unsigned char* inData, int outWidthStride,
                    unsigned char* outData) {
-  using Pair = DecodePair<nc, order, chroma>;
+  constexpr bool kFirstIsV = chroma == Chroma::kVU;
+  constexpr bool kRgb = order == Order::kRGB;
+  const ColourDecoder<nc, kFirstIsV != kRgb> decoder(kFirstIsV);
   const ptrdiff_t inStride = inWidthStride;
   const ptrdiff_t outStride = outWidthStride;
-  forEachRowPair<Pair::kBlock, 1>(height, width, [=](ptrdiff_t row) {
-    const unsigned char* luma = inData + row * inStride;
-    unsigned char* out = outData + row * outStride;
-    return Pair{luma, luma + inStride, inData + (height + row / 2) * inStride, out, out + outStride};
-  });
+  const ptrdiff_t length = width & ~1;
+  for (ptrdiff_t row = 0; row + 1 < height; row += 2) {
+    const unsigned char* const luma = inData + row * inStride;
+    const unsigned char* const pairs = inData + (height + row / 2) * inStride;
+    unsigned char* const out = outData + row * outStride;
+    if (length >= kDecodeColumns) {
+      decodeRowPair<true, false>(decoder, {luma, luma + inStride, pairs, nullptr}, length, out,
+                                 out + outStride);
+      continue;
+    }
+    for (ptrdiff_t x = 0; x < length; ++x) {
+      const unsigned char* const pair = pairs + (x & ~1);
+      const DecodedSample<nc, kRgb> sample(pair[kFirstIsV ? 1 : 0], pair[kFirstIsV ? 0 : 1]);
+      sample.store(luma[x], out + x * nc);
+      sample.store(luma[inStride + x], out + outStride + x * nc);
+    }
+  }
 }
 
 template <int nc, Order order, Chroma chroma>

@@ -2,9 +2,9 @@
 
 #include <cstddef>
 
-#include "copy.h"
 #include "entry.h"
 #include "kernel_assert.h"
+#include "simd/copy.h"
 
 namespace HPC::fastcv {
 namespace {

@@ -12,10 +12,10 @@
 #include <cmath>
 #include <type_traits>
 
-#include "copy.h"
 #include "entry.h"
-#include "loop.h"
-#include "overlap.h"
+#include "simd/copy.h"
+#include "simd/loop.h"
+#include "simd/overlap.h"
 
 namespace HPC::fastcv {
 namespace {

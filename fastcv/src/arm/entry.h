@@ -1,7 +1,7 @@
 /// How a kernel family defines its entry points: one line for each instance, as in a table.
 #pragma once
 
-#include "kernels.h"
+#include "fastcv/kernels.h"
 
 /// Makes the explicit instantiation of a kernel part of the shared library's interface: GCC does not take
 /// that from the kernel's declaration.

@@ -4,8 +4,8 @@
 #include <cmath>
 #include <cstdint>
 
-#include "factors.h"
-#include "neon.h"
+#include "simd/factors.h"
+#include "simd/neon.h"
 
 namespace HPC::fastcv::arm {
 

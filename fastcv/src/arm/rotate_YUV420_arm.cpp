@@ -9,10 +9,10 @@
 #include <cstdlib>
 #include <memory>
 
-#include "copy.h"
 #include "entry.h"
 #include "kernel_assert.h"
 #include "rotate.h"
+#include "simd/copy.h"
 
 namespace HPC::fastcv {
 namespace {

@@ -15,8 +15,8 @@
 
 #include "entry.h"
 #include "kernel_assert.h"
-#include "loop.h"
-#include "tile.h"
+#include "simd/loop.h"
+#include "simd/tile.h"
 
 namespace HPC::fastcv {
 namespace arm {

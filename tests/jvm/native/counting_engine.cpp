@@ -9,7 +9,7 @@
 #include <cstdlib>
 #include <cstring>
 
-#include "kyface_api.h"
+#include "kyface_api/kyface_api.h"
 
 namespace {
 

@@ -24,7 +24,7 @@ public class EngineValuesTest {
             "^(?:#define\\s+KY_(\\w+)\\s+(\\S+)|\\s*KY_(\\w+)\\s*=\\s*(-?\\w+),?)", Pattern.MULTILINE);
 
     private static Map<String, String> inHeader() throws IOException {
-        byte[] bytes = Files.readAllBytes(Paths.get(System.getProperty("kyface.source"), "engine/ky_engine.h"));
+        byte[] bytes = Files.readAllBytes(Paths.get(System.getProperty("kyface.source"), "engine/include/engine/ky_engine.h"));
         Map<String, String> values = new TreeMap<>();
         Matcher m = VALUE.matcher(new String(bytes, StandardCharsets.UTF_8));
         while (m.find()) {

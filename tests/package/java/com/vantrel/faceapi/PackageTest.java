@@ -76,7 +76,7 @@ public final class PackageTest {
             entries = zip.stream().map(ZipEntry::getName).collect(Collectors.toCollection(TreeSet::new));
         }
         assertEquals(new TreeSet<>(Arrays.asList("AndroidManifest.xml", "LICENSE", "NOTICE.txt", "R.txt",
-                "README.txt", "classes.jar", LIBRARY, "prefab/prefab.json", MODULE + "module.json", MODULE + "include/fastcv.h",
+                "README.txt", "classes.jar", LIBRARY, "prefab/prefab.json", MODULE + "module.json", MODULE + "include/fastcv/fastcv.h",
                 MODULE + "libs/android.arm64-v8a/abi.json", MODULE + "libs/android.arm64-v8a/libjni_kyface_api.so",
                 "proguard.txt")), entries);
         for (String beside : new String[] {"-sources.jar", "-javadoc.jar", ".pom"}) {

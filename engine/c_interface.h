@@ -1,8 +1,0 @@
-/// The C interface that the engine implements, whose functions alone are visible from outside.
-#pragma once
-
-#pragma GCC visibility push(default)
-#include "kyface_api.h"
-#pragma GCC visibility pop
-
-#include "ky_engine.h"

@@ -1,0 +1,51 @@
+/// The pixel work behind `convert_planes`. Everything is trusted here, and pictures are not small.
+#pragma once
+
+#include <cstddef>
+
+namespace kyface {
+
+/// The smallest width (and, of a picture that is turned, height) that the kernels can do.
+inline constexpr int kKernelSide = 32;
+
+/// A rectangle of a picture, with its chroma in pairs or in two planes. Strides are signed: the rows may
+/// follow each other upwards.
+struct PlanesView {
+  int width;   ///< even, at least kKernelSide
+  int height;  ///< even; at least kKernelSide where the view is turned
+  const unsigned char* luma;
+  std::ptrdiff_t luma_stride;
+  const unsigned char* first;  ///< the pairs, or the plane of the samples that are called first
+  std::ptrdiff_t first_stride;
+  const unsigned char* second;  ///< null with pairs
+  std::ptrdiff_t second_stride;
+  bool first_is_v;  ///< whether the pairs' or planes' first samples are V, not U
+};
+
+/// Rows to write; signed as well.
+struct PixelRows {
+  unsigned char* data;
+  std::ptrdiff_t stride;
+};
+
+/// How a colour is written.
+struct ColourOrder {
+  bool red_first;
+  bool alpha;  ///< a fourth byte of 255
+};
+
+/// Decodes a view, with its rows as they are or mirrored left to right.
+void decode_rows(const PlanesView& view, bool mirrored, ColourOrder order, const PixelRows& out);
+
+/// Decodes a view transposed: its columns become rows.
+void decode_transposed(const PlanesView& view, ColourOrder order, const PixelRows& out);
+
+/// Copies a view's luma.
+void copy_luma(const PlanesView& view, bool mirrored, const PixelRows& out);
+void transpose_luma(const PlanesView& view, const PixelRows& out);
+
+/// Copies a view's chroma as pairs, V first or U first.
+void copy_chroma(const PlanesView& view, bool mirrored, bool v_first, const PixelRows& out);
+void transpose_chroma(const PlanesView& view, bool v_first, const PixelRows& out);
+
+}  // namespace kyface

@@ -1,0 +1,282 @@
+/// Full-range YUV 4:2:0 to colours: what the conversions of whole frames and of a camera's planes share. The
+/// coefficients are this library's own; with U and V the stored bytes minus 128:
+///
+///   B = (64 Y + 110 U + 32) >> 6, clamped to a byte
+///   G = (64 Y - 24 U - 44 V + 32) >> 6, clamped
+///   R = (64 Y + 86 V + 32) >> 6, clamped
+///
+/// Shifts floor. A chroma sample belongs to 2 x 2 pixels.
+#pragma once
+
+#include "simd/loop.h"
+#include "simd/pixel.h"
+#include "simd/registers.h"
+#include "simd/tile.h"
+
+namespace HPC::fastcv::arm {
+
+inline constexpr int kDecodeShift = 6;
+
+/// What a chroma sample counts in the colour that is its own, B for U and R for V, and, taken away, in green.
+struct ChromaWeights {
+  int colour;
+  int green;
+};
+inline constexpr ChromaWeights kWeightsU = {110, 24};
+inline constexpr ChromaWeights kWeightsV = {86, 44};
+
+/// What chroma samples add to a colour channel. As 64 Y is a multiple of 64, (64 Y + t + 32) >> 6 is
+/// Y + ((t + 32) >> 6), and the added term, -220 to 218, splits into two bytes of which one is 0: adding the
+/// one and subtracting the other, both saturating, is the clamped sum for 16 pixels at once.
+struct ChromaTerm {
+  uint8x16_t plus;
+  uint8x16_t minus;
+};
+
+namespace detail {
+
+/// The terms of 16 chroma samples from t, their products in 16 bits, which reach at most 110 * 128 = 14080.
+inline ChromaTerm chromaTerm(int16x8_t low, int16x8_t high) {
+  // The negative part is -((t + 32) >> 6) = (31 - t) >> 6, which is the rounding shift of -1 - t: of the bits
+  // of t inverted, for which no constant takes a register.
+  return {roundingShiftToBytes<kDecodeShift>(low, high),
+          roundingShiftToBytes<kDecodeShift>(vmvnq_s16(low), vmvnq_s16(high))};
+}
+
+inline int16x8_t asSigned(uint16x8_t v) { return vreinterpretq_s16_u16(v); }
+
+inline uint8x16_t weightVector(int weight) { return vdupq_n_u8(static_cast<unsigned char>(weight)); }
+
+/// weight * (stored - 128): the product with the stored byte, which a core finds faster than with a 16-bit
+/// difference, less that with 128.
+inline ChromaTerm colourTerm(uint8x16_t stored, int weight) {
+  const uint8x16_t w = weightVector(weight);
+  const int16x8_t low = asSigned(vmull_u8(vget_low_u8(stored), vget_low_u8(w)));
+  const int16x8_t high = asSigned(vmull_high_u8(stored, w));
+  const int16x8_t offset = vdupq_n_s16(static_cast<int16_t>(weight * 128));
+  return chromaTerm(vsubq_s16(low, offset), vsubq_s16(high, offset));
+}
+
+/// -weight1 * (stored1 - 128) - weight2 * (stored2 - 128)
+inline ChromaTerm greenTerm(uint8x16_t stored1, int weight1, uint8x16_t stored2, int weight2) {
+  const uint8x16_t w1 = weightVector(weight1);
+  const uint8x16_t w2 = weightVector(weight2);
+  const int16x8_t low = asSigned(
+      vmlal_u8(vmull_u8(vget_low_u8(stored1), vget_low_u8(w1)), vget_low_u8(stored2), vget_low_u8(w2)));
+  const int16x8_t high = asSigned(vmlal_high_u8(vmull_high_u8(stored1, w1), stored2, w2));
+  const int16x8_t offset = vdupq_n_s16(static_cast<int16_t>((weight1 + weight2) * 128));
+  return chromaTerm(vsubq_s16(offset, low), vsubq_s16(offset, high));
+}
+
+}  // namespace detail
+
+/// The terms of 16 chroma samples, or, spread, those of 16 pixels of a row.
+struct ChromaTerms {
+  ChromaTerm first;  ///< of the colour that is the first sample's
+  ChromaTerm green;
+  ChromaTerm second;  ///< of the colour that is the second sample's
+};
+
+/// The terms of 16 first and 16 second chroma samples, U and V in either order.
+inline ChromaTerms chromaTerms(uint8x16_t first, ChromaWeights firstWeights, uint8x16_t second,
+                               ChromaWeights secondWeights) {
+  return {detail::colourTerm(first, firstWeights.colour),
+          detail::greenTerm(first, firstWeights.green, second, secondWeights.green),
+          detail::colourTerm(second, secondWeights.colour)};
+}
+
+/// Spreads 16 chroma terms over the 32 pixels of a row: those of the first or of the second 16.
+template <bool second>
+inline ChromaTerm spread(const ChromaTerm& term) {
+  if constexpr (second) {
+    return {vzip2q_u8(term.plus, term.plus), vzip2q_u8(term.minus, term.minus)};
+  } else {
+    return {vzip1q_u8(term.plus, term.plus), vzip1q_u8(term.minus, term.minus)};
+  }
+}
+template <bool second>
+inline ChromaTerms spread(const ChromaTerms& terms) {
+  return {spread<second>(terms.first), spread<second>(terms.green), spread<second>(terms.second)};
+}
+
+inline uint8x16_t addTerm(uint8x16_t luma, const ChromaTerm& term) {
+  return vqsubq_u8(vqaddq_u8(luma, term.plus), term.minus);
+}
+
+/// 16 pixels of their luma and their terms. The first channel is the first sample's colour; with `swapped`
+/// the second's.
+template <bool swapped>
+inline Pixels<unsigned char, 3> decodedPixels(uint8x16_t luma, const ChromaTerms& terms) {
+  const uint8x16_t first = addTerm(luma, terms.first);
+  const uint8x16_t green = addTerm(luma, terms.green);
+  const uint8x16_t second = addTerm(luma, terms.second);
+  return swapped ? Pixels<unsigned char, 3>{{second, green, first}}
+                 : Pixels<unsigned char, 3>{{first, green, second}};
+}
+
+/// The column pairs of a chroma sample in up to two rows, pixel by pixel. `u` and `v` are the stored bytes.
+template <int nc, bool rgb>
+class DecodedSample {
+ public:
+  DecodedSample(unsigned char u, unsigned char v)
+      : b_(kWeightsU.colour * (u - 128)),
+        g_(-kWeightsU.green * (u - 128) - kWeightsV.green * (v - 128)),
+        r_(kWeightsV.colour * (v - 128)) {}
+
+  void store(unsigned char luma, unsigned char* out) const {
+    constexpr int kHalf = 1 << (kDecodeShift - 1);
+    const int scaled = (luma << kDecodeShift) + kHalf;
+    const unsigned char blue = clampToByte((scaled + b_) >> kDecodeShift);
+    const unsigned char green = clampToByte((scaled + g_) >> kDecodeShift);
+    const unsigned char red = clampToByte((scaled + r_) >> kDecodeShift);
+    if constexpr (rgb) {
+      storePixel<nc>(out, red, green, blue);
+    } else {
+      storePixel<nc>(out, blue, green, red);
+    }
+  }
+
+ private:
+  int b_;
+  int g_;
+  int r_;
+};
+
+// ---- blocks and rows
+
+/// Columns that are decoded at once: those of the 16 chroma samples of a register.
+inline constexpr int kDecodeColumns = 32;
+
+/// 16 first and 16 second chroma samples.
+struct ChromaBlock {
+  uint8x16_t first;
+  uint8x16_t second;
+};
+
+/// What is the same for all blocks of a picture. `swapped` as for `decodedPixels`.
+template <int nc, bool swapped>
+class ColourDecoder {
+ public:
+  /// The first samples are V, or U.
+  explicit ColourDecoder(bool firstIsV)
+      : first_(firstIsV ? kWeightsV : kWeightsU), second_(firstIsV ? kWeightsU : kWeightsV) {
+    uint8x16_t alpha = splat(kOpaque<unsigned char>);
+    for (uint8x16_t& ofRow : alpha_) {
+      forget(alpha);
+      ofRow = alpha;
+    }
+  }
+
+  /// Decodes a block of two rows: `luma(row, half)` gives 16 columns. Each row's second half is stored 16
+  /// pixels behind the first, and then its pointer moves on by `step`. The luma is asked for when it is
+  /// needed, as registers are few.
+  template <typename Luma>
+  TILE_INLINE void decode(const Luma& luma, const ChromaBlock& chroma, unsigned char* (&out)[2],
+                          ptrdiff_t step) const {
+    const ChromaTerms terms = chromaTerms(chroma.first, first_, chroma.second, second_);
+    half(luma(0, 0), luma(1, 0), spread<false>(terms), out, 16 * nc);
+    half(luma(0, 1), luma(1, 1), spread<true>(terms), out, step);
+  }
+
+ private:
+  TILE_INLINE void half(uint8x16_t luma0, uint8x16_t luma1, const ChromaTerms& terms,
+                        unsigned char* (&out)[2], ptrdiff_t step) const {
+    store<0>(decodedPixels<swapped>(luma0, terms), out[0], step);
+    store<1>(decodedPixels<swapped>(luma1, terms), out[1], step);
+  }
+
+  /// An alpha for each row: one register cannot stand behind several colour registers.
+  template <int row>
+  TILE_INLINE void store(const Pixels<unsigned char, 3>& pixels, unsigned char*& out, ptrdiff_t step) const {
+    storePixels(out, withAlpha<nc>(pixels, alpha_[row]));
+    out += step;
+    keepInRegister(out);
+  }
+
+  ChromaWeights first_;
+  ChromaWeights second_;
+  uint8x16_t alpha_[2];
+};
+
+inline uint8x16_t reversedBytes(uint8x16_t v) {
+  static constexpr unsigned char kOrder[] = {15, 14, 13, 12, 11, 10, 9, 8, 7, 6, 5, 4, 3, 2, 1, 0};
+  return vqtbl1q_u8(v, vld1q_u8(kOrder));
+}
+
+/// Two rows of luma and their row of chroma.
+struct RowPair {
+  const unsigned char* luma0;
+  const unsigned char* luma1;
+  const unsigned char* first;   ///< the first samples, or pairs of a first and a second
+  const unsigned char* second;  ///< not used with pairs
+};
+
+/// Reads blocks from a row pair, along it or from its end down.
+template <bool pairs, bool mirrored>
+class RowPairReader {
+ public:
+  /// The first block is the one at `column`.
+  RowPairReader(const RowPair& rows, ptrdiff_t column)
+      : luma_{rows.luma0 + column, rows.luma1 + column},
+        first_(rows.first + (pairs ? column : column / 2)),
+        second_(pairs ? nullptr : rows.second + column / 2) {}
+
+  TILE_INLINE ChromaBlock chroma() const {
+    ChromaBlock block;
+    if constexpr (pairs) {
+      const uint8x16x2_t both = vld2q_u8(first_);
+      block = {both.val[0], both.val[1]};
+    } else {
+      block = {vld1q_u8(first_), vld1q_u8(second_)};
+    }
+    return mirrored ? ChromaBlock{reversedBytes(block.first), reversedBytes(block.second)} : block;
+  }
+
+  TILE_INLINE uint8x16_t luma(int row, int half) const {
+    const uint8x16_t v = vld1q_u8(luma_[row] + 16 * (mirrored ? 1 - half : half));
+    return mirrored ? reversedBytes(v) : v;
+  }
+
+  TILE_INLINE void next() {
+    advance(luma_[0], kDecodeColumns);
+    advance(luma_[1], kDecodeColumns);
+    advance(first_, pairs ? kDecodeColumns : kDecodeColumns / 2);
+    if constexpr (!pairs) {
+      advance(second_, kDecodeColumns / 2);
+    }
+  }
+
+ private:
+  static TILE_INLINE void advance(const unsigned char*& at, ptrdiff_t step) {
+    at += mirrored ? -step : step;
+    keepInRegister(at);
+  }
+
+  const unsigned char* luma_[2];
+  const unsigned char* first_;
+  const unsigned char* second_;
+};
+
+/// Decodes `width` columns, even and at least kDecodeColumns, of a row pair; the last block is flush with
+/// the row's end. With `mirrored` the first column becomes the last. Inlined, so that the decoder is
+/// registers.
+template <bool pairs, bool mirrored, int nc, bool swapped>
+TILE_INLINE void decodeRowPair(const ColourDecoder<nc, swapped>& decoder, const RowPair& rows,
+                               ptrdiff_t width, unsigned char* out0, unsigned char* out1) {
+  const auto run = [&](ptrdiff_t x, ptrdiff_t blocks) TILE_LAMBDA {
+    RowPairReader<pairs, mirrored> from(rows, mirrored ? width - x - kDecodeColumns : x);
+    unsigned char* out[2] = {out0 + x * nc, out1 + x * nc};
+    KERNEL_ROLLED_LOOP
+    for (; blocks != 0; --blocks) {
+      decoder.decode([&](int row, int half) TILE_LAMBDA { return from.luma(row, half); }, from.chroma(), out,
+                     16 * nc);
+      from.next();
+    }
+  };
+  run(0, width / kDecodeColumns);
+  if (width % kDecodeColumns != 0) {
+    run(width - kDecodeColumns, 1);
+  }
+}
+
+}  // namespace HPC::fastcv::arm
