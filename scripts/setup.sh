@@ -4,8 +4,9 @@
 #   scripts/setup.sh [group...]
 #
 # Groups are `host` and `aarch64`, named after the build presets that need them, both without an argument; `bench`,
-# `coverage`, `fuzz` and `lint`, which add what the scripts of these names need; and `models`, which makes the verifier's
-# model in .deps/models out of published weights, and which nothing else needs. Packages that are there already are left
+# `coverage`, `fuzz` and `lint`, which add what the scripts of these names need; `models`, which makes the verifier's
+# model in .deps/models out of published weights; and `android-java`, which brings Android's own framework classes for the
+# tests of that label. Nothing else needs the last two. Packages that are there already are left
 # alone, and nothing is asked when all are. Packages of this machine are installed with apt-get (through sudo when not
 # root). Packages of 64-bit Arm are unpacked into .deps/arm64: installing them would pull this system's own packages
 # along.
@@ -32,6 +33,10 @@ packages_aarch64=(
 packages_models=(
   python3                      # the conversion
   libdlib-data                 # landmarks, which go into the same file
+)
+packages_android_java=(
+  "${packages_host[@]}"
+  maven                        # fetches the rest
 )
 packages_lint=(
   "${packages_aarch64[@]}"
@@ -195,9 +200,32 @@ END
   say "the verifier's models are in .deps/models"
 }
 
+# fetch_android_java: Android's framework classes, what runs them on a desktop, and the Kotlin compiler, into
+# .deps/android-java: the files of tests/android_java/pom.xml, as jars.sha256 beside it has them.
+fetch_android_java() {
+  local folder=$deps/android-java work=$deps/android-java.new
+  local sums=$root/tests/android_java/jars.sha256
+  mkdir -p "$deps"
+  exec 9>"$deps/lock"
+  flock 9 # another script may be at it
+  if ! cmp -s "$sums" "$folder/complete"; then
+    say "fetching Android's framework classes and the Kotlin compiler into .deps/android-java"
+    rm -rf "$folder" "$work"
+    mkdir -p "$work"
+    mvn -B -q -f tests/android_java/pom.xml -Dmaven.repo.local="$work/repository" -DoutputDirectory="$work/jars" \
+      org.apache.maven.plugins:maven-dependency-plugin:3.6.1:copy >&2 ||
+      fail "Maven could not fetch Android's framework classes; the tests that take them are skipped"
+    (cd "$work/jars" && sha256sum --quiet -c "$sums" >&2) || fail "the files that Maven fetched are not those expected"
+    cp "$sums" "$work/jars/complete"
+    mv "$work/jars" "$folder"
+    rm -rf "$work"
+  fi
+  exec 9>&-
+}
+
 command -v apt-get >/dev/null || fail "this needs a Debian system (Debian 12 or later): there is no apt-get"
 [ $# -gt 0 ] || set -- host aarch64
-packages=() arm64=() models=
+packages=() arm64=() models= android_java=
 for group in "$@"; do
   case $group in
     host) packages+=("${packages_host[@]}") ;;
@@ -207,10 +235,15 @@ for group in "$@"; do
     coverage) packages+=("${packages_coverage[@]}") ;;
     bench) packages+=("${packages_bench[@]}") arm64+=("${arm64_bench[@]}") ;;
     models) packages+=("${packages_models[@]}") models=1 ;;
-    *) fail "there is no group \"$group\"; the groups are host, aarch64, bench, coverage, fuzz, lint and models" ;;
+    android-java) packages+=("${packages_android_java[@]}") android_java=1 ;;
+    *)
+      fail "there is no group \"$group\"; the groups are host, aarch64, android-java, bench, coverage, fuzz, lint" \
+        "and models"
+      ;;
   esac
 done
 readarray -t packages < <(printf '%s\n' "${packages[@]}" | awk '!seen[$0]++')
 install_packages "${packages[@]}"
 [ ${#arm64[@]} -eq 0 ] || unpack_arm64 "${arm64[@]}"
 [ -z "$models" ] || make_models
+[ -z "$android_java" ] || fetch_android_java

@@ -92,8 +92,9 @@ public final class Bitmap {
         return copy;
     }
 
+    /** Whether pixels can be set; as on Android also true once there are none. */
     public boolean isMutable() {
-        return mutable;
+        return mutable || pixels == null;
     }
 
     /** Bytes from one row to the next. */
@@ -260,8 +261,13 @@ public final class Bitmap {
         return (color * alpha + 127) / 255;
     }
 
+    /** As Android's graphics divide: in floats, by a reciprocal, rounded to the nearest, halves to the even one. */
     private static int over(int color, int alpha) {
-        return alpha == 0 ? 0 : Math.min(255, (color * 255 + alpha / 2) / alpha);
+        if (alpha == 0) {
+            return 0;
+        }
+        float scale = 1 / (alpha * (1 / 255f));
+        return (int) Math.rint(Math.min(color * (1 / 255f) * scale, 1f) * 255f);
     }
 
     private void checkAlive() {

@@ -1,0 +1,6 @@
+package androidx.camera.core;
+
+/** As much of CameraX's description of an image as the documents' examples use. */
+public interface ImageInfo {
+    int getRotationDegrees();
+}

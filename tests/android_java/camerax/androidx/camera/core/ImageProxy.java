@@ -1,0 +1,29 @@
+package androidx.camera.core;
+
+import android.graphics.Rect;
+import java.nio.ByteBuffer;
+
+/** As much of CameraX's image as the documents' examples use. */
+public interface ImageProxy extends AutoCloseable {
+    /** As CameraX's. */
+    interface PlaneProxy {
+        int getRowStride();
+
+        int getPixelStride();
+
+        ByteBuffer getBuffer();
+    }
+
+    @Override
+    void close();
+
+    Rect getCropRect();
+
+    int getWidth();
+
+    int getHeight();
+
+    PlaneProxy[] getPlanes();
+
+    ImageInfo getImageInfo();
+}
