@@ -93,8 +93,10 @@ void copied(const Frame& f) { libyuv::CopyPlane(f.in, f.width, f.out, f.width, f
 /// A camera's planes converted, then turned, with rows of their own between the two. `mode` 0 converts alone.
 void addPlanes(std::vector<Operation>& operations, bool pairs, libyuv::RotationMode mode, bool mirrored) {
   std::string name = pairs ? "pairs-to-RGBA" : "planes-to-RGBA";
-  name += mode != libyuv::kRotate0 ? "-" + std::to_string(static_cast<int>(mode)) : "";
-  name += mirrored ? "-mirrored" : "";
+  if (mode != libyuv::kRotate0) {
+    name.append("-").append(std::to_string(static_cast<int>(mode)));
+  }
+  name.append(mirrored ? "-mirrored" : "");
   operations.push_back({name, "libyuv", 1.5 + 4, [=](Size size) {
                           const int padding = 64;
                           const int stride = size.width + padding;

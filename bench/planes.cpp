@@ -52,9 +52,11 @@ constexpr Layout kNv21 = {"NV21", PixelLayout::kNv21, 1, 1.5};
 
 void addView(std::vector<Operation>& operations, bool pairs, const Layout& layout, int degrees,
              bool mirrored) {
-  std::string name = std::string(pairs ? "pairs" : "planes") + "-to-" + layout.name;
-  name += degrees != 0 ? "-" + std::to_string(degrees) : "";
-  name += mirrored ? "-mirrored" : "";
+  std::string name = std::string(pairs ? "pairs" : "planes").append("-to-").append(layout.name);
+  if (degrees != 0) {
+    name.append("-").append(std::to_string(degrees));
+  }
+  name.append(mirrored ? "-mirrored" : "");
   operations.push_back(
       {name, "fastcv", 1.5 + layout.outBytes, [=](Size size) {
          const Planes planes = planesOf(size, pairs);
@@ -75,7 +77,8 @@ void addView(std::vector<Operation>& operations, bool pairs, const Layout& layou
 void addTwoPasses(std::vector<Operation>& operations, int degrees) {
   using namespace HPC::fastcv;
   operations.push_back(
-      {"two-passes-NV21-to-RGBA-" + std::to_string(degrees), "fastcv", 1.5 + 3 * 4, [=](Size size) {
+      {std::string("two-passes-NV21-to-RGBA-").append(std::to_string(degrees)), "fastcv", 1.5 + 3 * 4,
+       [=](Size size) {
          const auto frame = samples<unsigned char>(size.pixels() * 3 / 2);
          const auto pixels = samples<unsigned char>(size.pixels() * 4);
          const auto out = samples<unsigned char>(size.pixels() * 4);
