@@ -88,9 +88,10 @@ int ky_face_algorithm_info() {
         "  detector: frontal faces by histograms of oriented gradients; built in\n"
         "  landmarks: from a model file of the caller's\n"
         "  tracker: the detector, and correlation filters between its frames\n"
-        "  verifier: uniform local binary patterns, version %d, %d bytes a feature\n",
+        "  verifier: uniform local binary patterns, version %d, %d bytes a feature\n"
+        "  verifier with a descriptor's model: %d numbers, version %d, %d bytes a feature\n",
         KY_ENGINE_VERSION, DLIB_MAJOR_VERSION, DLIB_MINOR_VERSION, DLIB_PATCH_VERSION, KY_VERIFY_VERSION,
-        KY_FEATURE_LENGTH);
+        KY_FEATURE_LENGTH, KY_DESCRIPTOR_NUMBERS, KY_DESCRIPTOR_VERSION, KY_DESCRIPTOR_LENGTH);
     Require(written > 0 && std::fflush(stdout) == 0, KY_ERROR_INTERNAL);
   });
 }

@@ -1,124 +1,63 @@
 #include "feature.h"
 
-#include <dlib/crc32.h>
-#include <dlib/image_transforms.h>
-
 #include <algorithm>
-#include <bit>
+#include <array>
 #include <cmath>
+#include <cstddef>
+#include <cstring>
 #include <string_view>
-#include <vector>
+
+#include "checksum.h"
 
 namespace kyengine {
 namespace {
 
-// The crop is scaled to a square of kCells x kCells cells of kCellSide pixels with a border for the patterns
-// of the outermost pixels. The size, the radius and the smoothing are those that told views of one face
-// (moved, scaled, rolled, noisy, with the detector's inexact boxes) from other parts of pictures best.
-constexpr int kCells = 8;
-constexpr int kCellSide = 10;
-constexpr int kSide = kCells * kCellSide;
-constexpr int kBorder = 4;
-constexpr int kCropSide = kSide + 2 * kBorder;
+constexpr size_t kMark = 3;
+constexpr size_t kChecksum = sizeof(uint32_t);
 
-/// Patterns of the eight neighbours with at most two changes around the circle have a bin each, all others
-/// share one.
-constexpr int kBins = 59;
-constexpr int kHistograms = kCells * kCells * kBins;
+constexpr size_t kPatternLength = kMark + kPatternBytes + kChecksum;
+static_assert(kPatternLength == KY_FEATURE_LENGTH);
 
-constexpr std::array<uint8_t, 3> kMark = {'K', 'Y', KY_VERIFY_VERSION};
-constexpr size_t kChecksumAt = kMark.size() + kHistograms;
-static_assert(kChecksumAt + 4 == KY_FEATURE_LENGTH);
-static_assert(KY_FEATURE_LENGTH % 3 == 0, "the text needs no padding");
-static_assert(KY_FEATURE_TEXT_LENGTH == KY_FEATURE_LENGTH / 3 * 4 + 1);
+constexpr size_t kTagAt = kMark;
+constexpr size_t kCountAt = kTagAt + sizeof(uint32_t);
+constexpr size_t kNumbersAt = kCountAt + sizeof(uint16_t);
+constexpr size_t kDescriptorLength = kNumbersAt + KY_DESCRIPTOR_NUMBERS * sizeof(float) + kChecksum;
+static_assert(kDescriptorLength == KY_DESCRIPTOR_LENGTH);
 
-/// Grays in 256ths. A multiple of one by up to 65536 still fits.
-using Patch = std::array<std::array<uint32_t, kCropSide>, kCropSide>;
+constexpr size_t TextLength(size_t length) { return length / 3 * 4 + 1; }
+static_assert(kPatternLength % 3 == 0 && kDescriptorLength % 3 == 0, "texts need no padding");
+static_assert(TextLength(kPatternLength) == KY_FEATURE_TEXT_LENGTH);
+static_assert(TextLength(kDescriptorLength) == KY_DESCRIPTOR_TEXT_LENGTH);
 
-constexpr std::array<uint8_t, 256> kBinOf = [] {
-  std::array<uint8_t, 256> bins = {};
-  uint8_t next = 0;
-  for (unsigned pattern = 0; pattern < bins.size(); ++pattern) {
-    const auto byte = static_cast<uint8_t>(pattern);
-    const bool uniform = std::popcount(static_cast<uint8_t>(byte ^ std::rotr(byte, 1))) <= 2;
-    bins[pattern] = uniform ? next++ : kBins - 1;
+using Numbers = std::array<float, KY_DESCRIPTOR_NUMBERS>;
+
+/// The length of features that start like this; 0 when none do.
+size_t LengthOf(uint8_t first, uint8_t second, uint8_t version) {
+  if (first != 'K' || second != 'Y') {
+    return 0;
   }
-  return bins;
-}();
-
-/// The crop, smoothed by the binomial filter 1 4 6 4 1 in both directions, in 256ths. Whole numbers keep
-/// areas of one gray exactly even.
-Patch Smoothed(const GrayImage& picture, const FaceCrop& crop) {
-  GrayImage chip;
-  dlib::extract_image_chip(picture,
-                           dlib::chip_details(dlib::centered_drect(crop.centre, crop.side, crop.side),
-                                              dlib::chip_dims(kCropSide, kCropSide), crop.angle),
-                           chip);
-  const auto filter = [](auto pixel) {
-    return pixel(-2) + 4 * pixel(-1) + 6 * pixel(0) + 4 * pixel(1) + pixel(2);
-  };
-  Patch across = {};
-  Patch smoothed = {};
-  for (int y = 0; y < kCropSide; ++y) {
-    for (int x = 2; x < kCropSide - 2; ++x) {
-      across[y][x] = filter([&](int d) { return static_cast<uint32_t>(chip[y][x + d]); });
-    }
-  }
-  for (int y = 2; y < kCropSide - 2; ++y) {
-    for (int x = 2; x < kCropSide - 2; ++x) {
-      smoothed[y][x] = filter([&](int d) { return across[y + d][x]; });
-    }
-  }
-  return smoothed;
+  return version == KY_VERIFY_VERSION       ? kPatternLength
+         : version == KY_DESCRIPTOR_VERSION ? kDescriptorLength
+                                            : 0;
 }
 
-/// Which of the eight neighbours on the circle of radius 2 are at least as bright as the pixel.
-unsigned PatternAt(const Patch& p, int y, int x) {
-  // A diagonal neighbour lies sqrt(2) away in both directions, 106 / 256 of the way from the first pixel to
-  // the second; in 65536ths.
-  const auto diagonal = [&](int dy, int dx) {
-    constexpr uint32_t kFar = 106;
-    constexpr uint32_t kNear = 256 - kFar;
-    return kNear * (kNear * p[y + dy][x + dx] + kFar * p[y + dy][x + 2 * dx]) +
-           kFar * (kNear * p[y + 2 * dy][x + dx] + kFar * p[y + 2 * dy][x + 2 * dx]);
-  };
-  constexpr uint32_t kOne = 256 * 256;
-  const std::array<uint32_t, 8> circle = {kOne * p[y][x + 2], diagonal(-1, 1),    kOne * p[y - 2][x],
-                                          diagonal(-1, -1),   kOne * p[y][x - 2], diagonal(1, -1),
-                                          kOne * p[y + 2][x], diagonal(1, 1)};
-  unsigned pattern = 0;
-  for (size_t i = 0; i < circle.size(); ++i) {
-    pattern |= static_cast<unsigned>(circle[i] >= kOne * p[y][x]) << i;
-  }
-  return pattern;
+void Append(std::vector<uint8_t>& bytes, const void* value, size_t size) {
+  const auto* const first = static_cast<const uint8_t*>(value);
+  bytes.insert(bytes.end(), first, first + size);
 }
 
-/// How much of a pixel in column (or row) `at` belongs to the cells before and after it, in 20ths. A pixel
-/// counts for the cells whose centres it lies between, so that a small shift changes little.
-struct Share {
-  int cell;  ///< the cell before, -1 at the border
-  int here;
-  int next;
-};
-Share ShareOf(int at) {
-  constexpr int kParts = 2 * kCellSide;
-  const int offset = 2 * at + 1 - kCellSide + kParts;  // from the centre of cell -1, in halves of a pixel
-  return {offset / kParts - 1, kParts - offset % kParts, offset % kParts};
+uint32_t ChecksumOf(const std::vector<uint8_t>& bytes) {
+  return Checksum(std::span(bytes).first(bytes.size() - kChecksum));
 }
 
-uint32_t Checksum(const Feature& feature) {
-  dlib::crc32 crc;
-  for (size_t i = 0; i < kChecksumAt; ++i) {
-    crc.add(feature[i]);
-  }
-  return static_cast<uint32_t>(crc.get_checksum());
+Numbers NumbersOf(const Feature& feature) {
+  Numbers numbers;
+  std::memcpy(numbers.data(), &feature.bytes()[kNumbersAt], sizeof(numbers));
+  return numbers;
 }
 
-/// The checksum as a feature holds it, the lowest byte first.
-std::array<uint8_t, 4> ChecksumBytes(const Feature& feature) {
-  const uint32_t sum = Checksum(feature);
-  return {static_cast<uint8_t>(sum), static_cast<uint8_t>(sum >> 8), static_cast<uint8_t>(sum >> 16),
-          static_cast<uint8_t>(sum >> 24)};
+std::span<const uint8_t, kPatternBytes> HistogramsOf(const Feature& feature) {
+  return std::span(feature.bytes()).subspan<kMark, kPatternBytes>();
 }
 
 constexpr std::string_view kDigits = "ABCDEFGHIJKLMNOPQRSTUVWXYZabcdefghijklmnopqrstuvwxyz0123456789+/";
@@ -135,72 +74,77 @@ constexpr std::array<int16_t, 256> kValueOf = [] {
 
 }  // namespace
 
-Feature ExtractFeature(const GrayImage& picture, const FaceCrop& crop) {
-  const Patch patch = Smoothed(picture, crop);
-  std::vector<int> histograms(kHistograms, 0);
-  const auto add = [&histograms](int row, int column, int bin, int weight) {
-    if (row >= 0 && row < kCells && column >= 0 && column < kCells) {
-      const int index = (row * kCells + column) * kBins + bin;
-      histograms[static_cast<size_t>(index)] += weight;
-    }
-  };
-  for (int y = 0; y < kSide; ++y) {
-    const Share row = ShareOf(y);
-    for (int x = 0; x < kSide; ++x) {
-      const Share column = ShareOf(x);
-      const int bin = kBinOf[PatternAt(patch, y + kBorder, x + kBorder)];
-      add(row.cell, column.cell, bin, row.here * column.here);
-      add(row.cell, column.cell + 1, bin, row.here * column.next);
-      add(row.cell + 1, column.cell, bin, row.next * column.here);
-      add(row.cell + 1, column.cell + 1, bin, row.next * column.next);
-    }
-  }
+Feature::Feature(const Patterns& patterns) : bytes_({'K', 'Y', KY_VERIFY_VERSION}) {
+  bytes_.reserve(kPatternLength);
+  bytes_.insert(bytes_.end(), patterns.begin(), patterns.end());
+  Seal();
+}
 
-  // The square roots of the shares that the bins have of their cell, in 255ths: their products measure how
-  // much two histograms overlap.
-  Feature feature = {};
-  std::copy(kMark.begin(), kMark.end(), feature.begin());
-  for (int cell = 0; cell < kCells * kCells; ++cell) {
-    const auto first = histograms.begin() + static_cast<ptrdiff_t>(cell) * kBins;
-    double total = 0;
-    std::for_each(first, first + kBins, [&total](int count) { total += count; });
-    std::transform(
-        first, first + kBins, feature.begin() + kMark.size() + static_cast<ptrdiff_t>(cell) * kBins,
-        [total](int count) { return static_cast<uint8_t>(std::lround(255 * std::sqrt(count / total))); });
+Feature::Feature(std::span<const float, KY_DESCRIPTOR_NUMBERS> numbers, uint32_t tag)
+    : bytes_({'K', 'Y', KY_DESCRIPTOR_VERSION}) {
+  constexpr uint16_t kCount = KY_DESCRIPTOR_NUMBERS;
+  bytes_.reserve(kDescriptorLength);
+  Append(bytes_, &tag, sizeof(tag));
+  Append(bytes_, &kCount, sizeof(kCount));
+  Append(bytes_, numbers.data(), numbers.size_bytes());
+  Seal();
+}
+
+void Feature::Seal() {
+  const uint32_t checksum = Checksum(bytes_);
+  Append(bytes_, &checksum, sizeof(checksum));
+}
+
+std::optional<Feature> Feature::Of(std::vector<uint8_t> bytes) {
+  if (bytes.size() < kMark || bytes.size() != LengthOf(bytes[0], bytes[1], bytes[2])) {
+    return std::nullopt;
   }
-  const auto checksum = ChecksumBytes(feature);
-  std::copy(checksum.begin(), checksum.end(), feature.begin() + kChecksumAt);
+  uint32_t checksum = 0;
+  std::memcpy(&checksum, &bytes[bytes.size() - kChecksum], kChecksum);
+  if (checksum != ChecksumOf(bytes)) {
+    return std::nullopt;
+  }
+  Feature feature(std::move(bytes));
+  if (feature.version() == KY_DESCRIPTOR_VERSION) {
+    uint16_t count = 0;
+    std::memcpy(&count, &feature.bytes_[kCountAt], sizeof(count));
+    const Numbers numbers = NumbersOf(feature);
+    if (count != numbers.size() ||
+        !std::all_of(numbers.begin(), numbers.end(), [](float x) { return std::isfinite(x); })) {
+      return std::nullopt;
+    }
+  }
   return feature;
 }
 
+uint32_t Feature::tag() const {
+  uint32_t tag = 0;
+  if (version() == KY_DESCRIPTOR_VERSION) {
+    std::memcpy(&tag, &bytes_[kTagAt], sizeof(tag));
+  }
+  return tag;
+}
+
 float Similarity(const Feature& a, const Feature& b) {
-  int64_t ab = 0;
-  int64_t aa = 0;
-  int64_t bb = 0;
-  for (size_t i = kMark.size(); i < kChecksumAt; ++i) {
-    ab += int64_t{a[i]} * b[i];
-    aa += int64_t{a[i]} * a[i];
-    bb += int64_t{b[i]} * b[i];
+  if (a.version() == KY_VERIFY_VERSION) {
+    return Similarity(HistogramsOf(a), HistogramsOf(b));
   }
-  if (aa == 0 || bb == 0) {
-    return 0;
+  const Numbers x = NumbersOf(a);
+  const Numbers y = NumbersOf(b);
+  double square = 0;
+  for (size_t i = 0; i < x.size(); ++i) {
+    const double difference = static_cast<double>(x[i]) - static_cast<double>(y[i]);
+    square += difference * difference;
   }
-  // Unrelated pictures agree by 0.48 on average and rarely by more than 0.6, the same face in another frame
-  // by 0.7 and more.
-  constexpr double kUnrelated = 0.4;
-  constexpr double kBorderline = 0.66;
-  const double agreement =
-      static_cast<double>(ab) / std::sqrt(static_cast<double>(aa) * static_cast<double>(bb));
-  const double similarity = agreement < kBorderline
-                                ? 0.5 * (agreement - kUnrelated) / (kBorderline - kUnrelated)
-                                : 0.5 + 0.5 * (agreement - kBorderline) / (1 - kBorderline);
-  return static_cast<float>(std::clamp(similarity, 0.0, 1.0));
+  const double similarity = 1 - std::sqrt(square) / (2 * KY_DESCRIPTOR_THRESHOLD_DISTANCE);
+  return static_cast<float>(std::max(similarity, 0.0));
 }
 
 void WriteText(const Feature& feature, char* text) {
-  for (size_t i = 0; i < feature.size(); i += 3) {
-    const unsigned bits = static_cast<unsigned>(feature[i]) << 16 |
-                          static_cast<unsigned>(feature[i + 1]) << 8 | static_cast<unsigned>(feature[i + 2]);
+  const std::vector<uint8_t>& bytes = feature.bytes();
+  for (size_t i = 0; i < bytes.size(); i += 3) {
+    const unsigned bits = static_cast<unsigned>(bytes[i]) << 16 | static_cast<unsigned>(bytes[i + 1]) << 8 |
+                          static_cast<unsigned>(bytes[i + 2]);
     for (int shift = 18; shift >= 0; shift -= 6) {
       *text++ = kDigits[bits >> shift & 63];
     }
@@ -209,8 +153,10 @@ void WriteText(const Feature& feature, char* text) {
 }
 
 std::optional<Feature> ReadText(const char* text) {
-  Feature feature;
-  for (size_t i = 0; i < feature.size(); i += 3) {
+  std::vector<uint8_t> bytes;
+  // The first three bytes tell the length.
+  size_t length = kMark;
+  while (bytes.size() < length) {
     unsigned bits = 0;
     for (int digit = 0; digit < 4; ++digit) {
       const int value = kValueOf[static_cast<uint8_t>(*text++)];
@@ -219,16 +165,15 @@ std::optional<Feature> ReadText(const char* text) {
       }
       bits = bits << 6 | static_cast<unsigned>(value);
     }
-    feature[i] = static_cast<uint8_t>(bits >> 16);
-    feature[i + 1] = static_cast<uint8_t>(bits >> 8);
-    feature[i + 2] = static_cast<uint8_t>(bits);
+    for (const int shift : {16, 8, 0}) {
+      bytes.push_back(static_cast<uint8_t>(bits >> shift));
+    }
+    if (bytes.size() == kMark) {
+      length = LengthOf(bytes[0], bytes[1], bytes[2]);
+      bytes.reserve(length);
+    }
   }
-  const auto checksum = ChecksumBytes(feature);
-  if (*text != '\0' || !std::equal(kMark.begin(), kMark.end(), feature.begin()) ||
-      !std::equal(checksum.begin(), checksum.end(), feature.begin() + kChecksumAt)) {
-    return std::nullopt;
-  }
-  return feature;
+  return *text == '\0' ? Feature::Of(std::move(bytes)) : std::nullopt;
 }
 
 }  // namespace kyengine

@@ -113,6 +113,53 @@ void Frame::ToUprightGray(GrayImage& gray) const {
   }
 }
 
+void Frame::ToRgb(int left, int top, int width, int height, uint8_t* rgb) const {
+  const auto convert = [&](auto colours) {
+    for (int y = top; y < top + height; ++y) {
+      for (int x = left; x < left + width; ++x, rgb += 3) {
+        colours(x, y);
+      }
+    }
+  };
+  const auto bytes_per_pixel = static_cast<size_t>(BytesPerPixel(format_));
+  const auto pixel = [this, bytes_per_pixel](int x, int y) {
+    return image_ + static_cast<size_t>(y) * static_cast<size_t>(stride_) +
+           static_cast<size_t>(x) * bytes_per_pixel;
+  };
+  const auto copy = [&](int red, int green, int blue) {
+    convert([&](int x, int y) {
+      const unsigned char* const p = pixel(x, y);
+      rgb[0] = p[red];
+      rgb[1] = p[green];
+      rgb[2] = p[blue];
+    });
+  };
+  switch (format_) {
+    case KY_PIXEL_BGR:
+    case KY_PIXEL_BGRA:
+      return copy(2, 1, 0);
+    case KY_PIXEL_RGB:
+    case KY_PIXEL_RGBA:
+      return copy(0, 1, 2);
+    case KY_PIXEL_NV21:
+    case KY_PIXEL_NV12:
+      return convert([&](int x, int y) {
+        // The rows of chroma follow those of luma.
+        const unsigned char* const chroma = pixel(x / 2 * 2, height_ + y / 2);
+        const bool v_first = format_ == KY_PIXEL_NV21;
+        const int u = chroma[v_first ? 1 : 0] - 128;
+        const int v = chroma[v_first ? 0 : 1] - 128;
+        const int luma = 256 * *pixel(x, y) + 128;
+        const auto byte = [](int scaled) { return static_cast<uint8_t>(std::clamp(scaled >> 8, 0, 255)); };
+        rgb[0] = byte(luma + 359 * v);
+        rgb[1] = byte(luma - 88 * u - 183 * v);
+        rgb[2] = byte(luma + 454 * u);
+      });
+    default:
+      return copy(0, 0, 0);
+  }
+}
+
 ky_pointf_t Frame::ToFrame(const dlib::dpoint& upright) const {
   const double last_x = width_ - 1;
   const double last_y = height_ - 1;

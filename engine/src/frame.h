@@ -8,6 +8,8 @@
 #include <dlib/array2d.h>
 #include <dlib/geometry.h>
 
+#include <cstdint>
+
 #include "c_interface.h"
 
 namespace kyengine {
@@ -24,6 +26,14 @@ class Frame {
   /// Writes the luma of the frame, turned upright, into `gray`. The 4:2:0 formats carry it; of colours it is
   /// 0.299 R + 0.587 G + 0.114 B.
   void ToUprightGray(GrayImage& gray) const;
+
+  /// Writes the colours of a rectangle of the frame as it was handed over, which lies within it, into `rgb`:
+  /// packed rows of red, green and blue. Gray has three equal colours; the 4:2:0 formats are full range, as
+  /// cameras and JFIF have them (R = Y + 1.402 V, G = Y - 0.344 U - 0.714 V, B = Y + 1.772 U).
+  void ToRgb(int left, int top, int width, int height, uint8_t* rgb) const;
+
+  int width() const { return width_; }
+  int height() const { return height_; }
 
   /// Size of the upright picture.
   int upright_width() const { return quarter_turned() ? height_ : width_; }

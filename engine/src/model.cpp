@@ -2,10 +2,13 @@
 
 #include <dlib/serialize.h>
 
+#include <array>
+#include <cstdint>
 #include <filesystem>
 #include <fstream>
 #include <map>
 #include <mutex>
+#include <span>
 #include <string>
 #include <system_error>
 #include <tuple>
@@ -96,7 +99,8 @@ bool Reads(Read read) {
 
 }  // namespace
 
-std::shared_ptr<const LandmarkModel> LoadLandmarks(const char* path, ky_result_t misfit) {
+std::shared_ptr<const LandmarkModel> LoadLandmarks(const char* path, ky_result_t misfit,
+                                                   std::streamoff start) {
   // A file that was replaced is another file.
   using File = std::tuple<std::string, uintmax_t, std::filesystem::file_time_type>;
   static std::mutex mutex;
@@ -114,6 +118,7 @@ std::shared_ptr<const LandmarkModel> LoadLandmarks(const char* path, ky_result_t
     }
   }
   std::shared_ptr<const LandmarkModel> model;
+  in.seekg(start);
   Require(Reads([&] { model = std::make_shared<const LandmarkModel>(in); }), misfit);
   loaded[file] = model;
   return model;
@@ -131,6 +136,34 @@ Model LoadModel(const char* path) {
             Exists(beside) ? LoadLandmarks(beside.c_str(), KY_ERROR_LANDMARK_MODEL) : nullptr};
   }
   return {BuiltInDetector(), LoadLandmarks(path, KY_ERROR_MODEL)};
+}
+
+VerifierModel LoadVerifierModel(const char* path) {
+  std::ifstream in = Open(path, KY_ERROR_MODEL_FILE);
+  std::array<uint8_t, DescriptorHeader::kSize> start = {};
+  in.read(reinterpret_cast<char*>(start.data()), start.size());
+  const auto head = std::span<const uint8_t>(start).first(static_cast<size_t>(in.gcount()));
+  if (!DescriptorHeader::Recognises(head)) {
+    return {LoadLandmarks(path, KY_ERROR_MODEL), nullptr};
+  }
+  const auto require = [](ky_result_t result) { Require(result == KY_SUCCESS, result); };
+  DescriptorHeader header;
+  require(DescriptorHeader::Read(head, FaceDescriptorShape(), &header));
+  std::error_code failure;
+  const uintmax_t size = std::filesystem::file_size(path, failure);
+  const uint64_t end = head.size() + header.length;
+  Require(!failure && size >= end && size - end == header.following, KY_ERROR_MODEL);
+
+  std::vector<uint8_t> bytes(header.length);
+  in.read(reinterpret_cast<char*>(bytes.data()), static_cast<std::streamsize>(bytes.size()));
+  Require(in.gcount() == static_cast<std::streamsize>(bytes.size()), KY_ERROR_MODEL);
+  auto descriptor = std::make_shared<Descriptor>();
+  require(Descriptor::Read(header, bytes, FaceDescriptorShape(), descriptor.get()));
+  std::shared_ptr<const LandmarkModel> landmarks;
+  if (header.following > 0) {
+    landmarks = LoadLandmarks(path, KY_ERROR_LANDMARK_MODEL, static_cast<std::streamoff>(end));
+  }
+  return {landmarks, descriptor};
 }
 
 }  // namespace kyengine

@@ -4,7 +4,10 @@
 #include "landmarks.h"
 #include "scanner.h"
 
+#include <ios>
 #include <memory>
+
+#include "descriptor.h"
 
 namespace kyengine {
 
@@ -17,7 +20,16 @@ struct Model {
 Model LoadModel(const char* path);
 
 /// Loads a landmark model; throws Failure, with the code `misfit` when the file holds something else. Handles
-/// created from one file share it: such models are large.
-std::shared_ptr<const LandmarkModel> LoadLandmarks(const char* path, ky_result_t misfit);
+/// created from one file share it: such models are large. The model starts at byte `start` of the file.
+std::shared_ptr<const LandmarkModel> LoadLandmarks(const char* path, ky_result_t misfit,
+                                                   std::streamoff start = 0);
+
+struct VerifierModel {
+  std::shared_ptr<const LandmarkModel> landmarks;  ///< null when there is none
+  std::shared_ptr<const Descriptor> descriptor;    ///< null when there is none
+};
+
+/// Loads what `path` names for a verifier, as `ky_engine.h` describes; throws Failure.
+VerifierModel LoadVerifierModel(const char* path);
 
 }  // namespace kyengine

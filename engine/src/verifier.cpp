@@ -1,10 +1,12 @@
 /// Verifiers: features of faces, and the C interface to them.
 #include <algorithm>
+#include <array>
 #include <cmath>
 #include <memory>
 #include <optional>
 #include <vector>
 
+#include "aligned_face.h"
 #include "feature.h"
 #include "handles.h"
 #include "model.h"
@@ -48,42 +50,69 @@ class Verifier {
  public:
   explicit Verifier(const char* model_path) {
     if (model_path != nullptr) {
-      landmarks_ = LoadLandmarks(model_path, KY_ERROR_MODEL);
+      model_ = LoadVerifierModel(model_path);
     }
+  }
+
+  int version() const { return model_.descriptor != nullptr ? KY_DESCRIPTOR_VERSION : KY_VERIFY_VERSION; }
+  int length() const { return model_.descriptor != nullptr ? KY_DESCRIPTOR_LENGTH : KY_FEATURE_LENGTH; }
+
+  /// Whether a feature is one of this verifier's, or of one like it.
+  bool Knows(const Feature& feature) const {
+    const uint32_t tag = model_.descriptor != nullptr ? model_.descriptor->fingerprint() : 0;
+    return feature.version() == version() && feature.tag() == tag;
   }
 
   Feature Extract(const Frame& frame, const ky_face_t& face) const {
     const dlib::drectangle box = BoxOf(face);
-    std::vector<dlib::dpoint> points = PointsOf(face);
     const dlib::drectangle view(0, 0, frame.upright_width() - 1.0, frame.upright_height() - 1.0);
+    const double longest = 2 * std::max(view.width(), view.height());
     Require(view.contains(dlib::center(box)), KY_ERROR_FACE);
-    Require(std::max(box.width(), box.height()) <= 2 * std::max(view.width(), view.height()), KY_ERROR_FACE);
-    GrayImage gray;
-    frame.ToUprightGray(gray);
+    Require(std::max(box.width(), box.height()) <= longest, KY_ERROR_FACE);
 
+    GrayImage gray;
     Eyes eyes;
-    bool aligned = FindEyes(points, &eyes);
-    if (!aligned && landmarks_ != nullptr) {
-      aligned = FindEyes(landmarks_->Locate(gray, box), &eyes);
+    bool aligned = FindEyes(PointsOf(face), &eyes);
+    if (!aligned && model_.landmarks != nullptr) {
+      frame.ToUprightGray(gray);
+      aligned = FindEyes(model_.landmarks->Locate(gray, box), &eyes);
     }
+    Require(aligned || model_.descriptor == nullptr, KY_ERROR_EYES);
     const FaceCrop crop =
         aligned ? CropByEyes(eyes) : FaceCrop{dlib::center(box), std::max(box.width(), box.height()), 0};
-    Require(crop.side >= KY_SMALLEST_VERIFIED_FACE && view.contains(crop.centre), KY_ERROR_FACE);
-    Require(crop.side <= 2 * std::max(view.width(), view.height()), KY_ERROR_FACE);
-    return ExtractFeature(gray, crop);
+    const double smallest = model_.descriptor != nullptr ? KY_SMALLEST_EYE_DISTANCE / kEyeDistance
+                                                         : double{KY_SMALLEST_VERIFIED_FACE};
+    Require(crop.side >= smallest && view.contains(crop.centre), KY_ERROR_FACE);
+    Require(crop.side <= longest, KY_ERROR_FACE);
+    if (model_.descriptor != nullptr) {
+      return Describe(frame, eyes);
+    }
+    if (gray.size() == 0) {
+      frame.ToUprightGray(gray);
+    }
+    return Feature(PatternsOf(gray, crop));
   }
 
  private:
-  std::shared_ptr<const LandmarkModel> landmarks_;
+  Feature Describe(const Frame& frame, const Eyes& eyes) const {
+    const std::vector<uint8_t> picture = AlignedFace(frame, eyes, FaceDescriptorShape().side);
+    std::array<float, KY_DESCRIPTOR_NUMBERS> numbers = {};
+    const ky_result_t result = model_.descriptor->Describe(picture.data(), numbers.data());
+    Require(result == KY_SUCCESS, result);
+    return {numbers, model_.descriptor->fingerprint()};
+  }
+
+  VerifierModel model_;
 };
 
 using Verifiers = Handles<Verifier>;
 using Features = Handles<Feature>;
 
 /// What a verifier says of itself, or KY_ERROR_HANDLE when `handle` names none.
-int Constant(ky_handle_t handle, int value) {
-  const int result = Guarded([&] { Verifiers::Find(handle); });
-  return result == KY_SUCCESS ? value : result;
+int Constant(ky_handle_t handle, int (Verifier::*value)() const) {
+  int answer = 0;
+  const int result = Guarded([&] { answer = (*Verifiers::Find(handle).*value)(); });
+  return result == KY_SUCCESS ? answer : result;
 }
 
 }  // namespace
@@ -102,9 +131,13 @@ int ky_verify_create_handle(ky_handle_t* handle, const char* model_path) {
 
 void ky_verify_destroy_handle(ky_handle_t handle) { Verifiers::Destroy(handle); }
 
-int ky_verify_get_version(ky_handle_t handle) { return kyengine::Constant(handle, KY_VERIFY_VERSION); }
+int ky_verify_get_version(ky_handle_t handle) {
+  return kyengine::Constant(handle, &kyengine::Verifier::version);
+}
 
-int ky_verify_get_feature_length(ky_handle_t handle) { return kyengine::Constant(handle, KY_FEATURE_LENGTH); }
+int ky_verify_get_feature_length(ky_handle_t handle) {
+  return kyengine::Constant(handle, &kyengine::Verifier::length);
+}
 
 int ky_verify_get_feature(ky_handle_t handle, const unsigned char* image, int pixel_format, int width,
                           int height, int stride, const ky_face_t* face, ky_feature_t* feature, int* length) {
@@ -116,7 +149,7 @@ int ky_verify_get_feature(ky_handle_t handle, const unsigned char* image, int pi
     Require(face != nullptr, KY_ERROR_NULL_POINTER);
     const Frame frame(image, pixel_format, width, height, stride, KY_ORIENTATION_0);
     *feature = Features::Add(std::make_shared<Feature>(verifier->Extract(frame, *face)));
-    *length = KY_FEATURE_LENGTH;
+    *length = verifier->length();
   });
 }
 
@@ -144,9 +177,10 @@ int ky_verify_compare_feature(ky_handle_t handle, ky_feature_t feature1, ky_feat
   return Guarded([&] {
     Require(score != nullptr, KY_ERROR_NULL_POINTER);
     *score = 0;
-    Verifiers::Find(handle);
+    const auto verifier = Verifiers::Find(handle);
     const auto a = Features::Find(feature1, KY_ERROR_FEATURE);
     const auto b = Features::Find(feature2, KY_ERROR_FEATURE);
+    Require(verifier->Knows(*a) && verifier->Knows(*b), KY_ERROR_FEATURE_KIND);
     *score = kyengine::Similarity(*a, *b);
   });
 }

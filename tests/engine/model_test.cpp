@@ -2,7 +2,6 @@
 #include "engine/src/dlib_config.h"
 // The configuration of dlib comes first.
 #include <dlib/image_processing/frontal_face_detector.h>
-#include <dlib/image_processing/shape_predictor.h>
 #include <dlib/serialize.h>
 
 #include <cmath>
@@ -13,6 +12,7 @@
 #include <string>
 
 #include "engine_calls.h"
+#include "landmark_model.h"
 
 namespace kyengine::test {
 namespace {
@@ -32,28 +32,6 @@ std::string Bytes(const dlib::frontal_face_detector& detector) {
 const std::string& BuiltIn() {
   static const std::string bytes = Bytes(dlib::get_frontal_face_detector());
   return bytes;
-}
-
-/// A landmark model that puts its points at the same places of every box, given from 0 to 1 in both
-/// directions.
-std::string Landmarks(const std::vector<ky_pointf_t>& points) {
-  dlib::matrix<float, 0, 1> shape(static_cast<long>(2 * points.size()));
-  for (size_t i = 0; i < points.size(); ++i) {
-    shape(static_cast<long>(2 * i)) = points[i].x;
-    shape(static_cast<long>(2 * i + 1)) = points[i].y;
-  }
-  std::ostringstream out;
-  serialize(dlib::shape_predictor(shape, {}, {}), out);
-  return out.str();
-}
-
-/// Points of a model of five: the eyes' centres at the given places.
-std::vector<ky_pointf_t> FivePoints(ky_pointf_t left, ky_pointf_t right) {
-  return {{right.x + 0.08F, right.y},
-          {right.x - 0.08F, right.y},
-          {left.x - 0.08F, left.y},
-          {left.x + 0.08F, left.y},
-          {0.5F, 0.6F}};
 }
 
 class ModelTest : public testing::Test {

@@ -91,27 +91,47 @@ typedef enum ky_config_t {
 #define KY_MIN_ALIGNMENT_THRESHOLD 0
 #define KY_MAX_ALIGNMENT_THRESHOLD 100
 
-/// A verifier describes what is seen in a face by uniform local binary patterns. Two features of one model
-/// compare to a similarity: 1 for the same picture, 0.5 at the border between the same face in another frame
-/// and something else, 0 for nothing in common. That tells a face that is followed from what it might be
-/// confused with; it is not meant to prove who somebody is.
+/// A verifier takes features of faces and compares two of them to a similarity from 0 to 1, of which
+/// KY_VERIFY_THRESHOLD is the border between the same and another. What it is depends on what its model path
+/// names, which is told by the file's content:
 ///
-/// The crop that is described goes by the eyes when the face record has the landmarks of a model of 68 or 5
-/// points, or when the verifier was created with such a model of its own (its model path names a
-/// `dlib::shape_predictor`; NULL is the built-in way without one); it is upright then. Otherwise it is the
-/// face's rectangle as the frame shows it, so that features compare between frames of one orientation.
+/// - NULL, or a landmark model (a `dlib::shape_predictor`): uniform local binary patterns, version
+///   KY_VERIFY_VERSION. Similarity is 1 for the same picture, 0.5 at the border between the same face in
+///   another frame and something else, 0 for nothing in common. That tells a face that is followed from what
+///   it might be confused with; it says next to nothing about who somebody is. The crop that is described
+///   goes by the eyes when the face record has the landmarks of a model of 68 or 5 points, or when the
+///   verifier has a landmark model; it is upright then. Otherwise it is the face's rectangle as the frame
+///   shows it, so that features compare between frames of one orientation.
+/// - a descriptor, or a descriptor and a landmark model in one file (`scripts/setup.sh models` makes both):
+/// 128
+///   numbers by dlib's residual network for faces, version KY_DESCRIPTOR_VERSION, in colour where the frame
+///   has it. Pictures of one person lie close together. The similarity of two at the distance d is 1 - d
+///   / 1.2, at least 0: 0.5 at the distance 0.6 that the network was trained to separate persons at. The face
+///   is aligned by its eyes, which come from the record's landmarks (68 or 5 points) or from the verifier's
+///   landmark model; one whose eyes are not known is refused with KY_ERROR_EYES. Who relies on it reads
+///   `docs/verification.md` first.
 ///
-/// A feature has KY_FEATURE_LENGTH bytes, and its text is as long as every text of a feature,
-/// KY_FEATURE_TEXT_LENGTH bytes with the terminating zero. A text that is not exactly one that was written is
-/// refused; no text is read beyond its zero or its full length. For no verifier at all, version and length
-/// are KY_ERROR_HANDLE.
+/// A feature has as many bytes, and its text as many with the terminating zero, as the constants of its
+/// version say. A text that is not exactly one that was written is refused; no text is read beyond its zero
+/// or its full length. Features compare with a verifier of their version, and descriptors with one of their
+/// model: anything else is KY_ERROR_FEATURE_KIND. For no verifier at all, version and length are
+/// KY_ERROR_HANDLE.
 #define KY_VERIFY_VERSION 1
 #define KY_FEATURE_LENGTH 3783
 #define KY_FEATURE_TEXT_LENGTH 5045
+#define KY_DESCRIPTOR_VERSION 2
+#define KY_DESCRIPTOR_NUMBERS 128
+#define KY_DESCRIPTOR_LENGTH 525
+#define KY_DESCRIPTOR_TEXT_LENGTH 701
+#define KY_DESCRIPTOR_THRESHOLD_DISTANCE 0.6
+#define KY_VERIFY_THRESHOLD 0.5f
 
-/// Smallest face that a feature is taken of: the longer side of its rectangle, or twice the distance of its
+/// Smallest face that patterns are taken of: the longer side of its rectangle, or twice the distance of its
 /// eyes, in pixels.
 #define KY_SMALLEST_VERIFIED_FACE 16
+
+/// Smallest distance of the eyes that a descriptor is taken at, in pixels.
+#define KY_SMALLEST_EYE_DISTANCE 12
 
 /// Result codes: one for each kind of failure. A function that fails writes nothing but null pointers,
 /// zero counts and zero scores.
@@ -131,7 +151,9 @@ typedef enum ky_result_t {
   KY_ERROR_FACE = -12,            ///< the face record cannot belong to the frame, or the face is too small
   KY_ERROR_FEATURE = -13,         ///< the feature is null, released, or no feature
   KY_ERROR_MEMORY = -14,          ///< not enough memory
-  KY_ERROR_INTERNAL = -15         ///< anything else
+  KY_ERROR_INTERNAL = -15,        ///< anything else
+  KY_ERROR_EYES = -16,            ///< nothing tells where the face's eyes are
+  KY_ERROR_FEATURE_KIND = -17     ///< the feature is another verifier's
 } ky_result_t;
 
 // Detectors and trackers take as their model path
