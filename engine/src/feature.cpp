@@ -136,7 +136,7 @@ float Similarity(const Feature& a, const Feature& b) {
     const double difference = static_cast<double>(x[i]) - static_cast<double>(y[i]);
     square += difference * difference;
   }
-  const double similarity = 1 - std::sqrt(square) / (2 * KY_DESCRIPTOR_THRESHOLD_DISTANCE);
+  const double similarity = 1 - std::sqrt(square) / (2 * double{KY_DESCRIPTOR_THRESHOLD_DISTANCE});
   return static_cast<float>(std::max(similarity, 0.0));
 }
 

@@ -123,7 +123,7 @@ typedef enum ky_config_t {
 #define KY_DESCRIPTOR_NUMBERS 128
 #define KY_DESCRIPTOR_LENGTH 525
 #define KY_DESCRIPTOR_TEXT_LENGTH 701
-#define KY_DESCRIPTOR_THRESHOLD_DISTANCE 0.6
+#define KY_DESCRIPTOR_THRESHOLD_DISTANCE 0.6f
 #define KY_VERIFY_THRESHOLD 0.5f
 
 /// Smallest face that patterns are taken of: the longer side of its rectangle, or twice the distance of its

@@ -51,6 +51,8 @@ public final class EngineProfile {
             .code(EngineValues.ERROR_FEATURE, "ERROR_FEATURE")
             .code(EngineValues.ERROR_MEMORY, "ERROR_MEMORY")
             .code(EngineValues.ERROR_INTERNAL, "ERROR_INTERNAL")
+            .code(EngineValues.ERROR_EYES, "ERROR_EYES")
+            .code(EngineValues.ERROR_FEATURE_KIND, "ERROR_FEATURE_KIND")
             .build();
 
     /** By ordinal and by quarter turn; null where the engine has no number. */

@@ -83,14 +83,28 @@ public final class EngineValues {
     /** The highest alignment threshold. */
     public static final int MAX_ALIGNMENT_THRESHOLD = 100;
 
-    /** The version of the verifier's model. */
+    /** The version of a verifier by local binary patterns: one without a model, or with landmarks alone. */
     public static final int VERIFY_VERSION = 1;
-    /** Bytes of a feature. */
+    /** Bytes of its features. */
     public static final int FEATURE_LENGTH = 3783;
-    /** Bytes of a serialized feature, with the terminating zero. */
+    /** Bytes of its serialized features, with the terminating zero. */
     public static final int FEATURE_TEXT_LENGTH = 5045;
-    /** The smallest face that a feature is taken of, in pixels: its longer side, or twice the distance of its eyes. */
+    /** The version of a verifier with a descriptor's model. */
+    public static final int DESCRIPTOR_VERSION = 2;
+    /** The numbers of a descriptor. */
+    public static final int DESCRIPTOR_NUMBERS = 128;
+    /** Bytes of its features. */
+    public static final int DESCRIPTOR_LENGTH = 525;
+    /** Bytes of its serialized features, with the terminating zero. */
+    public static final int DESCRIPTOR_TEXT_LENGTH = 701;
+    /** The distance between two descriptors whose similarity is {@link #VERIFY_THRESHOLD}. */
+    public static final float DESCRIPTOR_THRESHOLD_DISTANCE = 0.6f;
+    /** The recommended threshold: more alike are taken for the same, less alike for others. */
+    public static final float VERIFY_THRESHOLD = 0.5f;
+    /** The smallest face that patterns are taken of, in pixels: its longer side, or twice the distance of its eyes. */
     public static final int SMALLEST_VERIFIED_FACE = 16;
+    /** The smallest distance of the eyes that a descriptor is taken at, in pixels. */
+    public static final int SMALLEST_EYE_DISTANCE = 12;
 
     /** What follows the name of a model file in the name of the landmark model beside it. */
     public static final String LANDMARKS_SUFFIX = ".landmarks";
@@ -127,6 +141,10 @@ public final class EngineValues {
     public static final int ERROR_MEMORY = -14;
     /** Anything else. */
     public static final int ERROR_INTERNAL = -15;
+    /** Nothing tells where the face's eyes are. */
+    public static final int ERROR_EYES = -16;
+    /** The feature is another verifier's. */
+    public static final int ERROR_FEATURE_KIND = -17;
 
     private EngineValues() {}
 }
