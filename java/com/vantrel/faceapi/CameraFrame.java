@@ -200,8 +200,8 @@ public final class CameraFrame {
      * Fills this frame from the planes of a YUV_420_888 image, as Camera2 and CameraX deliver them.
      *
      * <p>A plane begins at its buffer's position. The last row may end with its last sample, however long the row
-     * stride is. Positions are not moved. Planes in direct buffers, as cameras give them, are read where they are; those
-     * in arrays too, unless the buffer is read-only: such a plane is copied first.
+     * stride is. Positions are not moved. Planes in direct buffers, as cameras give them, are read where they are;
+     * those in arrays too, unless the buffer is read-only: such a plane is copied first.
      *
      * @param newWidth width in pixels, even
      * @param newHeight height in pixels, even

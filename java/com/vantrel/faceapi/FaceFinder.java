@@ -71,10 +71,15 @@ abstract class FaceFinder implements AutoCloseable {
         BitmapBytes.checkPixels("bitmap", bitmap);
         int formatValue = profile.formatValue(PixelFormat.RGBA);
         int orientation = profile.orientationValue(rotationDegrees);
+        int width = bitmap.getWidth();
+        int height = bitmap.getHeight();
+        int stride = bitmap.getRowBytes();
         synchronized (handle) {
             long engineHandle = handle.value();
-            return listOf(findInBytes(engineHandle, bitmapBytes.read(bitmap), formatValue, bitmap.getWidth(),
-                    bitmap.getHeight(), bitmap.getRowBytes(), orientation));
+            byte[] pixels = bitmapBytes.read(bitmap);
+            // Another thread may have given the bitmap another size since.
+            Check.image(PixelFormat.RGBA, width, height, stride, pixels.length, 1);
+            return listOf(findInBytes(engineHandle, pixels, formatValue, width, height, stride, orientation));
         }
     }
 

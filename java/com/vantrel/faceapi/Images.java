@@ -69,8 +69,8 @@ public final class Images {
     /**
      * Converts an image.
      *
-     * <p>The colours of a 4:2:0 image are those of full-range YUV with a matrix of this library's own, near to BT.601's.
-     * With Y from 0 to 255 and U and V less 128:
+     * <p>The colours of a 4:2:0 image are those of full-range YUV with a matrix of this library's own, near to
+     * BT.601's. With Y from 0 to 255 and U and V less 128:
      *
      * <pre>
      * R = (64 Y        + 86 V + 32) &gt;&gt; 6            Y = (38 R + 74 G + 16 B + 64) &gt;&gt; 7
@@ -78,8 +78,8 @@ public final class Images {
      * B = (64 Y + 110 U       + 32) &gt;&gt; 6            V = (67 R - 55 G - 12 B + 64) &gt;&gt; 7
      * </pre>
      *
-     * <p>clamped to 0 to 255. Towards pixels each pair of U and V serves 2 x 2 pixels as it is; towards frames it is that
-     * of their upper left pixel.
+     * <p>clamped to 0 to 255. Towards pixels each pair of U and V serves 2 x 2 pixels as it is; towards frames it is
+     * that of their upper left pixel.
      *
      * @param src the source, of exactly the size that its layout takes
      * @param width width in pixels

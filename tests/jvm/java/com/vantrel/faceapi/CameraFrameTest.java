@@ -186,7 +186,8 @@ public final class CameraFrameTest {
     @Test
     public void sizesAreCheckedBeforeAnythingIsMade() {
         ByteBuffer few = ByteBuffer.allocate(16);
-        refused("y must", () -> CameraFrame.fromPlanes(37836, 37836, few, 37836, few, 18918, 1, few, 18918, 1, 0, null));
+        refused("y must", () ->
+                CameraFrame.fromPlanes(37836, 37836, few, 37836, few, 18918, 1, few, 18918, 1, 0, null));
         int most = Integer.MAX_VALUE - 1;
         refused("width x height", () ->
                 CameraFrame.fromPlanes(most, most, few, most, few, most / 2, 1, few, most / 2, 1, 0, null));

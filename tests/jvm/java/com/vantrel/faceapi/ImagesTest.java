@@ -282,7 +282,8 @@ public final class ImagesTest {
             Arrays.fill(pixels, (byte) value);
             int want = Images.lightness(pixels, PixelFormat.RGBA, width, height, width * 4, 0, 0, 1, 1);
             assertEquals(value == 255 ? 255 : 137, want);
-            assertEquals(want, Images.lightness(pixels, PixelFormat.RGBA, width, height, width * 4, 0, 0, width, height));
+            assertEquals(want,
+                    Images.lightness(pixels, PixelFormat.RGBA, width, height, width * 4, 0, 0, width, height));
             int all = width * height;
             assertEquals(want, Images.lightness(pixels, PixelFormat.BGRA, all, 1, all * 4, 0, 0, all, 1));
         }
