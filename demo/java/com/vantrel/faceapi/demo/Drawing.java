@@ -1,5 +1,6 @@
 package com.vantrel.faceapi.demo;
 
+import android.graphics.Bitmap;
 import android.graphics.PointF;
 import com.vantrel.faceapi.model.FaceInfo;
 import java.awt.BasicStroke;
@@ -26,6 +27,17 @@ final class Drawing {
             }
             image.setRGB(0, y, width, 1, row, 0, width);
         }
+        return image;
+    }
+
+    /** A picture of a bitmap; alpha is taken as opaque. */
+    static BufferedImage fromBitmap(Bitmap bitmap) {
+        int width = bitmap.getWidth();
+        int height = bitmap.getHeight();
+        int[] colors = new int[width * height];
+        bitmap.getPixels(colors, 0, width, 0, 0, width, height);
+        BufferedImage image = new BufferedImage(width, height, BufferedImage.TYPE_INT_RGB);
+        image.setRGB(0, 0, width, height, colors, 0, width);
         return image;
     }
 

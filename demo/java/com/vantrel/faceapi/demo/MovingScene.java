@@ -1,19 +1,28 @@
 package com.vantrel.faceapi.demo;
 
+import android.graphics.Bitmap;
+import android.graphics.PointF;
 import android.graphics.Rect;
-import com.vantrel.faceapi.ColorConversion;
-import com.vantrel.faceapi.EngineValues;
+import com.vantrel.faceapi.CameraFrame;
+import com.vantrel.faceapi.FaceEngineException;
 import com.vantrel.faceapi.FaceLibrary;
+import com.vantrel.faceapi.FaceTracker;
+import com.vantrel.faceapi.FaceVerifier;
+import com.vantrel.faceapi.FrameTransform;
+import com.vantrel.faceapi.Images;
+import com.vantrel.faceapi.YuvPlanes;
 import com.vantrel.faceapi.model.FaceInfo;
 import java.awt.image.BufferedImage;
 import java.io.File;
 import java.io.IOException;
+import java.util.List;
 import java.util.Set;
 import java.util.TreeSet;
 
 /**
- * A camera that pans, zooms and rolls over a picture: its frames are tracked one by one, and the features of the tracked
- * face are compared.
+ * A phone's front camera that pans, zooms and rolls over a picture. Its frames, which lie on their side, are tracked one
+ * by one and shown as a phone shows them, upright and mirrored, with the faces where they are then; and the features of
+ * the tracked face are compared.
  */
 final class MovingScene {
     private static final int FRAMES = 30;
@@ -29,12 +38,15 @@ final class MovingScene {
     private final Stopwatch time = new Stopwatch();
     private final ContactSheet sheet;
 
-    /** What the features are taken from: two frames, and the tracked face in each. */
-    private byte[] firstFrame;
+    /** What the features are taken from: two frames, upright, and the tracked face in each. */
+    private CameraFrame firstFrame;
     private FaceInfo firstFace;
-    private byte[] otherFrame;
+    private CameraFrame otherFrame;
     private FaceInfo otherFace;
     private int otherNumber;
+
+    private final CameraFrame frame = new CameraFrame();
+    private Bitmap shown;
 
     private int visible;
     private int tracked;
@@ -70,87 +82,81 @@ final class MovingScene {
     /** Runs the scene, prints what came of it, and writes the contact sheet. Returns false when the engine fails. */
     boolean run(File output) throws IOException {
         FaceLibrary.setDebug(false);
-        long tracker = FaceLibrary.kyFaceCreateTracker(null, 0, EngineValues.CONFIG_DEFAULT);
-        if (tracker == 0) {
-            return false;
-        }
         try {
-            if (FaceLibrary.kyFaceTrackSetDetectInterval(tracker, DETECT_INTERVAL) != EngineValues.SUCCESS) {
-                return false;
-            }
-            for (int number = 0; number < FRAMES; number++) {
-                if (!track(tracker, number)) {
-                    return false;
+            PhoneCamera camera = new PhoneCamera(width, height);
+            try (FaceTracker tracker = new FaceTracker()) {
+                tracker.setDetectInterval(DETECT_INTERVAL);
+                for (int number = 0; number < FRAMES; number++) {
+                    track(camera, tracker, number);
                 }
             }
-        } finally {
-            FaceLibrary.kyFaceDestroyTracker(tracker);
+            sheet.write(output);
+            System.out.printf("moving scene: %d frames, the face is in view in %d and tracked in %d, as %s %s%n", FRAMES,
+                    visible, tracked, identities.size() == 1 ? "identity" : "identities",
+                    identities.toString().replaceAll("[\\[\\]]", ""));
+            System.out.printf("frames of %d x %d, turned by %d and mirrored to be shown as %d x %d, drawn in %s%n%n",
+                    camera.width, camera.height, PhoneCamera.ROTATION, width, height, output);
+            time.printPerFrame(FRAMES);
+            System.out.println();
+            if (tracked > 0) {
+                compareFeatures();
+            }
+            return true;
+        } catch (FaceEngineException failed) {
+            System.err.println(failed.getMessage());
+            return false;
         }
-        sheet.write(output);
-        System.out.printf("moving scene: %d frames, the face is in view in %d and tracked in %d, as %s %s%n", FRAMES,
-                visible, tracked, identities.size() == 1 ? "identity" : "identities",
-                identities.toString().replaceAll("[\\[\\]]", ""));
-        System.out.println("drawn in " + output);
-        System.out.println();
-        time.printPerFrame(FRAMES);
-        System.out.println();
-        return tracked == 0 || compareFeatures();
     }
 
-    private boolean track(long tracker, int number) {
+    private void track(PhoneCamera camera, FaceTracker tracker, int number) {
         View view = view(number);
         time.skip();
         byte[] rgba = view.render(picture);
         time.stage("render the scene");
-        byte[] nv21 = new byte[width * height * 3 / 2];
-        FaceLibrary.convertColorSpace(rgba, width, height, nv21, ColorConversion.RGBA_TO_NV21);
-        time.stage("RGBA to NV21");
-        int[] status = {Integer.MIN_VALUE};
-        FaceInfo[] faces = FaceLibrary.kyFaceTrackBytes(
-                tracker, nv21, EngineValues.PIXEL_NV21, width, height, width, EngineValues.ORIENTATION_0, status);
-        time.stage("track on NV21");
-        if (status[0] != EngineValues.SUCCESS) {
-            return false;
-        }
-        byte[] shown = new byte[width * height * 4];
-        FaceLibrary.convertColorSpace(nv21, width, height, shown, ColorConversion.NV21_TO_RGBA);
-        time.stage("NV21 to RGBA");
+        YuvPlanes planes = camera.deliver(rgba);
+        time.stage("deliver the planes");
+        frame.fill(planes, PhoneCamera.ROTATION);
+        time.stage("planes to frame");
+        List<FaceInfo> faces = tracker.track(frame);
+        time.stage("track on the frame");
+        FrameTransform transform =
+                FrameTransform.of(camera.width, camera.height, PhoneCamera.ROTATION).mirrored(true);
+        shown = Images.toBitmap(planes, transform, shown);
+        time.stage("planes to upright bitmap");
 
-        BufferedImage image = Drawing.fromRgba(shown, width, height);
-        if (faces != null) {
-            Drawing.faces(image, faces);
-            for (FaceInfo face : faces) {
-                Drawing.identity(image, face);
-            }
+        BufferedImage image = Drawing.fromBitmap(shown);
+        List<FaceInfo> shownFaces = transform.map(faces);
+        Drawing.faces(image, shownFaces.toArray(new FaceInfo[0]));
+        for (FaceInfo face : shownFaces) {
+            Drawing.identity(image, face);
         }
         sheet.add(image);
         time.stage("draw");
-        remember(view, nv21, faces, number);
-        return true;
+        remember(view, transform, shownFaces, number);
     }
 
-    /** Notes the face that this scene follows, if it is in view: the one whose rectangle holds its middle. */
-    private void remember(View view, byte[] nv21, FaceInfo[] faces, int number) {
-        double x = view.frameX(faceX, faceY);
+    /** Notes the face that this scene follows, if it is in view: the one that is drawn over its middle. */
+    private void remember(View view, FrameTransform transform, List<FaceInfo> shownFaces, int number) {
+        // Seen in a mirror.
+        double x = width - view.frameX(faceX, faceY);
         double y = view.frameY(faceX, faceY);
         if (x < 0 || x >= width || y < 0 || y >= height) {
             return;
         }
         visible++;
-        if (faces == null) {
-            return;
-        }
-        for (FaceInfo face : faces) {
+        for (FaceInfo face : shownFaces) {
             Rect r = face.faceRect;
             if (r.left <= x && x < r.right && r.top <= y && y < r.bottom) {
                 tracked++;
                 identities.add(face.id);
+                // The verifier wants faces upright, and as they are: not mirrored.
+                FaceInfo upright = transform.mirrored(false).map(transform.unmap(face, null), null);
                 if (firstFace == null) {
-                    firstFrame = nv21;
-                    firstFace = face;
+                    firstFrame = frame.upright(null);
+                    firstFace = upright;
                 } else if (number <= FRAMES / 2) {
-                    otherFrame = nv21;
-                    otherFace = face;
+                    otherFrame = frame.upright(otherFrame);
+                    otherFace = upright;
                     otherNumber = number + 1;
                 }
             }
@@ -158,42 +164,19 @@ final class MovingScene {
     }
 
     /** The face's feature against itself, the same face half a scene later, and a patch that is no face. */
-    private boolean compareFeatures() {
-        long verifier = FaceLibrary.kyFaceCreateVerify(null);
-        if (verifier == 0) {
-            return false;
-        }
-        try {
-            byte[] first = feature(verifier, firstFrame, firstFace);
-            byte[] patch = feature(verifier, firstFrame, patchBeside(firstFace));
-            byte[] other = otherFace == null ? first : feature(verifier, otherFrame, otherFace);
-            if (first == null || patch == null || other == null) {
-                return false;
-            }
-            float[] scores = new float[3];
-            byte[][] features = {first, other, patch};
-            for (int i = 0; i < 3; i++) {
-                int[] status = {Integer.MIN_VALUE};
-                scores[i] = FaceLibrary.kyFaceCompareFeature(verifier, first, features[i], status);
-                if (status[0] != EngineValues.SUCCESS) {
-                    return false;
-                }
-            }
+    private void compareFeatures() {
+        try (FaceVerifier verifier = new FaceVerifier()) {
+            byte[] first = verifier.extract(firstFrame, firstFace);
+            byte[] patch = verifier.extract(firstFrame, patchBeside(firstFace));
+            byte[] other = otherFace == null ? first : verifier.extract(otherFrame, otherFace);
+            float same = verifier.compare(first, other);
+            float none = verifier.compare(first, patch);
             System.out.printf("%-44s %10s%n", "the face compared with", "similarity");
-            System.out.printf("%-44s %10.3f%n", "itself", scores[0]);
-            System.out.printf("%-44s %10.3f%n", "the same face in frame " + otherNumber, scores[1]);
-            System.out.printf("%-44s %10.3f%n", "a patch that is no face", scores[2]);
-            System.out.printf("%-44s %10.3f%n", "margin between the last two", scores[1] - scores[2]);
-            return true;
-        } finally {
-            FaceLibrary.kyFaceDestroyVerify(verifier);
+            System.out.printf("%-44s %10.3f%n", "itself", verifier.compare(first, first));
+            System.out.printf("%-44s %10.3f%n", "the same face in frame " + otherNumber, same);
+            System.out.printf("%-44s %10.3f%n", "a patch that is no face", none);
+            System.out.printf("%-44s %10.3f%n", "margin between the last two", same - none);
         }
-    }
-
-    private byte[] feature(long verifier, byte[] nv21, FaceInfo face) {
-        int[] status = {Integer.MIN_VALUE};
-        return FaceLibrary.kyFaceGetFeatureBytes(
-                verifier, nv21, EngineValues.PIXEL_NV21, width, height, width, face, status);
     }
 
     /** A square as large as the face, centred in the quarter of the frame opposite to it. */
@@ -204,7 +187,7 @@ final class MovingScene {
         int y = r.top + r.bottom < height ? height * 3 / 4 : height / 4;
         FaceInfo patch = new FaceInfo();
         patch.faceRect = new Rect(x - side / 2, y - side / 2, x - side / 2 + side, y - side / 2 + side);
-        patch.facePoints = new android.graphics.PointF[0];
+        patch.facePoints = new PointF[0];
         return patch;
     }
 }

@@ -60,6 +60,8 @@ public class DemoTest {
         assertEquals("the box is drawn", 0xFF50FF78, drawn.getRGB(left, middle));
 
         find(child.output, "in view in 30 and tracked in 30, as identity \\d+\n");
+        // Counted where the faces are drawn: upright, and seen in a mirror.
+        find(child.output, "frames of 480 x 640, turned by 270 and mirrored to be shown as 640 x 480, ");
         float margin = Float.parseFloat(find(child.output, "margin[^\n]* (-?[\\d.]+)\n").group(1));
         assertTrue("margin " + margin, margin > 0);
         for (String file : new String[] {"track.png", "face.png", "turned.png"}) {
