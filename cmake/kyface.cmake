@@ -47,7 +47,11 @@ target_link_libraries(kyface_options INTERFACE kyface_warnings kyface_arithmetic
 
 # Hardening of a shared library: read-only relocations, everything bound at load, nothing left undefined.
 add_library(kyface_link INTERFACE)
-target_link_options(kyface_link INTERFACE -Wl,-z,relro -Wl,-z,now -Wl,-z,defs -Wl,--build-id=sha1)
+target_link_options(kyface_link INTERFACE -Wl,-z,relro -Wl,-z,now -Wl,--build-id=sha1)
+if(NOT KYFACE_SANITIZE)
+  # With clang the checks' run-time is in the program alone.
+  target_link_options(kyface_link INTERFACE -Wl,-z,defs)
+endif()
 if(CMAKE_SYSTEM_PROCESSOR MATCHES "aarch64|arm64|ARM64")
   target_link_options(kyface_link INTERFACE -Wl,-z,max-page-size=16384)
 endif()
