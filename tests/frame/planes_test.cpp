@@ -92,8 +92,8 @@ TEST(Planes, EveryHeightOfFewColumns) {
 }
 
 TEST(Planes, LargerPictures) {
-  constexpr Size kSizes[] = {{32, 32},  {34, 30},  {62, 66},   {64, 64},   {66, 130},
-                             {128, 34}, {130, 66}, {144, 146}, {258, 126}, {320, 18}};
+  constexpr Size kSizes[] = {{32, 32},  {34, 30},   {62, 66},   {64, 64},  {66, 130}, {128, 34},
+                             {130, 66}, {144, 146}, {258, 126}, {320, 18}, {290, 34}};
   for (const Size& size : kSizes) {
     expect_all_views(size.width, size.height, {0, 0, size.width, size.height}, 0);
     expect_all_views(size.width, size.height, {0, 0, size.width, size.height}, 7);
