@@ -15,6 +15,7 @@ android.content.Context android.graphics.Bitmap android.graphics.Canvas android.
 android.graphics.PointF android.graphics.Rect android.media.Image android.util.AttributeSet android.util.Log
 android.view.View androidx.camera.core.ImageAnalysis androidx.camera.core.ImageProxy com.vantrel.faceapi.*
 com.vantrel.faceapi.model.FaceInfo java.nio.ByteBuffer java.util.Collections java.util.List
+java.util.concurrent.ExecutorService
 """.split()
 # Kotlin has its own collections.
 JAVA_ONLY = {"java.util.Collections", "java.util.List"}

@@ -1,5 +1,7 @@
 package androidx.camera.core;
 
+import java.util.concurrent.Executor;
+
 /** As much of CameraX's analysis as the documents' examples use. */
 public final class ImageAnalysis {
     /** As CameraX's. */
@@ -8,4 +10,12 @@ public final class ImageAnalysis {
     }
 
     private ImageAnalysis() {}
+
+    public void setAnalyzer(Executor executor, Analyzer analyzer) {
+        throw new UnsupportedOperationException();
+    }
+
+    public void clearAnalyzer() {
+        throw new UnsupportedOperationException();
+    }
 }

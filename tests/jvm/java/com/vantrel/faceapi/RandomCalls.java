@@ -719,8 +719,9 @@ public final class RandomCalls {
 
         boolean holds(int columns, int rows) {
             long row = (columns - 1L) * pixelStride + 1;
+            BigInteger bytes = product(rows - 1L, rowStride).add(BigInteger.valueOf(row));
             return buffer != null && pixelStride > 0 && rowStride >= row
-                    && RandomCalls.holds(buffer.remaining(), product(rows - 1L, rowStride).add(BigInteger.valueOf(row)));
+                    && RandomCalls.holds(buffer.remaining(), bytes);
         }
 
         byte at(int column, int row) {
