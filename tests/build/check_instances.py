@@ -10,7 +10,6 @@ from itertools import product
 from pathlib import Path
 
 TYPES = ["unsigned char", "float"]
-CONVERSIONS = range(22)
 MESSAGE = re.compile(r"HPC::fastcv::\w+ has no such instance")
 
 HEAD = '#include "fastcv/fastcv.h"\nnamespace HPC::fastcv {\nconstexpr EcoEnv_t kOther = static_cast<EcoEnv_t>(1);\n'
@@ -35,7 +34,8 @@ def cases(command):
     """(instance, whether it exists), for all of them."""
     names = {name: value for value, name in enumerators(command)}
     conversions = {(names[name], kind, int(a), int(b)) for name, kind, a, b in listed(command, "FASTCV_CVT_COLOR_INSTANCES")}
-    for conversion, kind, a, b in product(CONVERSIONS, TYPES, (1, 3, 4), (1, 3, 4)):
+    # The next value too, which is no conversion.
+    for conversion, kind, a, b in product(range(max(names.values()) + 2), TYPES, (1, 3, 4), (1, 3, 4)):
         yield (f"cvtColor<static_cast<ColorCvtType>({conversion}), {kind}, {a}, {kind}, {b}, ECO_ENV_ARM>",
                (conversion, kind, a, b) in conversions)
     # What exists, but for an element type or the environment.

@@ -5,7 +5,6 @@
 #include "fastcv/fastcv.h"
 #include "fastcv/kernels.h"
 #include "frame/frame.h"
-#include "tests/support/cvt_kernels.h"
 
 using PlainMetric = unsigned char(unsigned char*, int, int, int, int, int, int, int, int);
 using HeaderMetric = unsigned char(const unsigned char*, int, int, int, int, int, int, int, int);
@@ -16,9 +15,9 @@ namespace HPC::fastcv {
 using Function = void (*)();
 #define ADDRESS(...) reinterpret_cast<Function>(&__VA_ARGS__),
 
-#define COLOR(type, T, ncSrc, ncDst)                       \
-  ADDRESS(cvtColor<type, T, ncSrc, T, ncDst, ECO_ENV_ARM>) \
-  ADDRESS(KERNEL_OF(type) < T, ncSrc, T, ncDst >)
+#define COLOR(name, T, ncSrc, ncDst)                             \
+  ADDRESS(cvtColor<CVT_##name, T, ncSrc, T, ncDst, ECO_ENV_ARM>) \
+  ADDRESS(arm##name##Image<T, ncSrc, T, ncDst>)
 
 #define PACKED(T, nc)                          \
   ADDRESS(crop<T, nc, T, nc, nc, ECO_ENV_ARM>) \
@@ -42,7 +41,7 @@ using Function = void (*)();
 // clang-format off
 extern const Function intended[];
 const Function intended[] = {
-    FASTCV_CVT_COLOR_INSTANCES(COLOR)
+    FASTCV_NAMED_INSTANCES(COLOR)
     FASTCV_PACKED_INSTANCES(PACKED)
     ROTATION(unsigned char, 1) ROTATION(unsigned char, 2) ROTATION(unsigned char, 3) ROTATION(unsigned char, 4)
     ROTATION(float, 1) ROTATION(float, 2) ROTATION(float, 3) ROTATION(float, 4)

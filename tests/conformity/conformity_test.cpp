@@ -20,10 +20,13 @@
 #include <vector>
 
 #include "fastcv/fastcv.h"
+#include "tests/support/cvt_families.h"
 
 namespace {
 
 using namespace HPC::fastcv;  // the conversions' names
+using kyface::test::isFrom420;
+using kyface::test::isTo420;
 
 /// OpenCV's code for a conversion. Four channels are given to, or wanted from, the codes of three where it
 /// takes them so: the fourth is ignored, or made.
@@ -80,12 +83,6 @@ template <ColorCvtType type, typename T, int ncSrc, int ncDst>
 HPCStatus_t convert(cv::Mat& src, cv::Mat& dst) {
   auto out = view<T, ncDst>(dst);
   return cvtColor<type, T, ncSrc, T, ncDst, ECO_ENV_ARM>(view<T, ncSrc>(src), &out);
-}
-
-bool isTo420(ColorCvtType type) { return type == CVT_BGR2I420; }
-bool isFrom420(ColorCvtType type) {
-  return type == CVT_NV212BGR || type == CVT_NV212RGB || type == CVT_NV122BGR || type == CVT_NV122RGB ||
-         type == CVT_I4202BGR || type == CVT_YUV2GRAY;
 }
 
 std::vector<Instance> instances() {

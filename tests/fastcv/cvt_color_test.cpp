@@ -5,14 +5,15 @@
 
 #include <cstdint>
 #include <cstring>
-#include <map>
+#include <iterator>
 #include <set>
+#include <sstream>
 #include <string>
 #include <vector>
 
 #include "fastcv/fastcv.h"
 #include "fastcv/kernels.h"
-#include "tests/support/cvt_kernels.h"
+#include "tests/support/cvt_families.h"
 
 namespace {
 
@@ -44,19 +45,16 @@ std::string instanceOf(const char* function) {
 
 }  // namespace
 
-#define STRING_OF(name) #name
-#define EXPANDED_STRING_OF(name) STRING_OF(name)
-
 namespace HPC::fastcv {
 
-#define DEFINE_KERNEL(type, T, ncSrc, ncDst)                                                          \
-  template <>                                                                                         \
-  void KERNEL_OF(type)<T, ncSrc, T, ncDst>(int height, int width, int inWidthStride, const T* inData, \
-                                           int outWidthStride, T* outData) {                          \
-    calls.push_back({instanceOf<T, ncSrc, ncDst>(EXPANDED_STRING_OF(KERNEL_OF(type))), height, width, \
-                     inWidthStride, inData, outWidthStride, outData});                                \
+#define DEFINE_KERNEL(name, T, ncSrc, ncDst)                                                                 \
+  template <>                                                                                                \
+  void arm##name##Image<T, ncSrc, T, ncDst>(int height, int width, int inWidthStride, const T* inData,       \
+                                            int outWidthStride, T* outData) {                                \
+    calls.push_back({instanceOf<T, ncSrc, ncDst>("arm" #name "Image"), height, width, inWidthStride, inData, \
+                     outWidthStride, outData});                                                              \
   }
-FASTCV_CVT_COLOR_INSTANCES(DEFINE_KERNEL)
+FASTCV_NAMED_INSTANCES(DEFINE_KERNEL)
 
 }  // namespace HPC::fastcv
 
@@ -67,6 +65,10 @@ using HPC::fastcv::ECO_ENV_ARM;
 using HPC::fastcv::HPCStatus_t;
 using HPC::fastcv::Mat;
 using namespace HPC::fastcv;  // the conversions' names
+using kyface::test::channelPairsOf;
+using kyface::test::isFrom420;
+using kyface::test::isTo420;
+using kyface::test::sidesOf;
 
 /// A matrix whatever its type: the fields that the front-end reads, and some that it must not.
 struct Fields {
@@ -126,24 +128,22 @@ struct Instance {
 void PrintTo(const Instance& instance, std::ostream* out) { *out << instance.name; }
 
 const std::vector<Instance>& instances() {
-#define INSTANCE_OF(type, T, ncSrc, ncDst)                           \
-  {instanceOf<T, ncSrc, ncDst>(#type),                               \
-   instanceOf<T, ncSrc, ncDst>(EXPANDED_STRING_OF(KERNEL_OF(type))), \
-   type,                                                             \
-   static_cast<int>(sizeof(T)),                                      \
-   ncSrc,                                                            \
-   ncDst,                                                            \
-   convert<type, T, ncSrc, ncDst>},
-  static const std::vector<Instance> all = {FASTCV_CVT_COLOR_INSTANCES(INSTANCE_OF)};
+#define INSTANCE_OF(name, T, ncSrc, ncDst)           \
+  {instanceOf<T, ncSrc, ncDst>("CVT_" #name),        \
+   instanceOf<T, ncSrc, ncDst>("arm" #name "Image"), \
+   CVT_##name,                                       \
+   static_cast<int>(sizeof(T)),                      \
+   ncSrc,                                            \
+   ncDst,                                            \
+   convert<CVT_##name, T, ncSrc, ncDst>},
+  static const std::vector<Instance> all = {FASTCV_NAMED_INSTANCES(INSTANCE_OF)};
   return all;
 }
 
 enum class Family { kPacked, kTo420, kFrom420 };
 
 Family familyOf(ColorCvtType type) {
-  static const std::set<int> to = {0, 3, 4, 17, 20};
-  static const std::set<int> from = {1, 2, 5, 18, 19, 21};
-  return to.contains(type) ? Family::kTo420 : from.contains(type) ? Family::kFrom420 : Family::kPacked;
+  return isTo420(type) ? Family::kTo420 : isFrom420(type) ? Family::kFrom420 : Family::kPacked;
 }
 
 // The low 32 bits.
@@ -463,22 +463,38 @@ TEST_P(CvtColor, ArithmeticWraps) {
 INSTANTIATE_TEST_SUITE_P(All, CvtColor, testing::ValuesIn(instances()),
                          [](const auto& i) { return i.param.name; });
 
-// The instances that exist are these and no others.
-TEST(CvtColorInstances, AreThoseThatAreWanted) {
-  using Pairs = std::set<std::pair<int, int>>;
-  const Pairs to = {{3, 1}, {4, 1}}, from = {{1, 3}, {1, 4}}, fromThree = {{3, 3}, {3, 4}},
-              toThree = {{3, 3}, {4, 3}};
-  const std::map<int, Pairs> wanted = {
-      {0, to},       {1, from},       {2, from},      {3, to},        {4, to},
-      {5, from},     {6, fromThree},  {7, toThree},   {8, toThree},   {9, fromThree},
-      {10, to},      {11, from},      {12, {{3, 4}}}, {13, {{4, 3}}}, {14, {{3, 3}, {3, 4}, {4, 3}, {4, 4}}},
-      {15, toThree}, {16, fromThree}, {17, to},       {18, from},     {19, {{1, 1}}},
-      {20, to},      {21, from}};
-  std::set<std::string> names;
+// What a conversion's name says is what exists of it, and no more: 8-bit, and float of packed images.
+TEST(CvtColorInstances, AreThoseOfTheirNames) {
+  std::set<std::string> names, wanted;
+  std::set<ColorCvtType> types;
   for (const Instance& instance : instances()) {
     EXPECT_TRUE(names.insert(instance.name).second) << instance.name << " is listed twice";
-    EXPECT_TRUE(wanted.at(instance.type).contains({instance.ncSrc, instance.ncDst})) << instance.name;
-    EXPECT_TRUE(instance.elementSize == 1 || familyOf(instance.type) == Family::kPacked) << instance.name;
+    types.insert(instance.type);
+  }
+  for (const ColorCvtType type : types) {
+    std::ostringstream name;
+    name << "CVT_" << sidesOf(type).from << "2" << sidesOf(type).to;
+    for (const auto& [from, to] : channelPairsOf(type)) {
+      std::ostringstream channels;
+      channels << "_" << from << "_" << to;
+      wanted.insert(name.str() + "_u8" + channels.str());
+      if (familyOf(type) == Family::kPacked) {
+        wanted.insert(name.str() + "_f32" + channels.str());
+      }
+    }
+  }
+  EXPECT_EQ(names, wanted);
+}
+
+// Callers have them compiled in.
+TEST(CvtColorValues, StayWhatTheyAre) {
+  const ColorCvtType inOrder[] = {CVT_BGR2NV21, CVT_NV212BGR,  CVT_NV212RGB,  CVT_RGB2NV21, CVT_BGR2NV12,
+                                  CVT_NV122BGR, CVT_YCrCb2BGR, CVT_BGR2YCrCb, CVT_BGR2HSV,  CVT_HSV2BGR,
+                                  CVT_BGR2GRAY, CVT_GRAY2BGR,  CVT_BGR2BGRA,  CVT_BGRA2BGR, CVT_BGR2RGB,
+                                  CVT_BGR2LAB,  CVT_LAB2BGR,   CVT_BGR2I420,  CVT_I4202BGR, CVT_YUV2GRAY,
+                                  CVT_RGB2NV12, CVT_NV122RGB};
+  for (size_t value = 0; value < std::size(inOrder); ++value) {
+    EXPECT_EQ(static_cast<size_t>(inOrder[value]), value);
   }
 }
 

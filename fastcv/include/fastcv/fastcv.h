@@ -50,38 +50,88 @@ enum EcoEnv_t {
   ECO_ENV_ARM = 2,  ///< the NEON kernels
 };
 
-/// Colour conversions. "BGR" and "RGB" images may have a fourth channel, alpha: a conversion ignores it
-/// unless it only moves channels; where it creates one, that is opaque (255, or 1.0f for float).
+// The element types and channel counts that a conversion exists for. X is given (conversion, element type of
+// both sides, source channels, destination channels).
+#define FASTCV_BOTH_TYPES(X, conversion, ncSrc, ncDst) \
+  X(conversion, unsigned char, ncSrc, ncDst)           \
+  X(conversion, float, ncSrc, ncDst)
+#define FASTCV_U8_COLOR_TO_1(X, conversion) \
+  X(conversion, unsigned char, 3, 1)        \
+  X(conversion, unsigned char, 4, 1)
+#define FASTCV_U8_1_TO_COLOR(X, conversion) \
+  X(conversion, unsigned char, 1, 3)        \
+  X(conversion, unsigned char, 1, 4)
+#define FASTCV_U8_1_TO_1(X, conversion) X(conversion, unsigned char, 1, 1)
+#define FASTCV_COLOR_TO_1(X, conversion) \
+  FASTCV_BOTH_TYPES(X, conversion, 3, 1) \
+  FASTCV_BOTH_TYPES(X, conversion, 4, 1)
+#define FASTCV_1_TO_COLOR(X, conversion) \
+  FASTCV_BOTH_TYPES(X, conversion, 1, 3) \
+  FASTCV_BOTH_TYPES(X, conversion, 1, 4)
+#define FASTCV_COLOR_TO_3(X, conversion) \
+  FASTCV_BOTH_TYPES(X, conversion, 3, 3) \
+  FASTCV_BOTH_TYPES(X, conversion, 4, 3)
+#define FASTCV_3_TO_COLOR(X, conversion) \
+  FASTCV_BOTH_TYPES(X, conversion, 3, 3) \
+  FASTCV_BOTH_TYPES(X, conversion, 3, 4)
+#define FASTCV_3_TO_4(X, conversion) FASTCV_BOTH_TYPES(X, conversion, 3, 4)
+#define FASTCV_4_TO_3(X, conversion) FASTCV_BOTH_TYPES(X, conversion, 4, 3)
+#define FASTCV_COLOR_TO_COLOR(X, conversion) \
+  FASTCV_3_TO_COLOR(X, conversion)           \
+  FASTCV_BOTH_TYPES(X, conversion, 4, 3)     \
+  FASTCV_BOTH_TYPES(X, conversion, 4, 4)
+
+/// The conversions: the one table from which the enumeration, the front-ends, the kernels' declarations and
+/// the benchmarks are made. X is given (`with`, which is handed on; name; value; family of the checks;
+/// instances): conversion NAME is `CVT_NAME`, its kernel `armNAMEImage`.
+#define FASTCV_CONVERSIONS(X, with)                        \
+  X(with, BGR2NV21, 0, kToYuv420, FASTCV_U8_COLOR_TO_1)    \
+  X(with, NV212BGR, 1, kFromYuv420, FASTCV_U8_1_TO_COLOR)  \
+  X(with, NV212RGB, 2, kFromYuv420, FASTCV_U8_1_TO_COLOR)  \
+  X(with, RGB2NV21, 3, kToYuv420, FASTCV_U8_COLOR_TO_1)    \
+  X(with, BGR2NV12, 4, kToYuv420, FASTCV_U8_COLOR_TO_1)    \
+  X(with, NV122BGR, 5, kFromYuv420, FASTCV_U8_1_TO_COLOR)  \
+  X(with, RGB2NV12, 20, kToYuv420, FASTCV_U8_COLOR_TO_1)   \
+  X(with, NV122RGB, 21, kFromYuv420, FASTCV_U8_1_TO_COLOR) \
+  X(with, BGR2I420, 17, kToYuv420, FASTCV_U8_COLOR_TO_1)   \
+  X(with, I4202BGR, 18, kFromYuv420, FASTCV_U8_1_TO_COLOR) \
+  X(with, YUV2GRAY, 19, kFromYuv420, FASTCV_U8_1_TO_1)     \
+  X(with, YCrCb2BGR, 6, kPacked, FASTCV_3_TO_COLOR)        \
+  X(with, BGR2YCrCb, 7, kPacked, FASTCV_COLOR_TO_3)        \
+  X(with, BGR2HSV, 8, kPacked, FASTCV_COLOR_TO_3)          \
+  X(with, HSV2BGR, 9, kPacked, FASTCV_3_TO_COLOR)          \
+  X(with, BGR2GRAY, 10, kPacked, FASTCV_COLOR_TO_1)        \
+  X(with, GRAY2BGR, 11, kPacked, FASTCV_1_TO_COLOR)        \
+  X(with, BGR2BGRA, 12, kPacked, FASTCV_3_TO_4)            \
+  X(with, BGRA2BGR, 13, kPacked, FASTCV_4_TO_3)            \
+  X(with, BGR2RGB, 14, kPacked, FASTCV_COLOR_TO_COLOR)     \
+  X(with, BGR2LAB, 15, kPacked, FASTCV_COLOR_TO_3)         \
+  X(with, LAB2BGR, 16, kPacked, FASTCV_3_TO_COLOR)
+
+/// All instances: X is given (`CVT_NAME`, element type, source channels, destination channels) ...
+#define FASTCV_CVT_COLOR_INSTANCES(X) FASTCV_CONVERSIONS(FASTCV_INSTANCES_BY_TYPE, X)
+#define FASTCV_INSTANCES_BY_TYPE(X, name, value, family, instances) instances(X, CVT_##name)
+/// ... or (NAME, element type, source channels, destination channels).
+#define FASTCV_NAMED_INSTANCES(X) FASTCV_CONVERSIONS(FASTCV_INSTANCES_BY_NAME, X)
+#define FASTCV_INSTANCES_BY_NAME(X, name, value, family, instances) instances(X, name)
+
+/// Colour conversions, those of FASTCV_CONVERSIONS. "BGR" and "RGB" images may have a fourth channel, alpha:
+/// a conversion ignores it unless it only moves channels; where it creates one, that is opaque (255, or 1.0f
+/// for float).
+///
+/// - CVT_BGR2RGB swaps red and blue, with or without alpha on either side; it is its own inverse.
+/// - CVT_BGR2LAB is to CIE L*a*b*, sRGB primaries, D65 white. 8-bit: L * 2.55, a + 128, b + 128. Float: L
+///   0..100 and a, b as they are, of colours 0..1.
+/// - CVT_LAB2BGR is the way back; colours are clamped to 0..255, or 0..1 for float. The 8-bit conversion
+///   works on groups of 8 pixels that start before column `width` - 3, so it reads and writes up to 4 pixels
+///   beyond the end of each row: 12 bytes of the source and 12 (BGR) or 16 (BGRA) of the destination. Between
+///   rows that is padding, whose contents are lost, or the start of the next row, which is written later. The
+///   buffers must have room for it after the last row too, unless `width` % 8 is below 4.
+/// - CVT_YUV2GRAY takes the luma plane of any 4:2:0 buffer.
 enum ColorCvtType {
-  CVT_BGR2NV21 = 0,
-  CVT_NV212BGR = 1,
-  CVT_NV212RGB = 2,
-  CVT_RGB2NV21 = 3,
-  CVT_BGR2NV12 = 4,
-  CVT_NV122BGR = 5,
-  CVT_YCrCb2BGR = 6,
-  CVT_BGR2YCrCb = 7,
-  CVT_BGR2HSV = 8,
-  CVT_HSV2BGR = 9,
-  CVT_BGR2GRAY = 10,
-  CVT_GRAY2BGR = 11,
-  CVT_BGR2BGRA = 12,
-  CVT_BGRA2BGR = 13,
-  CVT_BGR2RGB = 14,  ///< swaps red and blue, with or without alpha on either side; its own inverse
-  /// CIE L*a*b*, sRGB primaries, D65 white. 8-bit: L * 2.55, a + 128, b + 128. Float: L 0..100 and a, b as
-  /// they are, of colours 0..1.
-  CVT_BGR2LAB = 15,
-  /// The way back; colours are clamped to 0..255, or 0..1 for float. The 8-bit conversion works on groups of
-  /// 8 pixels that start before column `width` - 3, so it reads and writes up to 4 pixels beyond the end of
-  /// each row: 12 bytes of the source and 12 (BGR) or 16 (BGRA) of the destination. Between rows that is
-  /// padding, whose contents are lost, or the start of the next row, which is written later. The buffers must
-  /// have room for it after the last row too, unless `width` % 8 is below 4.
-  CVT_LAB2BGR = 16,
-  CVT_BGR2I420 = 17,
-  CVT_I4202BGR = 18,
-  CVT_YUV2GRAY = 19,  ///< the luma plane of any 4:2:0 buffer
-  CVT_RGB2NV12 = 20,
-  CVT_NV122RGB = 21,
+#define FASTCV_ENUMERATOR(with, name, value, family, instances) CVT_##name = value,
+  FASTCV_CONVERSIONS(FASTCV_ENUMERATOR, )
+#undef FASTCV_ENUMERATOR
 };
 
 /// Layouts of a YUV 4:2:0 frame: a luma plane, then the chroma.
@@ -183,12 +233,12 @@ inline constexpr bool kNever = false;
 /// order, with S a matrix's step in elements, W and H its width and height, in signed 32-bit arithmetic, X /
 /// 3 truncating:
 /// - `dst` null: HPC_INVALID_ARGS; `src`, then `*dst` empty: HPC_MAT_EMPTY;
-/// - by family, HPC_INVALID_ARGS unless
-///   - packed (values 6 to 16): where both S hold a row, W and H are equal; otherwise W and H of `src` are
+/// - by family, the third column of FASTCV_CONVERSIONS, HPC_INVALID_ARGS unless
+///   - packed: where both S hold a row, W and H are equal; otherwise W and H of `src` are
 ///   even, W is
 ///     equal, and H(src) == H(dst) / 3 * 2;
-///   - to 4:2:0 (0, 3, 4, 17, 20): W and H of `src` are even, W is equal, and H(src) == H(dst) / 3 * 2;
-///   - from 4:2:0 (1, 2, 5, 18, 19, 21): where both S hold a row, W and H of `*dst` are even, W is equal, and
+///   - to 4:2:0: W and H of `src` are even, W is equal, and H(src) == H(dst) / 3 * 2;
+///   - from 4:2:0: where both S hold a row, W and H of `*dst` are even, W is equal, and
 ///     H(dst) == H(src) / 3 * 2; otherwise the rule "to 4:2:0".
 ///
 /// The second rules of the packed and the "from 4:2:0" families can describe no valid image. They decide
@@ -263,56 +313,7 @@ HPCStatus_t rotate_YUV420(const Mat<unsigned char, 1, env>& /*src*/, Mat<unsigne
   return HPC_INVALID_ARGS;
 }
 
-// The instances that exist. X is given (conversion, element type of both sides, source channels, destination
-// channels).
-#define FASTCV_CVT_BOTH_TYPES(X, type, ncSrc, ncDst) \
-  X(type, unsigned char, ncSrc, ncDst)               \
-  X(type, float, ncSrc, ncDst)
-
-#define FASTCV_CVT_COLOR_INSTANCES(X)           \
-  X(CVT_BGR2NV21, unsigned char, 3, 1)          \
-  X(CVT_BGR2NV21, unsigned char, 4, 1)          \
-  X(CVT_NV212BGR, unsigned char, 1, 3)          \
-  X(CVT_NV212BGR, unsigned char, 1, 4)          \
-  X(CVT_NV212RGB, unsigned char, 1, 3)          \
-  X(CVT_NV212RGB, unsigned char, 1, 4)          \
-  X(CVT_RGB2NV21, unsigned char, 3, 1)          \
-  X(CVT_RGB2NV21, unsigned char, 4, 1)          \
-  X(CVT_BGR2NV12, unsigned char, 3, 1)          \
-  X(CVT_BGR2NV12, unsigned char, 4, 1)          \
-  X(CVT_NV122BGR, unsigned char, 1, 3)          \
-  X(CVT_NV122BGR, unsigned char, 1, 4)          \
-  X(CVT_RGB2NV12, unsigned char, 3, 1)          \
-  X(CVT_RGB2NV12, unsigned char, 4, 1)          \
-  X(CVT_NV122RGB, unsigned char, 1, 3)          \
-  X(CVT_NV122RGB, unsigned char, 1, 4)          \
-  X(CVT_BGR2I420, unsigned char, 3, 1)          \
-  X(CVT_BGR2I420, unsigned char, 4, 1)          \
-  X(CVT_I4202BGR, unsigned char, 1, 3)          \
-  X(CVT_I4202BGR, unsigned char, 1, 4)          \
-  X(CVT_YUV2GRAY, unsigned char, 1, 1)          \
-  FASTCV_CVT_BOTH_TYPES(X, CVT_YCrCb2BGR, 3, 3) \
-  FASTCV_CVT_BOTH_TYPES(X, CVT_YCrCb2BGR, 3, 4) \
-  FASTCV_CVT_BOTH_TYPES(X, CVT_BGR2YCrCb, 3, 3) \
-  FASTCV_CVT_BOTH_TYPES(X, CVT_BGR2YCrCb, 4, 3) \
-  FASTCV_CVT_BOTH_TYPES(X, CVT_BGR2HSV, 3, 3)   \
-  FASTCV_CVT_BOTH_TYPES(X, CVT_BGR2HSV, 4, 3)   \
-  FASTCV_CVT_BOTH_TYPES(X, CVT_HSV2BGR, 3, 3)   \
-  FASTCV_CVT_BOTH_TYPES(X, CVT_HSV2BGR, 3, 4)   \
-  FASTCV_CVT_BOTH_TYPES(X, CVT_BGR2GRAY, 3, 1)  \
-  FASTCV_CVT_BOTH_TYPES(X, CVT_BGR2GRAY, 4, 1)  \
-  FASTCV_CVT_BOTH_TYPES(X, CVT_GRAY2BGR, 1, 3)  \
-  FASTCV_CVT_BOTH_TYPES(X, CVT_GRAY2BGR, 1, 4)  \
-  FASTCV_CVT_BOTH_TYPES(X, CVT_BGR2BGRA, 3, 4)  \
-  FASTCV_CVT_BOTH_TYPES(X, CVT_BGRA2BGR, 4, 3)  \
-  FASTCV_CVT_BOTH_TYPES(X, CVT_BGR2RGB, 3, 3)   \
-  FASTCV_CVT_BOTH_TYPES(X, CVT_BGR2RGB, 3, 4)   \
-  FASTCV_CVT_BOTH_TYPES(X, CVT_BGR2RGB, 4, 3)   \
-  FASTCV_CVT_BOTH_TYPES(X, CVT_BGR2RGB, 4, 4)   \
-  FASTCV_CVT_BOTH_TYPES(X, CVT_BGR2LAB, 3, 3)   \
-  FASTCV_CVT_BOTH_TYPES(X, CVT_BGR2LAB, 4, 3)   \
-  FASTCV_CVT_BOTH_TYPES(X, CVT_LAB2BGR, 3, 3)   \
-  FASTCV_CVT_BOTH_TYPES(X, CVT_LAB2BGR, 3, 4)
+// The instances that exist.
 
 // X is given (element type, channels): the instances of `crop` and `rotate`.
 #define FASTCV_PACKED_INSTANCES(X) \

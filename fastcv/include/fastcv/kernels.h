@@ -4,72 +4,42 @@
 /// Kernels return nothing and trust their arguments, except those that say that they assert. They write only
 /// inside the destination's rows (`armLAB2BGRImage` of `unsigned char` excepted), and nothing at all where a
 /// size is below what they can work on. All offsets are formed in 64 bits.
-///
-/// Every colour kernel takes, in this order:
-/// - `height`, `width`: size of the picture in pixels; for 4:2:0 buffers `height` is the luma height;
-/// - `inWidthStride`, `inData`: source row pitch in elements of `Tsrc` (bytes, or floats), and source pixels;
-/// - `outWidthStride`, `outData`: the same of the destination.
-/// An alpha channel that a kernel creates is 255, or 1.0f for `float`.
 #pragma once
+
+#include "fastcv/fastcv.h"
 
 #pragma GCC visibility push(default)
 
 namespace HPC::fastcv {
 
-#define FASTCV_COLOR_KERNEL(name)                               \
-  template <typename Tsrc, int ncSrc, typename Tdst, int ncDst> \
-  void name(int height, int width, int inWidthStride, const Tsrc* inData, int outWidthStride, Tdst* outData)
-
-// ---- semi-planar 4:2:0, full range (NV_arm)
-// ------------------------------------------------------------------- NV21 has V,U pairs, NV12 U,V pairs; the
-// chroma rows start at height * stride and have the same stride. Only whole 2 x 2 blocks are converted: a
-// last odd row or column is left as it was, and a picture of one row writes nothing.
-
-FASTCV_COLOR_KERNEL(armBGR2NV21Image);
-FASTCV_COLOR_KERNEL(armNV212BGRImage);
-FASTCV_COLOR_KERNEL(armRGB2NV21Image);
-FASTCV_COLOR_KERNEL(armNV212RGBImage);
-FASTCV_COLOR_KERNEL(armBGR2NV12Image);
-FASTCV_COLOR_KERNEL(armNV122BGRImage);
-FASTCV_COLOR_KERNEL(armRGB2NV12Image);
-FASTCV_COLOR_KERNEL(armNV122RGBImage);
-
-// ---- planar 4:2:0, limited range (BGR_I420_arm), and its luma (YUV_GRAY_arm)
-// ----------------------------------- These assert: non-null pointers, sizes and strides other than 0, and
-// for the colour kernels even sizes. Chroma rows are packed two to a stride row, U plane first; see
-// BGR_I420_arm.cpp.
-
-FASTCV_COLOR_KERNEL(armBGR2I420Image);
-FASTCV_COLOR_KERNEL(armI4202BGRImage);
-/// Copies the luma rows of any Y-first 4:2:0 buffer; all sizes.
-FASTCV_COLOR_KERNEL(armYUV2GRAYImage);
-
-// ---- packed images
-// -------------------------------------------------------------------------------------------- All sizes.
-// Those whose destination has no more channels than the source also work forwards over images that overlap
-// (no row of the destination begins behind that of the source), armLAB2BGRImage of `unsigned char` excepted.
-
-FASTCV_COLOR_KERNEL(armBGR2BGRAImage);
-FASTCV_COLOR_KERNEL(armBGRA2BGRImage);
-FASTCV_COLOR_KERNEL(armBGR2RGBImage);
-FASTCV_COLOR_KERNEL(armBGR2GRAYImage);
-FASTCV_COLOR_KERNEL(armGRAY2BGRImage);
-FASTCV_COLOR_KERNEL(armBGR2YCrCbImage);
-FASTCV_COLOR_KERNEL(armYCrCb2BGRImage);
-FASTCV_COLOR_KERNEL(armBGR2HSVImage);
-FASTCV_COLOR_KERNEL(armHSV2BGRImage);
-FASTCV_COLOR_KERNEL(armBGR2LABImage);
-/// With `unsigned char`, rows are worked on in groups of 8 pixels while the group's first pixel is below
-/// `width` - 3. Where `width` % 8 is 4 or more, the last group so reads and writes 8 - `width` % 8 pixels, up
-/// to 4, beyond the row's end: at most 12 bytes of the source, and 12 (3 channels) or 16 (4 channels) of the
-/// destination. Padding there loses its contents, the next row is written later; after the last row both
-/// buffers must have room.
-FASTCV_COLOR_KERNEL(armLAB2BGRImage);
-
-#undef FASTCV_COLOR_KERNEL
+/// The colour kernels, one for each conversion of FASTCV_CONVERSIONS: `armBGR2NV21Image` is behind
+/// CVT_BGR2NV21. Each takes, in this order:
+/// - `height`, `width`: size of the picture in pixels; for 4:2:0 buffers `height` is the luma height;
+/// - `inWidthStride`, `inData`: source row pitch in elements of `Tsrc` (bytes, or floats), and source pixels;
+/// - `outWidthStride`, `outData`: the same of the destination.
+///
+/// An alpha channel that a kernel creates is 255, or 1.0f for `float`. What they work on differs:
+/// - Semi-planar 4:2:0, full range (NV_arm.cpp). NV21 has V,U pairs, NV12 U,V pairs; the chroma rows start at
+///   height * stride and have the same stride. Only whole 2 x 2 blocks are converted: a last odd row or
+///   column is left as it was, and a picture of one row writes nothing.
+/// - Planar 4:2:0, limited range (BGR_I420_arm.cpp), and the luma of any Y-first buffer (YUV_GRAY_arm.cpp).
+///   These assert: non-null pointers, sizes and strides other than 0, and for the colour kernels even sizes.
+///   Chroma rows are packed two to a stride row, U plane first.
+/// - Packed images of all sizes. Those whose destination has no more channels than the source also work
+///   forwards over images that overlap (no row of the destination begins behind that of the source).
+/// - `armLAB2BGRImage` of `unsigned char` works on groups of 8 pixels while a group's first pixel is below
+///   `width` - 3, and not over images that overlap. Where `width` % 8 is 4 or more, the last group so reads
+///   and writes 8 - `width` % 8 pixels, up to 4, beyond the row's end: at most 12 bytes of the source, and 12
+///   (3 channels) or 16 (4 channels) of the destination. Padding there loses its contents, the next row is
+///   written later; after the last row both buffers must have room.
+#define FASTCV_DECLARE_KERNEL(with, name, value, family, instances)                                       \
+  template <typename Tsrc, int ncSrc, typename Tdst, int ncDst>                                           \
+  void arm##name##Image(int height, int width, int inWidthStride, const Tsrc* inData, int outWidthStride, \
+                        Tdst* outData);
+FASTCV_CONVERSIONS(FASTCV_DECLARE_KERNEL, )
+#undef FASTCV_DECLARE_KERNEL
 
 // ---- geometry
-// -------------------------------------------------------------------------------------------------
 
 /// Copies the rectangle of `outHeight` by `outWidth` pixels at row `top`, column `left`, each sample
 /// multiplied by `ratio` (a plain copy when it is exactly 1). Strides in elements; nothing is checked.
