@@ -25,9 +25,12 @@ if(kyface_instrumented)
   add_compile_options($<$<COMPILE_LANG_AND_ID:CXX,Clang>:-Wno-pass-failed>)
 endif()
 
-# What every target of the project is compiled with.
+# What every target of the project is compiled with. Warnings are errors where this project is what is built; for who
+# builds it as a part, a new compiler's new warning is none of their business.
+option(KYFACE_WERROR "Treat warnings as errors" ${PROJECT_IS_TOP_LEVEL})
 add_library(kyface_warnings INTERFACE)
-target_compile_options(kyface_warnings INTERFACE -Wall -Wextra -Wpedantic -Wshadow -Wcast-qual -Wvla -Werror)
+target_compile_options(kyface_warnings INTERFACE -Wall -Wextra -Wpedantic -Wshadow -Wcast-qual -Wvla
+                                                 $<$<BOOL:${KYFACE_WERROR}>:-Werror>)
 
 # The arithmetic that everything here is compiled to, tests included. On x86-64 the NEON intrinsics compile through
 # SIMDe, and FMA keeps their fused multiply-adds fused. Contraction is off so that only the written fused multiply-adds

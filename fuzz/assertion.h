@@ -2,6 +2,8 @@
 /// `__assert2`, which comes back here instead of ending the process.
 #pragma once
 
+#include <assert2.h>
+
 #include <csetjmp>
 
 namespace kyface::fuzz {

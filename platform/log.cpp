@@ -1,9 +1,7 @@
 #include <android/log.h>
-#include <assert2.h>
 #include <errno.h>
 #include <stdarg.h>
 #include <stdio.h>
-#include <stdlib.h>
 
 namespace {
 
@@ -28,9 +26,4 @@ extern "C" int __android_log_print(int prio, const char* tag, const char* fmt, .
   // One call of stdio holds the stream's lock from its first byte to its last.
   const int written = fprintf(stderr, "%c/%s: %s\n", priorityLetter(prio), tag == nullptr ? "" : tag, text);
   return written < 0 ? -EIO : 1;
-}
-
-extern "C" void __assert2(const char* file, int line, const char* function, const char* expression) {
-  (void)fprintf(stderr, "%s:%d: %s: assertion \"%s\" failed\n", file, line, function, expression);
-  abort();
 }

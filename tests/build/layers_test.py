@@ -45,7 +45,8 @@ def fault_of(root, layers, folder, source, quote, name):
     layer = name.split("/")[0]
     public = layer in layers and (root / layer / "include" / name).is_file()
     if quote == "<":
-        return "headers of the project are included in quotation marks" if public else None
+        outside = source.is_relative_to(root / "tests/install/consumer")  # somebody else's
+        return "headers of the project are included in quotation marks" if public and not outside else None
     if public:
         if folder in TOP or layer == folder or layer in layers.get(folder, ()):
             return None

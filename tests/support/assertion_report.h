@@ -2,6 +2,7 @@
 /// it in one source of a test program.
 #pragma once
 
+#include <assert2.h>
 #include <gtest/gtest.h>
 
 #include <cstdio>
@@ -26,7 +27,6 @@ inline std::string assertionReport(const std::string& path, const std::string& f
 
 }  // namespace kyface::test
 
-extern "C" void __assert2(const char* file, int line, const char* function, const char* expression);
 extern "C" __attribute__((visibility("default"))) void __assert2(const char* file, int line,
                                                                  const char* function,
                                                                  const char* expression) {

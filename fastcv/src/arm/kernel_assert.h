@@ -7,7 +7,7 @@
 #if defined(__ANDROID__)
 #include <assert.h>
 #else
-extern "C" void __assert2(const char* file, int line, const char* function, const char* expression);
+#include <assert2.h>
 #endif
 
 /// Checks `expression`, whose text as written is the message; `path` names the kernel family's source.

@@ -315,7 +315,8 @@ inline __m128i mixed(const Three& v) {
       }
       return lanes;
     };
-    return _mm_blend_epi32(_mm_blend_epi32(v.x[0], v.x[1], kLanes(1)), v.x[2], kLanes(2));
+    constexpr int kSecond = kLanes(1), kThird = kLanes(2);
+    return _mm_blend_epi32(_mm_blend_epi32(v.x[0], v.x[1], kSecond), v.x[2], kThird);
   }
 }
 

@@ -1,0 +1,20 @@
+# Builds and runs consumer/ in ${WORK}, with the library in the given way.
+function(run)
+  execute_process(COMMAND ${ARGN} COMMAND_ECHO STDOUT COMMAND_ERROR_IS_FATAL ANY)
+endfunction()
+
+file(REMOVE_RECURSE ${WORK})
+set(options -G ${GENERATOR} -DWAY=${WAY} -DSOURCE=${SOURCE} -DVERSION=${VERSION})
+if(TOOLCHAIN)
+  list(APPEND options -DCMAKE_TOOLCHAIN_FILE=${TOOLCHAIN})
+else()
+  list(APPEND options -DCMAKE_CXX_COMPILER=${CXX} -DCMAKE_C_COMPILER=${CC})
+endif()
+if(WAY STREQUAL "find_package")
+  run(${CMAKE_COMMAND} --install ${BUILD} --component fastcv --prefix ${WORK}/installed)
+  # Nothing of the build is looked at.
+  list(APPEND options -Dfastcv_ROOT=${WORK}/installed -DCMAKE_FIND_ROOT_PATH_MODE_PACKAGE=BOTH)
+endif()
+run(${CMAKE_COMMAND} -S ${CONSUMER} -B ${WORK}/build ${options})
+run(${CMAKE_COMMAND} --build ${WORK}/build --target consumer)
+run(${CMAKE_CTEST_COMMAND} --test-dir ${WORK}/build --output-on-failure)
