@@ -37,7 +37,7 @@ JNIEXPORT jlong JNICALL Java_com_vantrel_faceapi_FaceLibrary_kyFaceCreateDetecto
   ky_handle_t handle = nullptr;
   const int result = ky_face_create_detector(&handle, path.get(), config);
   if (result != 0) {
-    // The path's characters are deliberately not released on this path.
+    // The path's characters are not released on this path (C6 in docs/compatibility.md).
     FACE_LOG(ANDROID_LOG_ERROR, "FaceCreateDetector create handle fail : %d", result);
     return 0;
   }

@@ -12,7 +12,7 @@ namespace {
 enum FrameFormat { kNv12 = 2, kNv21 = 3 };
 
 /// Converts the pixels of an RGBA bitmap into `out`. Rows are taken as packed, whatever the bitmap's stride.
-/// Both methods over it deliberately write the messages of the first.
+/// Both methods over it write the messages of the first (C11 in docs/compatibility.md).
 void read_bitmap(JNIEnv* env, jobject bitmap, jbyteArray out, decltype(BGR2RGB)* convert) {
   if (bitmap == nullptr) {
     FACE_LOG(ANDROID_LOG_ERROR, "getBGRADataFromBitmap image is null ");

@@ -19,8 +19,8 @@ constexpr char kFaceInfoClass[] = "com/vantrel/faceapi/model/FaceInfo";
 constexpr int kPromisedReferences = 16;
 constexpr int kPromisedPoints = kPromisedReferences - 3;
 
-/// Everything that is looked up at load. What a failed look-up leaves null is deliberately used as it is by
-/// later conversions: the virtual machine has its say.
+/// Everything that is looked up at load. What a failed look-up leaves null is used as it is by later
+/// conversions (C12 in docs/compatibility.md): the virtual machine has its say.
 struct Registry {
   struct {
     jfieldID left, top, right, bottom;

@@ -50,7 +50,7 @@ jbyteArray kyFaceVerify(JNIEnv* env, jobject /*thiz*/, long long handle, const u
   pinned_status[0] = result;
   jbyteArray text = env->NewByteArray(serialized_size(length));
   if (text == nullptr) {
-    // The feature is deliberately not released on this path.
+    // The feature is not released on this path (C8).
     FACE_LOG(ANDROID_LOG_ERROR, "kyFaceVerify new Feature Failed !! maybe out of memory!!");
     return nullptr;
   }
@@ -94,7 +94,7 @@ JNIEXPORT jlong JNICALL Java_com_vantrel_faceapi_FaceLibrary_kyFaceCreateVerify(
   ky_handle_t handle = nullptr;
   const int result = ky_verify_create_handle(&handle, path.get());
   if (result != 0) {
-    // The path's characters are deliberately not released on this path.
+    // The path's characters are not released on this path (C6 in docs/compatibility.md).
     FACE_LOG(ANDROID_LOG_ERROR, "FaceCreateVerify create handle fail : %d", result);
     return 0;
   }
@@ -135,7 +135,7 @@ JNIEXPORT jfloat JNICALL Java_com_vantrel_faceapi_FaceLibrary_kyFaceCompareFeatu
   kyface::PinnedArray text1(env, feature1);
   kyface::PinnedArray text2(env, feature2);
   if (!text1 || !text2) {
-    // Where one of the two is pinned it deliberately stays so.
+    // Where one of the two is pinned it stays so (C9).
     text1.leave_pinned();
     text2.leave_pinned();
     FACE_LOG(ANDROID_LOG_ERROR, "ky_faceapi_KyFaceLibrary_kyFacCompareFeature feature is null");
@@ -143,7 +143,7 @@ JNIEXPORT jfloat JNICALL Java_com_vantrel_faceapi_FaceLibrary_kyFaceCompareFeatu
   }
   ky_feature_t engine_feature1 = ky_verify_deserialize_feature(text1.chars());
   ky_feature_t engine_feature2 = ky_verify_deserialize_feature(text2.chars());
-  float score;  // deliberately the engine's alone: after a failure it means nothing, and the status says so
+  float score;  // the engine's alone (C10): after a failure it means nothing, and the status says so
   const int result =
       ky_verify_compare_feature(kyface::to_handle(handle), engine_feature1, engine_feature2, &score);
   text1.release();

@@ -15,9 +15,9 @@ fail() {
   exit 1
 }
 
-# usage: prints the comment at the top of the script, from its second line on, and leaves.
+# usage: prints the comment at the top of the script, but for its licence, and leaves.
 usage() {
-  sed -n '2,${/^# shellcheck/q;/^#/!q;s/^# \{0,1\}//;p}' "$self"
+  sed -n '2,${/^# shellcheck/q;/^# SPDX-/d;/^#/!q;s/^# \{0,1\}//;p}' "$self"
   exit 0
 }
 

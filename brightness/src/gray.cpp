@@ -8,7 +8,7 @@ namespace {
 
 enum class Layout { kYUV, kBGRA, kRGBA };
 
-// Blue has the larger of the outer weights, deliberately: it is these levels that callers compare with.
+// Blue has the larger of the outer weights (C1 in docs/compatibility.md).
 constexpr uint8_t kBlueWeight = 77;
 constexpr uint8_t kGreenWeight = 150;
 constexpr uint8_t kRedWeight = 29;

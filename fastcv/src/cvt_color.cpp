@@ -33,8 +33,9 @@ bool sizesAgree(Family family, const Shape& src, const Shape& dst) {
     return family == Family::kPacked ? src.width == dst.width && src.height == dst.height
                                      : isPictureOf(dst.width, dst.height, src.width, src.height);
   }
-  // The rule of a conversion to 4:2:0 also judges, deliberately, the packed and the "from 4:2:0" images whose
-  // step is shorter than a row. As widths must be equal, it does not matter whose is tested for being even.
+  // The rule of a conversion to 4:2:0 also judges the packed and the "from 4:2:0" images whose step is
+  // shorter than a row (C13 in docs/compatibility.md). As widths must be equal, it does not matter whose is
+  // tested for being even.
   return isPictureOf(src.width, src.height, dst.width, dst.height);
 }
 

@@ -1,4 +1,4 @@
-// The native methods over the open engine: faces and features go through both. What a method deliberately
+// The native methods over the open engine: faces and features go through both. What a method
 // never gives back stays in the engine's tables; tests/leaks.supp says what that is.
 #include <gtest/gtest.h>
 

@@ -29,11 +29,11 @@
 KYFACE_EXPORT unsigned char calcGray_YUV(const unsigned char* data, int width, int widthStride, int height,
                                          int heightStride, int rectX, int rectY, int rectW, int rectH);
 
-/// Mean gray of B,G,R,A pixels: (77 B + 150 G + 29 R + 128) >> 8. Blue has the larger weight on purpose.
+/// Mean gray of B,G,R,A pixels: (77 B + 150 G + 29 R + 128) >> 8. Blue has the larger weight (C1).
 KYFACE_EXPORT unsigned char calcGray_BGRA(const unsigned char* data, int width, int widthStride, int height,
                                           int heightStride, int rectX, int rectY, int rectW, int rectH);
 
-/// Mean gray of R,G,B,A pixels: (77 B + 150 G + 29 R + 128) >> 8. Blue has the larger weight on purpose.
+/// Mean gray of R,G,B,A pixels: (77 B + 150 G + 29 R + 128) >> 8. Blue has the larger weight (C1).
 KYFACE_EXPORT unsigned char calcGray_RGBA(const unsigned char* data, int width, int widthStride, int height,
                                           int heightStride, int rectX, int rectY, int rectW, int rectH);
 

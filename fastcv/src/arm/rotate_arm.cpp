@@ -329,7 +329,7 @@ void armRotateNx90degree(int inHeight, int inWidth, int inWidthStride, const T* 
   // The texts are what the process ends with.
   KERNEL_ASSERT(arm::kRotatePath, inData != NULL);   // NOLINT(modernize-use-nullptr)
   KERNEL_ASSERT(arm::kRotatePath, outData != NULL);  // NOLINT(modernize-use-nullptr)
-  // The destination's stride is deliberately not looked at.
+  // The destination's stride is not looked at (C14).
   KERNEL_ASSERT(arm::kRotatePath,
                 inHeight != 0 && inWidth != 0 && inWidthStride != 0 && outHeight != 0 && outWidth != 0);
   if (degree == 90) {
