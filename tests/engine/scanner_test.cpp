@@ -9,8 +9,8 @@
 #include <random>
 #include <vector>
 
-#include "tests/support/guarded_image.h"
 #include "picture.h"
+#include "tests/support/guarded_image.h"
 
 namespace kyengine::test {
 namespace {
