@@ -12,8 +12,10 @@ else()
 endif()
 if(WAY STREQUAL "find_package")
   run(${CMAKE_COMMAND} --install ${BUILD} --component fastcv --prefix ${WORK}/installed)
-  # Nothing of the build is looked at.
-  list(APPEND options -Dfastcv_ROOT=${WORK}/installed -DCMAKE_FIND_ROOT_PATH_MODE_PACKAGE=BOTH)
+  # By its folder: a cross build looks for packages in the target's root alone. Nothing of the build is looked at.
+  file(GLOB_RECURSE config ${WORK}/installed/fastcvConfig.cmake)
+  cmake_path(GET config PARENT_PATH folder)
+  list(APPEND options -Dfastcv_DIR=${folder})
 endif()
 run(${CMAKE_COMMAND} -S ${CONSUMER} -B ${WORK}/build ${options})
 run(${CMAKE_COMMAND} --build ${WORK}/build --target consumer)
