@@ -15,6 +15,13 @@ public final class FaceVerifier implements AutoCloseable {
     /** The most landmark points that a face may have. */
     public static final int MAX_POINTS = 256;
 
+    /**
+     * The recommended threshold of the open engine: faces at least as alike are taken for one person's. What that means
+     * depends on the model: with a descriptor's {@code docs/verification.md} has the rates of error, without a model it
+     * tells a face in another frame from something else and says next to nothing about persons.
+     */
+    public static final float RECOMMENDED_THRESHOLD = EngineValues.VERIFY_THRESHOLD;
+
     /** What the status holds where native code did not write it. */
     private static final int NOT_WRITTEN = FaceEngineException.UNKNOWN_CODE;
 
@@ -175,7 +182,7 @@ public final class FaceVerifier implements AutoCloseable {
     }
 
     /**
-     * Compares two features.
+     * Compares two features. Who compares one with many decodes each once, as a {@link Feature}.
      *
      * @param feature1 a feature of this verifier's version; copied first, so that other threads may write it
      * @param feature2 the other; copied too

@@ -39,6 +39,11 @@ final class Picture {
         return pixels[y * width + x];
     }
 
+    /** The pixels as 0xAARRGGBB, alpha being anything; not a copy. */
+    int[] argb() {
+        return pixels;
+    }
+
     /** The picture with every {@code factor x factor} block averaged to one pixel; what is left at the edges goes. */
     Picture reduced(int factor) {
         int w = width / factor;
