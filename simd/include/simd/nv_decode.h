@@ -257,6 +257,18 @@ class RowPairReader {
   const unsigned char* second_;
 };
 
+/// Asks for the memory of a block that will be written some turns later. On x86-64 that takes up to a third
+/// of the time away where a picture is beyond the second-level cache, and costs nothing where it is in it.
+/// Arm's cores write whole lines without reading them first, which asking for them would undo.
+TILE_INLINE void expectStores([[maybe_unused]] const unsigned char* out) {
+#if !defined(__ARM_NEON)
+  constexpr ptrdiff_t kAhead = 2048;
+  constexpr ptrdiff_t kLine = 64;
+  __builtin_prefetch(out + kAhead, 1);
+  __builtin_prefetch(out + kAhead + kLine, 1);
+#endif
+}
+
 /// Decodes `width` columns, even and at least kDecodeColumns, of a row pair; the last block is flush with
 /// the row's end. With `mirrored` the first column becomes the last. Inlined, so that the decoder is
 /// registers.
@@ -270,6 +282,8 @@ TILE_INLINE void decodeRowPair(const ColourDecoder<nc, swapped>& decoder, const 
     for (; blocks != 0; --blocks) {
       decoder.decode([&](int row, int half) TILE_LAMBDA { return from.luma(row, half); }, from.chroma(), out,
                      16 * nc);
+      expectStores(out[0]);
+      expectStores(out[1]);
       from.next();
     }
   };
