@@ -52,10 +52,11 @@ std::shared_ptr<T> samples(size_t count, Range range = {0, sizeof(T) == 1 ? 255.
   // Random samples that are repeated, at a distance that fits no picture.
   constexpr size_t kPeriod = 65521;
   const size_t total = count + kSlack;
-  T* memory = static_cast<T*>(std::aligned_alloc(kPage, (total * sizeof(T) + kPage - 1) / kPage * kPage));
-  if (memory == nullptr) {
+  void* allocated = nullptr;
+  if (posix_memalign(&allocated, kPage, total * sizeof(T)) != 0) {
     throw std::bad_alloc();
   }
+  T* memory = static_cast<T*>(allocated);
   unsigned state = 1;
   for (size_t i = 0; i < std::min(total, kPeriod); ++i) {
     state = state * 1664525 + 1013904223;

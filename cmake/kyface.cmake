@@ -25,12 +25,24 @@ if(kyface_instrumented)
   add_compile_options($<$<COMPILE_LANG_AND_ID:CXX,Clang>:-Wno-pass-failed>)
 endif()
 
+# Systems with pages of 16 KB load nothing that is aligned to less.
+add_link_options(-Wl,-z,max-page-size=16384)
+
+# Programs for Android are run by a script, on a device or by what takes the place of one, and find their libraries by
+# what it tells the loader.
+if(ANDROID)
+  set(CMAKE_CROSSCOMPILING_EMULATOR ${PROJECT_SOURCE_DIR}/scripts/device run ${ANDROID_ABI} ${PROJECT_BINARY_DIR})
+  set(CMAKE_SKIP_BUILD_RPATH ON)
+endif()
+
 # What every target of the project is compiled with. Warnings are errors where this project is what is built; for who
-# builds it as a part, a new compiler's new warning is none of their business.
+# builds it as a part, a new compiler's new warning is none of their business. NDKs bring compilers of many releases: there
+# only the library's own sources must please them.
 option(KYFACE_WERROR "Treat warnings as errors" ${PROJECT_IS_TOP_LEVEL})
+set(kyface_werror $<$<BOOL:${KYFACE_WERROR}>:-Werror>)
 add_library(kyface_warnings INTERFACE)
 target_compile_options(kyface_warnings INTERFACE -Wall -Wextra -Wpedantic -Wshadow -Wcast-qual -Wvla
-                                                 $<$<BOOL:${KYFACE_WERROR}>:-Werror>)
+                                                 $<$<NOT:$<BOOL:${ANDROID}>>:${kyface_werror}>)
 
 # The arithmetic that everything here is compiled to, tests included. On x86-64 the NEON intrinsics compile through
 # SIMDe, and FMA keeps their fused multiply-adds fused. Contraction is off so that only the written fused multiply-adds
@@ -44,9 +56,16 @@ endif()
 
 # What the shipped library is compiled with.
 add_library(kyface_options INTERFACE)
-target_compile_options(kyface_options INTERFACE $<$<COMPILE_LANGUAGE:CXX>:-fno-exceptions -fno-rtti
+target_compile_options(kyface_options INTERFACE ${kyface_werror} $<$<COMPILE_LANGUAGE:CXX>:-fno-exceptions -fno-rtti
                                                 -fvisibility-inlines-hidden> -fvisibility=hidden)
 target_link_libraries(kyface_options INTERFACE kyface_warnings kyface_arithmetic kyface_coverage)
+# It names no folder of the machine that it was built on: the same sources give the same bytes everywhere.
+if(NOT kyface_instrumented)
+  target_compile_options(kyface_options INTERFACE -ffile-prefix-map=${PROJECT_SOURCE_DIR}/=)
+  if(ANDROID)
+    target_compile_options(kyface_options INTERFACE -ffile-prefix-map=${KYFACE_NDK}=ndk)
+  endif()
+endif()
 
 # Hardening of a shared library: read-only relocations, everything bound at load, nothing left undefined.
 add_library(kyface_link INTERFACE)
@@ -54,9 +73,6 @@ target_link_options(kyface_link INTERFACE -Wl,-z,relro -Wl,-z,now -Wl,--build-id
 if(NOT KYFACE_SANITIZE)
   # With clang the checks' run-time is in the program alone.
   target_link_options(kyface_link INTERFACE -Wl,-z,defs)
-endif()
-if(CMAKE_SYSTEM_PROCESSOR MATCHES "aarch64|arm64|ARM64")
-  target_link_options(kyface_link INTERFACE -Wl,-z,max-page-size=16384)
 endif()
 
 # The JNI headers. They hold nothing of an architecture, so a cross build takes them from this machine's JDK.

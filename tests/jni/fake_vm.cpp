@@ -23,8 +23,7 @@ std::string class_title(const std::string& class_name) {
 
 /// Stands in for a function that the bridge has no business to call. `member` tells functions of one type
 /// apart.
-template <auto member,
-          typename Function = std::decay_t<decltype(std::declval<JNINativeInterface_>().*member)>>
+template <auto member, typename Function = std::decay_t<decltype(std::declval<JniFunctions>().*member)>>
 struct Unexpected;
 
 template <auto member, typename Result, typename... Arguments>
@@ -298,11 +297,11 @@ struct Functions {
 
 namespace {
 
-JNINativeInterface_ makeFunctions() {
-  JNINativeInterface_ table = {};
-#define KY_UNEXPECTED(function)                                 \
-  Unexpected<&JNINativeInterface_::function>::name = #function; \
-  table.function = Unexpected<&JNINativeInterface_::function>::call;
+JniFunctions makeFunctions() {
+  JniFunctions table = {};
+#define KY_UNEXPECTED(function)                          \
+  Unexpected<&JniFunctions::function>::name = #function; \
+  table.function = Unexpected<&JniFunctions::function>::call;
   KY_JNI_FUNCTIONS(KY_UNEXPECTED)
 #undef KY_UNEXPECTED
   // All but the four reserved entries are set: whatever the bridge calls, the test says which it was.
@@ -342,8 +341,8 @@ JNINativeInterface_ makeFunctions() {
   return table;
 }
 
-JNIInvokeInterface_ makeInvokeFunctions() {
-  JNIInvokeInterface_ table = {};
+JniInvokeFunctions makeInvokeFunctions() {
+  JniInvokeFunctions table = {};
   table.GetEnv = Functions::GetEnv;
   return table;
 }
@@ -352,8 +351,8 @@ JNIInvokeInterface_ makeInvokeFunctions() {
 
 Vm::Vm() {
   // Shared by the machines of all threads.
-  static const JNINativeInterface_ functions = makeFunctions();
-  static const JNIInvokeInterface_ invokeFunctions = makeInvokeFunctions();
+  static const JniFunctions functions = makeFunctions();
+  static const JniInvokeFunctions invokeFunctions = makeInvokeFunctions();
   env_.functions = &functions;
   env_.vm = this;
   invoke_.functions = &invokeFunctions;

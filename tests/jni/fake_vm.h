@@ -100,10 +100,10 @@ class Vm {
   struct Class {
     std::vector<std::string> members;  // "name:signature"
   };
-  struct Env : JNIEnv_ {
+  struct Env : JNIEnv {
     Vm* vm;
   };
-  struct Invoke : JavaVM_ {
+  struct Invoke : JavaVM {
     Vm* vm;
   };
 

@@ -19,11 +19,12 @@ struct {
 
 }  // namespace
 
-extern "C" void* memalign(size_t alignment, size_t size) noexcept {
+extern "C" void* memalign(size_t alignment, size_t size) noexcept(noexcept(memalign(64, 64))) {
   heap.alignment = alignment;
   heap.size = size;
   ++heap.calls;
-  return heap.refuse ? nullptr : aligned_alloc(alignment, size);
+  void* memory = nullptr;
+  return !heap.refuse && posix_memalign(&memory, alignment, size) == 0 ? memory : nullptr;
 }
 
 namespace {

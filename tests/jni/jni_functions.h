@@ -4,6 +4,13 @@
 
 #include <jni.h>
 
+#include <type_traits>
+
+/// The tables of functions behind a JNIEnv and a JavaVM, which the JDK's header and Android's name
+/// differently.
+using JniFunctions = std::remove_const_t<std::remove_pointer_t<decltype(JNIEnv::functions)>>;
+using JniInvokeFunctions = std::remove_const_t<std::remove_pointer_t<decltype(JavaVM::functions)>>;
+
 // clang-format does not come to rest over these lists.
 // clang-format off
 #define KY_JNI_PRIMITIVES(X, Y) \

@@ -2,6 +2,7 @@
 #pragma once
 
 #include <sys/mman.h>
+#include <sys/syscall.h>
 #include <unistd.h>
 
 #include <cstddef>
@@ -53,7 +54,8 @@ class RepeatedMemory {
 
  private:
   static int file(size_t bytes) {
-    const int file = memfd_create("repeated", 0);
+    // Android's C library has no function for it at the level that is built for.
+    const int file = static_cast<int>(syscall(SYS_memfd_create, "repeated", 0));
     if (file < 0 || ftruncate(file, static_cast<off_t>(bytes)) != 0) {
       abort();
     }
