@@ -249,19 +249,6 @@ ky_face_t java_face_to_ky_face_t(JNIEnv* env, jobject face) {
 
 extern "C" {
 
-JNIEXPORT jint JNICALL JNI_OnLoad(JavaVM* vm, void* /*reserved*/) {
-  JNIEnv* env = nullptr;
-  if (vm->GetEnv(reinterpret_cast<void**>(&env), JNI_VERSION_1_6) != JNI_OK) {
-    return JNI_ERR;
-  }
-  if (register_face_fields(env) < 0) {
-    // A virtual machine that finds the look-up's exception pending after this call refuses to load the
-    // library; an incomplete registry must not prevent the use of everything that needs no Java class.
-    env->ExceptionClear();
-  }
-  return JNI_VERSION_1_6;
-}
-
 JNIEXPORT void JNICALL Java_com_vantrel_faceapi_FaceLibrary_setDebug(JNIEnv* /*env*/, jobject /*thiz*/,
                                                                      jboolean debug) {
   kyface::debug_switch.store(debug != JNI_FALSE ? 1 : 0, std::memory_order_relaxed);

@@ -1,4 +1,4 @@
-"""Looks at the built shared library: what it exports, what it needs, how it is laid out."""
+"""Looks at the built shared library: what it exports, what it needs and imports, how it is laid out."""
 
 import argparse
 import re
@@ -9,13 +9,24 @@ from pathlib import Path
 JNI_PREFIX = "Java_com_vantrel_faceapi_"
 PAGE = 16384
 NEEDED = {"liblog.so", "libjnigraphics.so", "libkyface_api.so"}
-# What the compiler and the C library bring along.
-PLATFORM = re.compile(r"lib(c|m|stdc\+\+|gcc_s)\.so\.\d+|ld-linux-[\w-]+\.so\.\d+")
+# What the compiler and the C library bring along: on Linux, and on Android.
+LINUX = re.compile(r"lib(c|m|stdc\+\+|gcc_s)\.so\.\d+|ld-linux-[\w-]+\.so\.\d+")
+ANDROID = re.compile(r"lib(c|m|dl)\.so")
+# The functions of the face engine, which the app brings along.
+ENGINE_PREFIX = "ky_"
 
 
 def output(*command):
     return subprocess.run(command, stdout=subprocess.PIPE, text=True, check=True).stdout
 
+
+def dynamic_symbols(arguments, library, *options):
+    lines = output(arguments.nm, "-D", *options, library).splitlines()
+    return {line.split()[-1].split("@")[0] for line in lines if line.strip()}
+
+
+def needed_libraries(dynamic):
+    return set(re.findall(r"\(NEEDED\).*\[(.*)\]", dynamic))
 
 
 def intended(arguments):
@@ -27,8 +38,7 @@ def intended(arguments):
 
 
 def check_exports(arguments):
-    exported = {line.split()[-1].split("@")[0] for line in
-                output(arguments.nm, "-D", "--defined-only", arguments.library).splitlines()}
+    exported = dynamic_symbols(arguments, arguments.library, "--defined-only")
     wanted = intended(arguments)
     print(f"{len(exported)} exported, {len(wanted)} intended")
     if len(wanted) < 100:
@@ -41,18 +51,36 @@ def check_exports(arguments):
 
 def check_needed(arguments):
     dynamic = output(arguments.readelf, "-d", arguments.library)
-    needed = set(re.findall(r"\(NEEDED\).*\[(.*)\]", dynamic))
+    needed = needed_libraries(dynamic)
+    platform = ANDROID if arguments.android else LINUX
     print("needs " + ", ".join(sorted(needed)))
     for name in sorted(NEEDED - needed):
         yield f"does not need {name}"
     for name in sorted(needed - NEEDED):
-        if not PLATFORM.fullmatch(name):
+        if not platform.fullmatch(name):
             yield f"needs {name}"
     if re.findall(r"\(SONAME\).*\[(.*)\]", dynamic) != ["libjni_kyface_api.so"]:
         yield "has another name than libjni_kyface_api.so"
     for path in re.findall(r"\((?:RPATH|RUNPATH)\).*\[(.*)\]", dynamic):
-        if path != "$ORIGIN":
+        if arguments.android or path != "$ORIGIN":
             yield f"looks for libraries in {path}"
+
+
+def check_imports(arguments):
+    """Weak imports are left out: they may be missing."""
+    imported = dynamic_symbols(arguments, arguments.library, "--undefined-only", "--no-weak")
+    known = {line for line in Path(arguments.imports).read_text().splitlines() if line and not line.startswith("#")}
+    if arguments.system:
+        for name in needed_libraries(output(arguments.readelf, "-d", arguments.library)):
+            stub = Path(arguments.system) / name
+            if stub.exists():
+                known |= dynamic_symbols(arguments, stub, "--defined-only")
+    print(f"{len(imported)} imported")
+    if not imported:
+        yield "no imports were found"
+    for name in sorted(imported - known):
+        if not name.startswith(ENGINE_PREFIX):
+            yield f"imports what Android may lack: {name}"
 
 
 def check_layout(arguments):
@@ -66,7 +94,7 @@ def check_layout(arguments):
     if not loads:
         yield "no segments were found"
     for _, (offset, address, *_), flags, align in loads:
-        if arguments.aarch64 and (align % PAGE != 0 or (address - offset) % PAGE != 0):
+        if align % PAGE != 0 or (address - offset) % PAGE != 0:
             yield f"a segment is not aligned to {PAGE} bytes"
         if "W" in flags and "E" in flags:
             yield "a segment is writable and executable"
@@ -80,7 +108,7 @@ def check_layout(arguments):
         yield "does not bind everything when it is loaded"
 
 
-CHECKS = {"exports": check_exports, "needed": check_needed, "layout": check_layout}
+CHECKS = {"exports": check_exports, "needed": check_needed, "imports": check_imports, "layout": check_layout}
 
 
 def main():
@@ -91,7 +119,10 @@ def main():
     parser.add_argument("--readelf", required=True)
     parser.add_argument("--intended", help="the object of intended_exports.cpp")
     parser.add_argument("--java", nargs="+", help="the sources of the Java classes")
-    parser.add_argument("--aarch64", action="store_true", help="the library is one of 64-bit Arm")
+    parser.add_argument("--android", action="store_true", help="the library is one for Android")
+    parser.add_argument("--imports", help="the list of what the library may import")
+    parser.add_argument("--system", help="the folder of an NDK's stand-ins for the system's libraries, whose symbols may "
+                                         "be imported too")
     arguments = parser.parse_args()
     findings = list(CHECKS[arguments.check](arguments))
     print(*findings, sep="\n", end="\n" if findings else "")

@@ -31,7 +31,7 @@ import com.vantrel.faceapi.model.FaceInfo;
  */
 public final class FaceLibrary {
     static {
-        System.loadLibrary("jni_kyface_api");
+        NativeLibrary.load();
     }
 
     private FaceLibrary() {}

@@ -35,7 +35,7 @@ final class PlaneConversion {
     private static final int DIRECT = PLANES + 3 * PLANE_NUMBERS;
 
     static {
-        System.loadLibrary("jni_kyface_api");
+        NativeLibrary.load();
     }
 
     private PlaneConversion() {}
