@@ -33,9 +33,13 @@ std::vector<Operation> operationsMatching(const std::string& pattern, [[maybe_un
   std::vector<Operation> operations;
   addFastcv(operations);
   addPlanes(operations);
-#ifdef BENCH_PEERS
+#ifdef BENCH_LIBYUV
   if (!own) {
     addLibyuv(operations);
+  }
+#endif
+#ifdef BENCH_OPENCV
+  if (!own) {
     addOpencv(operations);
   }
 #endif

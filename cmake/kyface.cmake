@@ -59,12 +59,11 @@ add_library(kyface_options INTERFACE)
 target_compile_options(kyface_options INTERFACE ${kyface_werror} $<$<COMPILE_LANGUAGE:CXX>:-fno-exceptions -fno-rtti
                                                 -fvisibility-inlines-hidden> -fvisibility=hidden)
 target_link_libraries(kyface_options INTERFACE kyface_warnings kyface_arithmetic kyface_coverage)
-# It names no folder of the machine that it was built on: the same sources give the same bytes everywhere.
-if(NOT kyface_instrumented)
-  target_compile_options(kyface_options INTERFACE -ffile-prefix-map=${PROJECT_SOURCE_DIR}/=)
-  if(ANDROID)
-    target_compile_options(kyface_options INTERFACE -ffile-prefix-map=${KYFACE_NDK}=ndk)
-  endif()
+if(ANDROID)
+  # What an NDK's compiler notes for a debugger names no folder of the machine that it ran on: the same sources give the
+  # same bytes everywhere.
+  target_compile_options(kyface_options INTERFACE -ffile-prefix-map=${PROJECT_SOURCE_DIR}/=
+                                                  -ffile-prefix-map=${KYFACE_NDK}=ndk)
 endif()
 
 # Hardening of a shared library: read-only relocations, everything bound at load, nothing left undefined.

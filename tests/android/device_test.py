@@ -45,6 +45,10 @@ GETPROP = """#!/bin/sh
 case $1 in
   ro.product.cpu.abilist) printf '%s\\r\\n' "$(cat @fake@/abis)" ;;
   ro.build.version.sdk) cat @fake@/level ;;
+  ro.product.manufacturer) echo Maker ;;
+  ro.product.model) echo Phone ;;
+  ro.soc.model) echo Chip ;;
+  ro.build.version.release) echo 14 ;;
 esac
 """
 
@@ -248,7 +252,9 @@ echo "cmake $*" >>@log@
 mkdir -p build/$2/bin build/$2/lib build/$2/Testing/Temporary
 echo CMAKE_STRIP:FILEPATH=/bin/false >build/$2/CMakeCache.txt
 printf '#!/bin/sh\\necho "it runs in $(pwd)"\\nexit @status@\\n' >build/$2/bin/probe_test
-chmod +x build/$2/bin/probe_test
+printf '#!/bin/sh\\necho "asked: $*" >&2\\nprintf "core\\\\tonly\\\\t0\\\\t0\\\\ncounters\\\\tEPERM\\\\n"\\n' >build/$2/bin/bench_phone
+printf 'printf "result\\\\tgray\\\\tfastcv\\\\t8x8\\\\t4\\\\t0\\\\t0.5\\\\t-\\\\t-\\\\n"\\n' >>build/$2/bin/bench_phone
+chmod +x build/$2/bin/*
 """
 CTEST = """#!/bin/bash
 echo "ctest $*" >>@log@
@@ -265,7 +271,7 @@ class Scripts(WithDevice):
     def setUp(self):
         super().setUp()
         self.project = work / "project"
-        for folder in ("scripts", ".ci", "fuzz/corpus/metrics"):
+        for folder in ("scripts", ".ci", "bench/tool", "fuzz/corpus/metrics"):
             shutil.copytree(ROOT / folder, self.project / folder)
         write(self.project / "scripts/setup.sh", "#!/bin/sh\n")
         self.log = work / "log"
@@ -328,6 +334,35 @@ class Scripts(WithDevice):
         self.assertEqual(status, 0)
         self.assertIn("runner: arm64-v8a ", output)
         self.assertFalse((self.fake / "calls").exists())
+
+    def test_bench_measures_the_device(self):
+        status, output, errors = self.script("scripts/bench", "--android", "gray", "--size", "8x8",
+                                             ANDROID_NDK_HOME=self.ndk)
+        self.assertEqual(status, 0, errors)
+        self.assertIn("asked: 20 gray 8x8\n", errors)
+        self.assertIn("Maker Phone (Chip) Android 14\nonly core (number 0)\n"
+                      "  cycles and instructions are not counted there (EPERM);", output)
+        self.assertRegex(output, r"\ngray +0\.500\n")
+        self.assertEqual(self.left(), [])
+
+    def test_bench_through_the_runner_only_runs(self):
+        write(work / "runner", "#!/bin/sh\nshift\nexec \"$@\"\n")
+        status, output, errors = self.script("scripts/bench", "--android", ANDROID_NDK_HOME=self.ndk,
+                                             KYFACE_ANDROID_RUN=work / "runner")
+        self.assertEqual(status, 0, errors)
+        self.assertIn("asked: 0 . 1280x720 1278x718\n", errors)
+        self.assertEqual(output, "bench_phone runs: 1 results; through KYFACE_ANDROID_RUN they are no measurements\n")
+
+    def test_bench_says_what_is_missing(self):
+        self.attach()
+        status, output, errors = self.script("scripts/bench", "--android", ANDROID_NDK_HOME=self.ndk)
+        self.assertEqual((status, output), (1, ""))
+        self.assertEqual(errors, "bench: no device is attached: attach one, or set KYFACE_ANDROID_RUN to a command that "
+                                 "runs programs\n")
+        self.attach("one\tdevice")
+        status, output, errors = self.script("scripts/bench", "--android")
+        self.assertEqual((status, output), (1, ""))
+        self.assertEqual(errors, "bench: building for Android takes an NDK: set ANDROID_NDK_HOME to its folder\n")
 
     def ci(self, *arguments, **environment):
         write(self.project / "scripts/test", "#!/bin/sh\necho \"test $*\"\n")

@@ -5,7 +5,7 @@ import unittest
 
 sys.path.insert(0, sys.argv.pop(1))
 
-from tool import model, record, table  # noqa: E402  (found through the line above)
+from tool import model, phone, record, table  # noqa: E402  (found through the line above)
 from tool.counting import Block, CallCount, Count, Key, Time  # noqa: E402
 
 SIZE, ODD_SIZE = "1280x720", "1278x718"
@@ -137,6 +137,30 @@ class Tables(unittest.TestCase):
         small = table.Figures(["10x10"], {key: count_of(1.7)}, {key: {"A55": 2, "N1": 1}}, {}, {}, {})
         (row,) = table.small_call_table(small, "10x10", self.figures()).rows
         self.assertEqual(row, ["gray", "170", "100", "200", "100"])
+
+
+class Phone(unittest.TestCase):
+    TEXT = ("core\tsmall\t0\t1800000\ncounters\tyes\n"
+            "result\tgray\tfastcv\t8x8\t4\t0\t0.5\t0.9\t0.7\n"
+            "result\tgray\tlibyuv\t8x8\t4\t0\t0.6\t1\t0.8\n"
+            "result\tfloor4.000000\tmemcpy\t8x8\t4\t0\t0.25\t-\t-\n"
+            "core\tbig\t7\t0\ncounters\tPermission denied\n"
+            "result\tgray\tfastcv\t8x8\t4\t7\t0.125\t-\t-\n")
+
+    def test_every_core_has_its_columns(self):
+        result = phone.table(phone.parsed(self.TEXT), "8x8")
+        self.assertEqual(result.names, ["operation", "small ns", "small cycles", "small instructions", "small libyuv ns",
+                                        "small memcpy ns", "big ns"])
+        self.assertEqual(result.rows, [["gray", "0.500", "0.900", "0.700", "0.600", "0.250", "0.125"]])
+
+    def test_cores_say_what_they_are(self):
+        small, big = phone.parsed(self.TEXT).cores
+        self.assertEqual(small.title, "small core (number 0, 1.80 GHz)")
+        self.assertEqual((big.title, big.counters), ("big core (number 7)", "Permission denied"))
+
+    def test_no_results_are_an_error(self):
+        with self.assertRaises(ValueError):
+            phone.parsed("core\tonly\t0\t0\n")
 
 
 if __name__ == "__main__":

@@ -22,7 +22,7 @@ final class PixelConversion {
     private static final int CHANGED = -3;
 
     static {
-        System.loadLibrary("jni_kyface_api");
+        NativeLibrary.load();
     }
 
     private PixelConversion() {}
