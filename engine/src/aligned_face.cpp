@@ -146,7 +146,7 @@ std::vector<uint8_t> AlignedFace(const Frame& frame, const Eyes& eyes, int side)
         }
       }
       for (const float colour : sum) {
-        picture.push_back(static_cast<uint8_t>(colour / places + 0.5F));
+        picture.push_back(static_cast<uint8_t>(std::lround(colour / places)));
       }
     }
   }
