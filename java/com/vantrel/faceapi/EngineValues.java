@@ -54,7 +54,7 @@ public final class EngineValues {
     public static final int MAX_FRAME_SIDE = 8192;
 
     /** The detection threshold of a new detector; a face counts when its score, 0 to 1, exceeds the threshold. */
-    public static final float DEFAULT_THRESHOLD = 0.6f;
+    public static final float DEFAULT_THRESHOLD = 0.55f;
     /** The lowest detection threshold. */
     public static final float MIN_THRESHOLD = 0.01f;
     /** The highest detection threshold; nothing passes it. */

@@ -13,7 +13,8 @@ import java.security.MessageDigest;
 import java.security.NoSuchAlgorithmException;
 
 /**
- * A photograph goes in as an NV21 camera frame, the faces in it come out: {@code Demo <picture> <output folder>}.
+ * A photograph goes in as an NV21 camera frame, the faces in it come out: {@code Demo <picture> <output folder>
+ * [landmark model]}. With a landmark model faces have points, a pose and a distance of their eyes.
  *
  * <p>Exit status: 0 when a face was found, 1 when none was, 2 when the arguments or the picture cannot be used, 3 when
  * the engine or the output fails.
@@ -29,14 +30,14 @@ public final class Demo {
     }
 
     private static int run(String[] args) {
-        if (args.length != 2) {
-            return stop(2, "Give a picture and a folder for the results.");
+        if (args.length != 2 && args.length != 3) {
+            return stop(2, "Give a picture, a folder for the results and, if there is one, a landmark model.");
         }
         File picture = new File(args[0]);
         File folder = new File(args[1]);
         try {
             Files.createDirectories(folder.toPath());
-            return detect(picture, folder);
+            return detect(picture, folder, args.length > 2 ? args[2] : null);
         } catch (UnusablePicture unusable) {
             return stop(2, unusable.getMessage());
         } catch (IOException failed) {
@@ -49,7 +50,7 @@ public final class Demo {
         return status;
     }
 
-    private static int detect(File file, File folder) throws UnusablePicture, IOException {
+    private static int detect(File file, File folder, String landmarks) throws UnusablePicture, IOException {
         Stopwatch time = new Stopwatch();
         Picture picture = Picture.read(file);
         time.stage("read the picture");
@@ -58,7 +59,7 @@ public final class Demo {
         time.stage("lay it into the frame");
 
         FaceLibrary.setDebug(false);
-        long detector = FaceLibrary.kyFaceCreateDetector(null, 0);
+        long detector = FaceLibrary.kyFaceCreateDetector(landmarks, EngineValues.CONFIG_DEFAULT);
         time.stage("create the detector");
         if (detector == 0) {
             return stop(3, "The engine could not create a detector.");
@@ -93,11 +94,13 @@ public final class Demo {
         System.out.println("frame sha-256 " + sha256(nv21));
         System.out.printf("status %d, %d face%s, drawn in %s%n%n", status[0], faces.length, faces.length == 1 ? "" : "s",
                 output);
-        System.out.printf("%-4s  %-24s  %-24s  %8s  %9s%n", "face", "in the frame", "in the picture", "score",
-                "landmarks");
+        System.out.printf("%-4s  %-24s  %-24s  %8s  %9s  %6s  %6s  %6s  %9s%n", "face", "in the frame", "in the picture",
+                "score", "landmarks", "yaw", "pitch", "roll", "eyes, px");
         for (int i = 0; i < faces.length; i++) {
-            System.out.printf("%-4d  %-24s  %-24s  %8.3f  %9d%n", i + 1, text(faces[i].faceRect),
-                    text(view.toPicture(faces[i].faceRect)), faces[i].score, faces[i].facePoints.length);
+            FaceInfo face = faces[i];
+            System.out.printf("%-4d  %-24s  %-24s  %8.3f  %9d  %6.1f  %6.1f  %6.1f  %9.1f%n", i + 1, text(face.faceRect),
+                    text(view.toPicture(face.faceRect)), face.score, face.facePoints.length, face.yaw, face.pitch,
+                    face.roll, face.eyeDist);
         }
         System.out.println();
         time.print();
@@ -113,7 +116,7 @@ public final class Demo {
         System.out.println("cut out of the frame in " + crop + ", the frame turned by right angles in " + turned);
         System.out.println();
 
-        MovingScene scene = new MovingScene(picture, view.toPicture(faces[0].faceRect), WIDTH, HEIGHT);
+        MovingScene scene = new MovingScene(picture, view.toPicture(faces[0].faceRect), WIDTH, HEIGHT, landmarks);
         return scene.run(new File(folder, "track.png")) ? 0 : stop(3, "The engine failed while it tracked.");
     }
 

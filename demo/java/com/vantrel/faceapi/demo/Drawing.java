@@ -8,6 +8,7 @@ import java.awt.Color;
 import java.awt.Graphics2D;
 import java.awt.RenderingHints;
 import java.awt.geom.Ellipse2D;
+import java.awt.geom.Line2D;
 import java.awt.image.BufferedImage;
 import java.io.File;
 import java.io.IOException;
@@ -41,18 +42,36 @@ final class Drawing {
         return image;
     }
 
-    /** Draws the rectangle and the landmarks of each face. */
+    /** Draws the rectangle and the landmarks of each face, and from the tip of its nose an arrow to where it looks. */
     static void faces(BufferedImage image, FaceInfo[] faces) {
         Graphics2D g = image.createGraphics();
         g.setRenderingHint(RenderingHints.KEY_ANTIALIASING, RenderingHints.VALUE_ANTIALIAS_ON);
         for (FaceInfo face : faces) {
             outline(g, face, new Color(0, 0, 0, 160), 5);
             outline(g, face, new Color(80, 255, 120), 2.5f);
+            float size = Math.max(1.6f, face.faceRect.width() / 40f);
             for (PointF point : face.facePoints) {
-                g.fill(new Ellipse2D.Float(point.x - 2, point.y - 2, 4, 4));
+                g.fill(new Ellipse2D.Float(point.x - size / 2, point.y - size / 2, size, size));
+            }
+            if (face.facePoints.length > NOSE) {
+                arrow(g, face);
             }
         }
         g.dispose();
+    }
+
+    /** The tip of the nose among 68 points. */
+    private static final int NOSE = 30;
+
+    /** As long as the eyes are apart when the face looks to a side; a face that looks straight ahead has none. */
+    private static void arrow(Graphics2D g, FaceInfo face) {
+        PointF nose = face.facePoints[NOSE];
+        double x = nose.x + face.eyeDist * StrictMath.sin(Math.toRadians(face.yaw));
+        double y = nose.y + face.eyeDist * StrictMath.sin(Math.toRadians(face.pitch));
+        g.setColor(new Color(255, 220, 60));
+        g.setStroke(new BasicStroke(2.5f, BasicStroke.CAP_ROUND, BasicStroke.JOIN_ROUND));
+        g.draw(new Line2D.Double(nose.x, nose.y, x, y));
+        g.fill(new Ellipse2D.Double(x - 3, y - 3, 6, 6));
     }
 
     private static void outline(Graphics2D g, FaceInfo face, Color color, float thickness) {

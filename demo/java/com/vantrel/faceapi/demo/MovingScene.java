@@ -4,6 +4,7 @@ import android.graphics.Bitmap;
 import android.graphics.PointF;
 import android.graphics.Rect;
 import com.vantrel.faceapi.CameraFrame;
+import com.vantrel.faceapi.EngineValues;
 import com.vantrel.faceapi.FaceEngineException;
 import com.vantrel.faceapi.FaceLibrary;
 import com.vantrel.faceapi.FaceTracker;
@@ -31,6 +32,7 @@ final class MovingScene {
     private static final int SHRINK = 3;
 
     private final Picture picture;
+    private final String landmarks; // a model, or null
     private final double faceX;
     private final double faceY;
     private final int width;
@@ -56,7 +58,8 @@ final class MovingScene {
      * @param face the face to be kept in view, in the picture's coordinates
      * @param width width of the frames in pixels
      */
-    MovingScene(Picture picture, Rect face, int width, int height) {
+    MovingScene(Picture picture, Rect face, int width, int height, String landmarks) {
+        this.landmarks = landmarks;
         this.picture = picture;
         this.faceX = (face.left + face.right) / 2.0;
         this.faceY = (face.top + face.bottom) / 2.0;
@@ -84,7 +87,7 @@ final class MovingScene {
         FaceLibrary.setDebug(false);
         try {
             PhoneCamera camera = new PhoneCamera(width, height);
-            try (FaceTracker tracker = new FaceTracker()) {
+            try (FaceTracker tracker = new FaceTracker(landmarks, EngineValues.CONFIG_DEFAULT)) {
                 tracker.setDetectInterval(DETECT_INTERVAL);
                 for (int number = 0; number < FRAMES; number++) {
                     track(camera, tracker, number);

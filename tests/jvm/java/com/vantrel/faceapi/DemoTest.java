@@ -29,7 +29,8 @@ public class DemoTest {
     @Rule public final TemporaryFolder folder = new TemporaryFolder();
 
     private Child demo(File picture) throws IOException, InterruptedException {
-        Child child = Child.run(Demo.class, picture.getPath(), new File(folder.getRoot(), "out").getPath());
+        Child child = Child.run(Demo.class, picture.getPath(), new File(folder.getRoot(), "out").getPath(),
+                System.getProperty("kyface.landmarks"));
         assertFalse(child.output, child.output.contains("in native method"));
         return child;
     }
@@ -53,6 +54,14 @@ public class DemoTest {
         }
         Rect found = new Rect(edges[0], edges[1], edges[2], edges[3]);
         assertTrue(found.toString(), Portrait.overlap(found, FACE) >= 0.5);
+
+        // Score, points, yaw, pitch, roll, and the eyes' distance: the face looks at the viewer, tilted a little.
+        Matcher pose = find(child.output, "\n1 .*\\) +([\\d.]+) +68 +(-?[\\d.]+) +(-?[\\d.]+) +(-?[\\d.]+) +([\\d.]+)\n");
+        for (int i = 2; i <= 4; i++) {
+            assertEquals(pose.group(), 0, Float.parseFloat(pose.group(i)), 25);
+        }
+        int width = Integer.parseInt(m.group(3)) - Integer.parseInt(m.group(1));
+        assertEquals(pose.group(), 0.45 * width, Float.parseFloat(pose.group(5)), 0.1 * width);
 
         BufferedImage drawn = ImageIO.read(new File(folder.getRoot(), "out/faces.png"));
         int left = Integer.parseInt(m.group(1));

@@ -15,7 +15,7 @@ import org.junit.Test;
 public class LoggingTest {
     private static final List<String> DETECTOR = Arrays.asList(
             "E/FaceAPI: FaceCreateDetector create handle fail : " + EngineValues.ERROR_MODEL_FILE,
-            "D/FaceAPI: ky_face_detect_get_threshold threshold: 0.600000",
+            "D/FaceAPI: ky_face_detect_get_threshold threshold: 0.550000",
             "D/FaceAPI: ky_face_detect_set_threshold threshold: 0.750000",
             "D/FaceAPI: detect input image is null",
             "D/FaceAPI: detect input image is null",
