@@ -199,7 +199,7 @@ public final class SafeObjectsTest {
             Future<?> holder = threads.submit(() -> {
                 synchronized (frame) {
                     held.countDown();
-                    for (int i = 0; i < 200; i++) {
+                    for (int i = 0; i < 25; i++) {
                         detector.detect(frame);
                         Images.brightness(frame, 0, 0, 96, 64);
                     }
@@ -207,7 +207,7 @@ public final class SafeObjectsTest {
             });
             Future<?> other = threads.submit(() -> {
                 held.await();
-                for (int i = 0; i < 200; i++) {
+                for (int i = 0; i < 25; i++) {
                     detector.detect(frame);
                     frame.data();
                     try {
