@@ -24,9 +24,9 @@
 
 extern "C" {
 JNIEXPORT jint JNICALL JNI_OnLoad(JavaVM* vm, void* reserved);
-JNIEXPORT void JNICALL Java_com_vantrel_faceapi_FaceLibrary_convertColorSpace(JNIEnv*, jobject, jbyteArray,
+JNIEXPORT void JNICALL Java_com_vantrel_faceapi_FaceLibrary_convertColorSpace(JNIEnv*, jclass, jbyteArray,
                                                                               jint, jint, jbyteArray, jint);
-JNIEXPORT jobjectArray JNICALL Java_com_vantrel_faceapi_FaceLibrary_kyFaceTrackBytes(JNIEnv*, jobject, jlong,
+JNIEXPORT jobjectArray JNICALL Java_com_vantrel_faceapi_FaceLibrary_kyFaceTrackBytes(JNIEnv*, jclass, jlong,
                                                                                      jbyteArray, jint, jint,
                                                                                      jint, jint, jint,
                                                                                      jintArray);
@@ -173,7 +173,7 @@ std::vector<Call> calls() {
       {"convertColorSpace, 64 x 64",
        [] {
          auto* const array = someObject<_jbyteArray>();
-         Java_com_vantrel_faceapi_FaceLibrary_convertColorSpace(environment(), someObject<_jobject>(), array,
+         Java_com_vantrel_faceapi_FaceLibrary_convertColorSpace(environment(), someObject<_jclass>(), array,
                                                                 kSide, kSide, array, kToRgba);
        }},
   };
@@ -184,7 +184,7 @@ std::vector<Call> calls() {
                           face.points_count = kPoints;
                         }
                         Java_com_vantrel_faceapi_FaceLibrary_kyFaceTrackBytes(
-                            environment(), someObject<_jobject>(), 1, someObject<_jbyteArray>(), 0, kSide,
+                            environment(), someObject<_jclass>(), 1, someObject<_jbyteArray>(), 0, kSide,
                             kSide, kSide, 0, someObject<_jintArray>());
                       }});
   }

@@ -8,6 +8,7 @@
 
 #include "base/log.h"
 #include "brightness/clip.h"
+#include "java_declarations.h"
 #include "pinned.h"
 
 namespace {
@@ -51,7 +52,7 @@ std::uint32_t sum_bytes(const unsigned char* first, std::int64_t stride, int col
 extern "C" {
 
 JNIEXPORT jint JNICALL Java_com_vantrel_faceapi_FaceLibrary_faceBrightEvaluate(
-    JNIEnv* env, jobject /*thiz*/, jbyteArray image, jint format, jint width, jint widthStride, jint height,
+    JNIEnv* env, jclass /*type*/, jbyteArray image, jint format, jint width, jint widthStride, jint height,
     jint heightStride, jint rectX, jint rectY, jint rectW, jint rectH) {
   if (image == nullptr) {
     FACE_LOG(ANDROID_LOG_ERROR, "IMAGE IS NULL");
@@ -69,7 +70,7 @@ JNIEXPORT jint JNICALL Java_com_vantrel_faceapi_FaceLibrary_faceBrightEvaluate(
   return result;
 }
 
-JNIEXPORT jfloat JNICALL Java_com_vantrel_faceapi_FaceLibrary_averageBrightness(JNIEnv* env, jobject /*thiz*/,
+JNIEXPORT jfloat JNICALL Java_com_vantrel_faceapi_FaceLibrary_averageBrightness(JNIEnv* env, jclass /*type*/,
                                                                                 jbyteArray gray, jint width,
                                                                                 jint height, jint x, jint y,
                                                                                 jint w, jint h) {

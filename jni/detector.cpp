@@ -4,6 +4,7 @@
 #include "base/log.h"
 #include "engine_values.h"
 #include "face_analysis.h"
+#include "java_declarations.h"
 #include "kyface_api/kyface_api.h"
 #include "pinned.h"
 
@@ -27,7 +28,7 @@ jobjectArray kyFaceDetect(JNIEnv* env, long long handle, const unsigned char* im
 extern "C" {
 
 JNIEXPORT jlong JNICALL Java_com_vantrel_faceapi_FaceLibrary_kyFaceCreateDetector(JNIEnv* env,
-                                                                                  jobject /*thiz*/,
+                                                                                  jclass /*type*/,
                                                                                   jstring modelPath,
                                                                                   jint config) {
   kyface::StringChars path(env, modelPath);
@@ -46,7 +47,7 @@ JNIEXPORT jlong JNICALL Java_com_vantrel_faceapi_FaceLibrary_kyFaceCreateDetecto
 }
 
 JNIEXPORT void JNICALL Java_com_vantrel_faceapi_FaceLibrary_kyFaceDestroyDetector(JNIEnv* /*env*/,
-                                                                                  jobject /*thiz*/,
+                                                                                  jclass /*type*/,
                                                                                   jlong handle) {
   if (handle == 0) {
     FACE_LOG(ANDROID_LOG_ERROR, "kyFaceDestroyDetector destroy detect handle is null");
@@ -56,8 +57,7 @@ JNIEXPORT void JNICALL Java_com_vantrel_faceapi_FaceLibrary_kyFaceDestroyDetecto
   FACE_LOG(ANDROID_LOG_DEBUG, "ky_face_destroy_detector");
 }
 
-JNIEXPORT jfloat JNICALL Java_com_vantrel_faceapi_FaceLibrary_getDetectThreshold(JNIEnv* env,
-                                                                                 jobject /*thiz*/,
+JNIEXPORT jfloat JNICALL Java_com_vantrel_faceapi_FaceLibrary_getDetectThreshold(JNIEnv* env, jclass /*type*/,
                                                                                  jlong handle,
                                                                                  jintArray status) {
   float threshold = 0.0F;
@@ -66,7 +66,7 @@ JNIEXPORT jfloat JNICALL Java_com_vantrel_faceapi_FaceLibrary_getDetectThreshold
   return kyface::write_status(env, status, result) ? threshold : 0.0F;
 }
 
-JNIEXPORT void JNICALL Java_com_vantrel_faceapi_FaceLibrary_setDetectThreshold(JNIEnv* env, jobject /*thiz*/,
+JNIEXPORT void JNICALL Java_com_vantrel_faceapi_FaceLibrary_setDetectThreshold(JNIEnv* env, jclass /*type*/,
                                                                                jlong handle, jfloat threshold,
                                                                                jintArray status) {
   if (threshold <= 0.0F) {  // a NaN goes on to the engine
@@ -78,21 +78,21 @@ JNIEXPORT void JNICALL Java_com_vantrel_faceapi_FaceLibrary_setDetectThreshold(J
 }
 
 JNIEXPORT jobjectArray JNICALL Java_com_vantrel_faceapi_FaceLibrary_kyFaceDetectBytes(
-    JNIEnv* env, jobject /*thiz*/, jlong handle, jbyteArray image, jint pixelFormat, jint width, jint height,
+    JNIEnv* env, jclass /*type*/, jlong handle, jbyteArray image, jint pixelFormat, jint width, jint height,
     jint stride, jint orientation, jintArray status) {
   return kyface::analyse_array<Detector>(kyFaceDetect, env, handle, image, pixelFormat, width, height, stride,
                                          orientation, status);
 }
 
 JNIEXPORT jobjectArray JNICALL Java_com_vantrel_faceapi_FaceLibrary_kyFaceDetectInts(
-    JNIEnv* env, jobject /*thiz*/, jlong handle, jintArray image, jint pixelFormat, jint width, jint height,
+    JNIEnv* env, jclass /*type*/, jlong handle, jintArray image, jint pixelFormat, jint width, jint height,
     jint stride, jint orientation, jintArray status) {
   return kyface::analyse_array<Detector>(kyFaceDetect, env, handle, image, pixelFormat, width, height, stride,
                                          orientation, status);
 }
 
 JNIEXPORT jint JNICALL Java_com_vantrel_faceapi_FaceLibrary_kyFaceShowInsideModel(JNIEnv* /*env*/,
-                                                                                  jobject /*thiz*/) {
+                                                                                  jclass /*type*/) {
   return ky_face_algorithm_info();
 }
 

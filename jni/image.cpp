@@ -4,6 +4,7 @@
 
 #include "base/log.h"
 #include "frame/frame.h"
+#include "java_declarations.h"
 #include "pinned.h"
 
 namespace {
@@ -40,7 +41,7 @@ void read_bitmap(JNIEnv* env, jobject bitmap, jbyteArray out, decltype(BGR2RGB)*
 
 extern "C" {
 
-JNIEXPORT void JNICALL Java_com_vantrel_faceapi_FaceLibrary_convertColorSpace(JNIEnv* env, jobject /*thiz*/,
+JNIEXPORT void JNICALL Java_com_vantrel_faceapi_FaceLibrary_convertColorSpace(JNIEnv* env, jclass /*type*/,
                                                                               jbyteArray src, jint width,
                                                                               jint height, jbyteArray dst,
                                                                               jint code) {
@@ -86,20 +87,19 @@ JNIEXPORT void JNICALL Java_com_vantrel_faceapi_FaceLibrary_convertColorSpace(JN
 }
 
 JNIEXPORT void JNICALL Java_com_vantrel_faceapi_FaceLibrary_getBGRADataFromBitmap(JNIEnv* env,
-                                                                                  jobject /*thiz*/,
+                                                                                  jclass /*type*/,
                                                                                   jobject bitmap,
                                                                                   jbyteArray out) {
   read_bitmap(env, bitmap, out, BGR2RGB);
 }
 
-JNIEXPORT void JNICALL Java_com_vantrel_faceapi_FaceLibrary_getBGRDataFromBitmap(JNIEnv* env,
-                                                                                 jobject /*thiz*/,
+JNIEXPORT void JNICALL Java_com_vantrel_faceapi_FaceLibrary_getBGRDataFromBitmap(JNIEnv* env, jclass /*type*/,
                                                                                  jobject bitmap,
                                                                                  jbyteArray out) {
   read_bitmap(env, bitmap, out, BGRA2RGB);
 }
 
-JNIEXPORT void JNICALL Java_com_vantrel_faceapi_FaceLibrary_cropNv21Data(JNIEnv* env, jobject /*thiz*/,
+JNIEXPORT void JNICALL Java_com_vantrel_faceapi_FaceLibrary_cropNv21Data(JNIEnv* env, jclass /*type*/,
                                                                          jbyteArray nv21, jint imageWidth,
                                                                          jint imageHeight, jint x, jint y,
                                                                          jint w, jint h, jbyteArray out) {
@@ -116,7 +116,7 @@ JNIEXPORT void JNICALL Java_com_vantrel_faceapi_FaceLibrary_cropNv21Data(JNIEnv*
   pixels.release();
 }
 
-JNIEXPORT void JNICALL Java_com_vantrel_faceapi_FaceLibrary_rotateBGR(JNIEnv* env, jobject /*thiz*/,
+JNIEXPORT void JNICALL Java_com_vantrel_faceapi_FaceLibrary_rotateBGR(JNIEnv* env, jclass /*type*/,
                                                                       jbyteArray src, jint width, jint height,
                                                                       jbyteArray dst, jint degree,
                                                                       jintArray outSize) {

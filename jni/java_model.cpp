@@ -1,4 +1,5 @@
 #include "java_model.h"
+#include "java_declarations.h"
 
 #include <algorithm>
 #include <climits>
@@ -249,7 +250,7 @@ ky_face_t java_face_to_ky_face_t(JNIEnv* env, jobject face) {
 
 extern "C" {
 
-JNIEXPORT void JNICALL Java_com_vantrel_faceapi_FaceLibrary_setDebug(JNIEnv* /*env*/, jobject /*thiz*/,
+JNIEXPORT void JNICALL Java_com_vantrel_faceapi_FaceLibrary_setDebug(JNIEnv* /*env*/, jclass /*type*/,
                                                                      jboolean debug) {
   kyface::debug_switch.store(debug != JNI_FALSE ? 1 : 0, std::memory_order_relaxed);
 }

@@ -8,6 +8,7 @@
 
 #include "brightness/total_lightness.h"
 #include "frame/image_view.h"
+#include "java_declarations.h"
 #include "pinned.h"
 
 namespace {

@@ -6,6 +6,7 @@
 #include <cstdint>
 
 #include "frame/planes.h"
+#include "java_declarations.h"
 #include "pinned.h"
 
 namespace {

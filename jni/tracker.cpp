@@ -4,6 +4,7 @@
 #include "base/log.h"
 #include "engine_values.h"
 #include "face_analysis.h"
+#include "java_declarations.h"
 #include "kyface_api/kyface_api.h"
 #include "pinned.h"
 
@@ -33,8 +34,10 @@ jint set_tracker_value(Setter* setter, jlong handle, jint value) {
 
 extern "C" {
 
-JNIEXPORT jlong JNICALL Java_com_vantrel_faceapi_FaceLibrary_kyFaceCreateTracker(
-    JNIEnv* env, jobject /*thiz*/, jstring modelPath, jint /*reserved*/, jint config) {
+JNIEXPORT jlong JNICALL Java_com_vantrel_faceapi_FaceLibrary_kyFaceCreateTracker(JNIEnv* env, jclass /*type*/,
+                                                                                 jstring modelPath,
+                                                                                 jint /*reserved*/,
+                                                                                 jint config) {
   kyface::StringChars path(env, modelPath);
   if (path.refused()) {
     return 0;
@@ -54,7 +57,7 @@ JNIEXPORT jlong JNICALL Java_com_vantrel_faceapi_FaceLibrary_kyFaceCreateTracker
 }
 
 JNIEXPORT void JNICALL Java_com_vantrel_faceapi_FaceLibrary_kyFaceDestroyTracker(JNIEnv* /*env*/,
-                                                                                 jobject /*thiz*/,
+                                                                                 jclass /*type*/,
                                                                                  jlong handle) {
   if (handle == 0) {
     FACE_LOG(ANDROID_LOG_ERROR, "kyFaceDestroyTracker destroy handle is null");
@@ -65,42 +68,42 @@ JNIEXPORT void JNICALL Java_com_vantrel_faceapi_FaceLibrary_kyFaceDestroyTracker
 }
 
 JNIEXPORT jobjectArray JNICALL Java_com_vantrel_faceapi_FaceLibrary_kyFaceTrackBytes(
-    JNIEnv* env, jobject /*thiz*/, jlong handle, jbyteArray image, jint pixelFormat, jint width, jint height,
+    JNIEnv* env, jclass /*type*/, jlong handle, jbyteArray image, jint pixelFormat, jint width, jint height,
     jint stride, jint orientation, jintArray status) {
   return kyface::analyse_array<Tracker>(kyFaceTrack, env, handle, image, pixelFormat, width, height, stride,
                                         orientation, status);
 }
 
 JNIEXPORT jobjectArray JNICALL Java_com_vantrel_faceapi_FaceLibrary_kyFaceTrackInts(
-    JNIEnv* env, jobject /*thiz*/, jlong handle, jintArray image, jint pixelFormat, jint width, jint height,
+    JNIEnv* env, jclass /*type*/, jlong handle, jintArray image, jint pixelFormat, jint width, jint height,
     jint stride, jint orientation, jintArray status) {
   return kyface::analyse_array<Tracker>(kyFaceTrack, env, handle, image, pixelFormat, width, height, stride,
                                         orientation, status);
 }
 
 JNIEXPORT void JNICALL Java_com_vantrel_faceapi_FaceLibrary_kyFaceResetTracker(JNIEnv* /*env*/,
-                                                                               jobject /*thiz*/,
+                                                                               jclass /*type*/,
                                                                                jlong handle) {
   ky_face_reset_tracker(kyface::to_handle(handle));
   FACE_LOG(ANDROID_LOG_VERBOSE, "ky_face_reset_tracker");
 }
 
 JNIEXPORT jint JNICALL Java_com_vantrel_faceapi_FaceLibrary_kyFaceTrackSetDetectFaceCntLimit(JNIEnv* /*env*/,
-                                                                                             jobject /*thiz*/,
+                                                                                             jclass /*type*/,
                                                                                              jlong handle,
                                                                                              jint limit) {
   return set_tracker_value(ky_face_track_set_detect_face_cnt_limit, handle, limit);
 }
 
 JNIEXPORT jint JNICALL Java_com_vantrel_faceapi_FaceLibrary_kyFaceTrackSetDetectInterval(JNIEnv* /*env*/,
-                                                                                         jobject /*thiz*/,
+                                                                                         jclass /*type*/,
                                                                                          jlong handle,
                                                                                          jint interval) {
   return set_tracker_value(ky_face_track_set_detect_interval, handle, interval);
 }
 
 JNIEXPORT jint JNICALL Java_com_vantrel_faceapi_FaceLibrary_kyFaceTrackSetAlignmentThreshold(JNIEnv* /*env*/,
-                                                                                             jobject /*thiz*/,
+                                                                                             jclass /*type*/,
                                                                                              jlong handle,
                                                                                              jint threshold) {
   return set_tracker_value(ky_face_track_set_alignment_threshold, handle, threshold);

@@ -5,6 +5,7 @@
 
 #include "base/log.h"
 #include "engine_values.h"
+#include "java_declarations.h"
 #include "java_model.h"
 #include "kyface_api/kyface_api.h"
 #include "pinned.h"
@@ -19,7 +20,7 @@ jsize serialized_size(int length) {
 
 /// Extracts the feature of a face and returns its text. The engine's 0 goes into `status[0]`; every failure
 /// returns null, and one before or inside the engine leaves `status` untouched.
-jbyteArray kyFaceVerify(JNIEnv* env, jobject /*thiz*/, long long handle, const unsigned char* image,
+jbyteArray kyFaceVerify(JNIEnv* env, jclass /*type*/, long long handle, const unsigned char* image,
                         int pixelFormat, int width, int height, int stride, jobject face, jintArray status) {
   if (status == nullptr || face == nullptr || image == nullptr) {
     FACE_LOG(ANDROID_LOG_ERROR, "kyFaceVerify image or status or kyface is null");
@@ -68,13 +69,13 @@ jbyteArray kyFaceVerify(JNIEnv* env, jobject /*thiz*/, long long handle, const u
 
 /// Extracts a feature from an image that is held in a Java array, of bytes or of 32-bit pixels alike.
 template <typename Array>
-jbyteArray get_feature(JNIEnv* env, jobject thiz, jlong handle, Array image, jint pixelFormat, jint width,
+jbyteArray get_feature(JNIEnv* env, jclass type, jlong handle, Array image, jint pixelFormat, jint width,
                        jint height, jint stride, jobject face, jintArray status) {
   if (image == nullptr) {  // refused below, like a null face: a virtual machine need not survive pinning it
-    return kyFaceVerify(env, thiz, handle, nullptr, pixelFormat, width, height, stride, face, status);
+    return kyFaceVerify(env, type, handle, nullptr, pixelFormat, width, height, stride, face, status);
   }
   const kyface::PinnedArray pinned_image(env, image);
-  return kyFaceVerify(env, thiz, handle, pinned_image.bytes(), pixelFormat, width, height, stride, face,
+  return kyFaceVerify(env, type, handle, pinned_image.bytes(), pixelFormat, width, height, stride, face,
                       status);
 }
 
@@ -82,7 +83,7 @@ jbyteArray get_feature(JNIEnv* env, jobject thiz, jlong handle, Array image, jin
 
 extern "C" {
 
-JNIEXPORT jlong JNICALL Java_com_vantrel_faceapi_FaceLibrary_kyFaceCreateVerify(JNIEnv* env, jobject /*thiz*/,
+JNIEXPORT jlong JNICALL Java_com_vantrel_faceapi_FaceLibrary_kyFaceCreateVerify(JNIEnv* env, jclass /*type*/,
                                                                                 jstring modelPath) {
   kyface::StringChars path(env, modelPath);
   if (path.refused()) {
@@ -103,31 +104,31 @@ JNIEXPORT jlong JNICALL Java_com_vantrel_faceapi_FaceLibrary_kyFaceCreateVerify(
 }
 
 JNIEXPORT jint JNICALL Java_com_vantrel_faceapi_FaceLibrary_kyFaceGetVerifyVersion(JNIEnv* /*env*/,
-                                                                                   jobject /*thiz*/,
+                                                                                   jclass /*type*/,
                                                                                    jlong handle) {
   return ky_verify_get_version(kyface::to_handle(handle));
 }
 
 JNIEXPORT jint JNICALL Java_com_vantrel_faceapi_FaceLibrary_kyFaceGetVerifyLength(JNIEnv* /*env*/,
-                                                                                  jobject /*thiz*/,
+                                                                                  jclass /*type*/,
                                                                                   jlong handle) {
   return ky_verify_get_feature_length(kyface::to_handle(handle));
 }
 
 JNIEXPORT jbyteArray JNICALL Java_com_vantrel_faceapi_FaceLibrary_kyFaceGetFeatureBytes(
-    JNIEnv* env, jobject thiz, jlong handle, jbyteArray image, jint pixelFormat, jint width, jint height,
+    JNIEnv* env, jclass type, jlong handle, jbyteArray image, jint pixelFormat, jint width, jint height,
     jint stride, jobject face, jintArray status) {
-  return get_feature(env, thiz, handle, image, pixelFormat, width, height, stride, face, status);
+  return get_feature(env, type, handle, image, pixelFormat, width, height, stride, face, status);
 }
 
 JNIEXPORT jbyteArray JNICALL Java_com_vantrel_faceapi_FaceLibrary_kyFaceGetFeatureInts(
-    JNIEnv* env, jobject thiz, jlong handle, jintArray image, jint pixelFormat, jint width, jint height,
+    JNIEnv* env, jclass type, jlong handle, jintArray image, jint pixelFormat, jint width, jint height,
     jint stride, jobject face, jintArray status) {
-  return get_feature(env, thiz, handle, image, pixelFormat, width, height, stride, face, status);
+  return get_feature(env, type, handle, image, pixelFormat, width, height, stride, face, status);
 }
 
 JNIEXPORT jfloat JNICALL Java_com_vantrel_faceapi_FaceLibrary_kyFaceCompareFeature(
-    JNIEnv* env, jobject /*thiz*/, jlong handle, jbyteArray feature1, jbyteArray feature2, jintArray status) {
+    JNIEnv* env, jclass /*type*/, jlong handle, jbyteArray feature1, jbyteArray feature2, jintArray status) {
   if (feature1 == nullptr || feature2 == nullptr) {
     FACE_LOG(ANDROID_LOG_ERROR, "ky_faceapi_KyFaceLibrary_kyFacCompareFeature feature is null");
     return 0.0F;
@@ -153,7 +154,7 @@ JNIEXPORT jfloat JNICALL Java_com_vantrel_faceapi_FaceLibrary_kyFaceCompareFeatu
   return kyface::write_status(env, status, result) ? score : 0.0F;
 }
 
-JNIEXPORT jlong JNICALL Java_com_vantrel_faceapi_FaceLibrary_kyFaceDeserialize(JNIEnv* env, jobject /*thiz*/,
+JNIEXPORT jlong JNICALL Java_com_vantrel_faceapi_FaceLibrary_kyFaceDeserialize(JNIEnv* env, jclass /*type*/,
                                                                                jbyteArray feature) {
   const kyface::PinnedArray text(env, feature);
   if (!text) {
@@ -163,7 +164,7 @@ JNIEXPORT jlong JNICALL Java_com_vantrel_faceapi_FaceLibrary_kyFaceDeserialize(J
 }
 
 JNIEXPORT void JNICALL Java_com_vantrel_faceapi_FaceLibrary_kyFaceDestroyVerify(JNIEnv* /*env*/,
-                                                                                jobject /*thiz*/,
+                                                                                jclass /*type*/,
                                                                                 jlong handle) {
   if (handle == 0) {
     FACE_LOG(ANDROID_LOG_ERROR, "kyFaceVerify DestroyVerify handle is NULL!!");

@@ -3,9 +3,11 @@
 
 #include <jni.h>
 
+#include "jni/java_declarations.h"
+
 #define FACE_LIBRARY(type, method, ...)                                         \
   JNIEXPORT type JNICALL Java_com_vantrel_faceapi_FaceLibrary_##method(JNIEnv*, \
-                                                                       jobject __VA_OPT__(, ) __VA_ARGS__)
+                                                                       jclass __VA_OPT__(, ) __VA_ARGS__)
 
 extern "C" {
 

@@ -200,7 +200,7 @@ class BitmapTest : public ImageTest {
 
   /// Both methods, with what they are to write.
   struct Method {
-    void (*call)(JNIEnv*, jobject, jobject, jbyteArray);
+    void (*call)(JNIEnv*, jclass, jobject, jbyteArray);
     int channels;
     const char* helper;
   };

@@ -5,7 +5,7 @@
 
 extern "C" {
 
-jobjectArray Java_com_vantrel_faceapi_FaceLibrary_kyFaceTrackBytes(JNIEnv* env, jobject thiz, jlong handle,
+jobjectArray Java_com_vantrel_faceapi_FaceLibrary_kyFaceTrackBytes(JNIEnv* env, jclass type, jlong handle,
                                                                    jbyteArray image, jint format, jint width,
                                                                    jint height, jint stride, jint orientation,
                                                                    jintArray status);
