@@ -1,3 +1,6 @@
+// SPDX-FileCopyrightText: the libjni_kyface_api authors
+// SPDX-License-Identifier: Apache-2.0
+
 // What a call of a native method costs beyond the pixels: run under the counting plugin,
 //
 //   bench_bridge REPEATS

@@ -1,3 +1,6 @@
+// SPDX-FileCopyrightText: the libjni_kyface_api authors
+// SPDX-License-Identifier: Apache-2.0
+
 // This project's own operations, taken from the lists of instances that exist.
 
 #include "fastcv/fastcv.h"

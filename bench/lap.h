@@ -1,3 +1,5 @@
+// SPDX-FileCopyrightText: the libjni_kyface_api authors
+// SPDX-License-Identifier: Apache-2.0
 /// How a call is measured under the counting plugin.
 #pragma once
 

@@ -1,3 +1,6 @@
+// SPDX-FileCopyrightText: the libjni_kyface_api authors
+// SPDX-License-Identifier: Apache-2.0
+
 // What libyuv has of the operations. Its conversions of limited range and its 8-bit approximations stand for
 // ours: they move the same bytes and are what camera code calls today.
 

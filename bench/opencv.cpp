@@ -1,3 +1,6 @@
+// SPDX-FileCopyrightText: the libjni_kyface_api authors
+// SPDX-License-Identifier: Apache-2.0
+
 // What OpenCV has of the operations, on one thread.
 
 #include <opencv2/core.hpp>

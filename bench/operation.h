@@ -1,3 +1,5 @@
+// SPDX-FileCopyrightText: the libjni_kyface_api authors
+// SPDX-License-Identifier: Apache-2.0
 /// The operations that are measured, and how one is described.
 #pragma once
 

@@ -1,3 +1,6 @@
+// SPDX-FileCopyrightText: the libjni_kyface_api authors
+// SPDX-License-Identifier: Apache-2.0
+
 // A camera's planes in one pass, and the two that it replaces: their conversion, then the rotation of pixels
 // or of the frame.
 

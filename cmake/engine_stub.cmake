@@ -1,3 +1,5 @@
+# SPDX-FileCopyrightText: the libjni_kyface_api authors
+# SPDX-License-Identifier: Apache-2.0
 # A library with the face engine's symbols and soname, to link against where the engine itself is not at hand. Nothing
 # in it works, and it is never packaged. Its symbols are those that kyface_api.h declares.
 file(READ ${PROJECT_SOURCE_DIR}/kyface_api/include/kyface_api/kyface_api.h header)

@@ -1,3 +1,5 @@
+# SPDX-FileCopyrightText: the libjni_kyface_api authors
+# SPDX-License-Identifier: Apache-2.0
 # Java: sources to jars, and the virtual machine that runs them.
 #
 # Class files are of Java 8, the level that every Android project takes; what a later JDK says about the age of that

@@ -1,3 +1,5 @@
+# SPDX-FileCopyrightText: the libjni_kyface_api authors
+# SPDX-License-Identifier: Apache-2.0
 # Compile and link options shared by the project's targets.
 
 # Checks built into everything, tests included: what -fsanitize takes.

@@ -1,3 +1,5 @@
+# SPDX-FileCopyrightText: the libjni_kyface_api authors
+# SPDX-License-Identifier: Apache-2.0
 # 64-bit Arm Linux with clang 19 (the compiler family of Android's NDK) over the libraries of Debian's cross GCC.
 # Programs run under qemu-user; cortex-a76 is a plain NEON core with the dot product, no SVE.
 set(CMAKE_SYSTEM_NAME Linux)

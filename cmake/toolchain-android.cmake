@@ -1,3 +1,5 @@
+# SPDX-FileCopyrightText: the libjni_kyface_api authors
+# SPDX-License-Identifier: Apache-2.0
 # The toolchain of the NDK that ANDROID_NDK_HOME (or ANDROID_NDK) names. A build folder remembers its NDK, so that it can
 # be configured again where neither is set.
 set(kyface_named_ndk)

@@ -1,3 +1,5 @@
+// SPDX-FileCopyrightText: the libjni_kyface_api authors
+// SPDX-License-Identifier: Apache-2.0
 /// The platform's assertion report as something that a fuzz target can expect: the target's program defines
 /// `__assert2`, which comes back here instead of ending the process.
 #pragma once

@@ -1,3 +1,6 @@
+// SPDX-FileCopyrightText: the libjni_kyface_api authors
+// SPDX-License-Identifier: Apache-2.0
+
 // cvtColor over every instance: the status against the rules written out once more; nothing touched when
 // refused, nothing outside the images when not, and the same pixels as converting them one by one.
 

@@ -1,3 +1,6 @@
+// SPDX-FileCopyrightText: the libjni_kyface_api authors
+// SPDX-License-Identifier: Apache-2.0
+
 // The open engine's C interface with any scalars, over images that hold what valid ones describe: an invalid
 // call fails with a code and touches nothing, a valid one stays inside its image.
 

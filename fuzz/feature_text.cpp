@@ -1,3 +1,6 @@
+// SPDX-FileCopyrightText: the libjni_kyface_api authors
+// SPDX-License-Identifier: Apache-2.0
+
 // The text of a feature: whatever stands before the end of the buffer, reading it stays inside; what is read
 // writes the same text again.
 

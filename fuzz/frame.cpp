@@ -1,3 +1,6 @@
+// SPDX-FileCopyrightText: the libjni_kyface_api authors
+// SPDX-License-Identifier: Apache-2.0
+
 // The frame helpers with any scalars, over buffers that hold what valid ones describe: the pixels that the
 // formulas give or, where the sizes are refused or hold nothing, no byte touched.
 

@@ -1,3 +1,5 @@
+// SPDX-FileCopyrightText: the libjni_kyface_api authors
+// SPDX-License-Identifier: Apache-2.0
 /// A fuzzer's bytes, taken as numbers. When they run out everything is 0, so that every input is a whole one.
 #pragma once
 

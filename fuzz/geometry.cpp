@@ -1,3 +1,6 @@
+// SPDX-FileCopyrightText: the libjni_kyface_api authors
+// SPDX-License-Identifier: Apache-2.0
+
 // crop, rotate and rotate_YUV420: the status against the rules written out once more; nothing touched when
 // refused, and when not, every pixel where the mapping of indices puts it and nothing outside.
 

@@ -1,3 +1,6 @@
+// SPDX-FileCopyrightText: the libjni_kyface_api authors
+// SPDX-License-Identifier: Apache-2.0
+
 // The brightness metrics with any scalars over images that hold what they describe: the mean as the formulas
 // give it, and no byte outside the image read.
 

@@ -1,3 +1,6 @@
+// SPDX-FileCopyrightText: the libjni_kyface_api authors
+// SPDX-License-Identifier: Apache-2.0
+
 // A camera's planes of any description, in memory that ends where the description says, into a target of any
 // description: the pixels that the formulas give or, where anything does not fit, a status and no byte
 // touched.

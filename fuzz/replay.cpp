@@ -1,3 +1,6 @@
+// SPDX-FileCopyrightText: the libjni_kyface_api authors
+// SPDX-License-Identifier: Apache-2.0
+
 // Runs a fuzz target over the inputs that are kept: files, or folders of them.
 
 #include <cstdint>

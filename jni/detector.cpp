@@ -1,3 +1,6 @@
+// SPDX-FileCopyrightText: the libjni_kyface_api authors
+// SPDX-License-Identifier: Apache-2.0
+
 // Native methods of FaceLibrary over the engine's still-image detector.
 #include <jni.h>
 

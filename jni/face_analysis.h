@@ -1,3 +1,5 @@
+// SPDX-FileCopyrightText: the libjni_kyface_api authors
+// SPDX-License-Identifier: Apache-2.0
 /// Detection and tracking seen from Java: one routine for both, over the engine's two operations.
 ///
 /// An `Engine` names what differs: `kAnalyse` and `kRelease` (the operations), `kHandleIsNull` and

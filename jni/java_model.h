@@ -1,3 +1,5 @@
+// SPDX-FileCopyrightText: the libjni_kyface_api authors
+// SPDX-License-Identifier: Apache-2.0
 /// The Java side of a face: the registry of classes and fields, and the conversions between the engine's
 /// records and `FaceInfo` objects.
 ///

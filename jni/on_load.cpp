@@ -1,3 +1,6 @@
+// SPDX-FileCopyrightText: the libjni_kyface_api authors
+// SPDX-License-Identifier: Apache-2.0
+
 // Where the virtual machine enters the library first. On x86-64 the rest is compiled for AVX2 and FMA, which
 // not every processor has, and would die of its first instruction: what is here is compiled for the ABI's own
 // instructions, looks, and refuses. So nothing inline may be used of what other sources use, or the linker

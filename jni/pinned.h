@@ -1,3 +1,5 @@
+// SPDX-FileCopyrightText: the libjni_kyface_api authors
+// SPDX-License-Identifier: Apache-2.0
 /// What the bridge borrows from the virtual machine for the length of a call: array elements and string
 /// characters.
 ///

@@ -1,3 +1,6 @@
+// SPDX-FileCopyrightText: the libjni_kyface_api authors
+// SPDX-License-Identifier: Apache-2.0
+
 // Native methods of PixelConversion. They compare every array and bitmap with the sizes that come with it,
 // and say nothing to the log.
 #include <android/bitmap.h>

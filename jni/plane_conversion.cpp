@@ -1,3 +1,6 @@
+// SPDX-FileCopyrightText: the libjni_kyface_api authors
+// SPDX-License-Identifier: Apache-2.0
+
 // Native methods of PlaneConversion: Java's memory as the planes and the target of `convert_planes`.
 #include <android/bitmap.h>
 #include <jni.h>

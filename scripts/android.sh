@@ -1,3 +1,5 @@
+# SPDX-FileCopyrightText: the libjni_kyface_api authors
+# SPDX-License-Identifier: Apache-2.0
 # shellcheck shell=bash disable=SC2034,SC2154
 # What the scripts that build for Android share; sourced after common.sh, never run.
 

@@ -1,3 +1,5 @@
+# SPDX-FileCopyrightText: the libjni_kyface_api authors
+# SPDX-License-Identifier: Apache-2.0
 # shellcheck shell=bash disable=SC2034
 # Shared by the scripts of this folder; sourced, never run. Leaves the caller in the project's root, which is $root.
 set -euo pipefail

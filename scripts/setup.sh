@@ -1,4 +1,6 @@
 #!/usr/bin/env bash
+# SPDX-FileCopyrightText: the libjni_kyface_api authors
+# SPDX-License-Identifier: Apache-2.0
 # Installs what building and testing need: the one place of the project that does.
 #
 #   scripts/setup.sh [group...]

@@ -1,3 +1,6 @@
+// SPDX-FileCopyrightText: the libjni_kyface_api authors
+// SPDX-License-Identifier: Apache-2.0
+
 // A plugin of qemu-aarch64 that counts the instructions of stretches of a program, exactly, and where they
 // ran.
 //

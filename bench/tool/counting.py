@@ -1,3 +1,5 @@
+# SPDX-FileCopyrightText: the libjni_kyface_api authors
+# SPDX-License-Identifier: Apache-2.0
 """Instructions of the arm64 build, exact: its programs under the emulator's counting plugin."""
 
 import collections

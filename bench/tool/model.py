@@ -1,3 +1,5 @@
+# SPDX-FileCopyrightText: the libjni_kyface_api authors
+# SPDX-License-Identifier: Apache-2.0
 """Cycles per pixel that LLVM's static models predict, with everything in the first-level cache.
 
 Each hot block is taken as a loop of its own and weighted by how often it ran. What is not hot is taken to cost as much

@@ -1,3 +1,5 @@
+# SPDX-FileCopyrightText: the libjni_kyface_api authors
+# SPDX-License-Identifier: Apache-2.0
 """What bench_phone measured on a device's cores, as a table."""
 
 import dataclasses

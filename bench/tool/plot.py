@@ -1,3 +1,5 @@
+# SPDX-FileCopyrightText: the libjni_kyface_api authors
+# SPDX-License-Identifier: Apache-2.0
 """Cost by picture size, as an SVG with nothing but the standard library."""
 
 import dataclasses

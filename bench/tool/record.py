@@ -1,3 +1,5 @@
+# SPDX-FileCopyrightText: the libjni_kyface_api authors
+# SPDX-License-Identifier: Apache-2.0
 """The counts that are kept, and how new ones compare with them."""
 
 # What an operation may need beyond its record, as a part of it.

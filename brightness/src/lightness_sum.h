@@ -1,3 +1,5 @@
+// SPDX-FileCopyrightText: the libjni_kyface_api authors
+// SPDX-License-Identifier: Apache-2.0
 /// The sum of pixels' lightness, over the global tables.
 #pragma once
 

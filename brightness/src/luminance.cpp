@@ -1,3 +1,6 @@
+// SPDX-FileCopyrightText: the libjni_kyface_api authors
+// SPDX-License-Identifier: Apache-2.0
+
 // Mean CIE lightness. Every call rebuilds the global tables; as their contents are known at compile time,
 // that is a copy of 3328 entries, a seventh of the time that a 64 x 64 region takes.
 

@@ -1,3 +1,5 @@
+// SPDX-FileCopyrightText: the libjni_kyface_api authors
+// SPDX-License-Identifier: Apache-2.0
 /// What the metrics share: the rectangle, the walk over its pixels and the mean.
 #pragma once
 

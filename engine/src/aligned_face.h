@@ -1,3 +1,5 @@
+// SPDX-FileCopyrightText: the libjni_kyface_api authors
+// SPDX-License-Identifier: Apache-2.0
 /// The picture of a face that the descriptor takes: upright, its eyes in fixed places.
 #pragma once
 

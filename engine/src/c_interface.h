@@ -1,3 +1,5 @@
+// SPDX-FileCopyrightText: the libjni_kyface_api authors
+// SPDX-License-Identifier: Apache-2.0
 /// The C interface that the engine implements, whose functions alone are visible from outside.
 #pragma once
 

@@ -1,3 +1,5 @@
+// SPDX-FileCopyrightText: the libjni_kyface_api authors
+// SPDX-License-Identifier: Apache-2.0
 /// The face descriptor: a residual network that turns the picture of an aligned face into numbers, so that
 /// pictures of one person lie close to one another and those of two far apart.
 ///

@@ -1,3 +1,5 @@
+// SPDX-FileCopyrightText: the libjni_kyface_api authors
+// SPDX-License-Identifier: Apache-2.0
 /// To be included before any other header of dlib.
 ///
 /// Debian's package of dlib is configured to use a BLAS, a LAPACK and image file libraries. The engine

@@ -1,3 +1,5 @@
+// SPDX-FileCopyrightText: the libjni_kyface_api authors
+// SPDX-License-Identifier: Apache-2.0
 /// What the engine throws inside; the C interface turns it into its result code.
 #pragma once
 

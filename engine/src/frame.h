@@ -1,3 +1,5 @@
+// SPDX-FileCopyrightText: the libjni_kyface_api authors
+// SPDX-License-Identifier: Apache-2.0
 /// A frame of the caller's as the C interface receives it, and its upright gray picture.
 #pragma once
 

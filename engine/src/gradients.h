@@ -1,3 +1,5 @@
+// SPDX-FileCopyrightText: the libjni_kyface_api authors
+// SPDX-License-Identifier: Apache-2.0
 /// Histograms of oriented gradients, the features that faces are searched in.
 ///
 /// A picture is divided into square cells. Each pixel votes with the length of its gradient for the direction

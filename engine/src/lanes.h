@@ -1,3 +1,5 @@
+// SPDX-FileCopyrightText: the libjni_kyface_api authors
+// SPDX-License-Identifier: Apache-2.0
 /// Sixteen floats in registers, and what the engine's convolutions do with them. Each operation rounds
 /// the same way on both architectures: lanes never meet, and a multiply-add rounds once.
 #pragma once

@@ -1,3 +1,5 @@
+// SPDX-FileCopyrightText: the libjni_kyface_api authors
+// SPDX-License-Identifier: Apache-2.0
 /// Trackers: faces followed from frame to frame, and the C interface to them.
 #include "face_finder.h"
 // The configuration of dlib comes first.

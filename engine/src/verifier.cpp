@@ -1,3 +1,5 @@
+// SPDX-FileCopyrightText: the libjni_kyface_api authors
+// SPDX-License-Identifier: Apache-2.0
 /// Verifiers: features of faces, and the C interface to them.
 #include <algorithm>
 #include <array>

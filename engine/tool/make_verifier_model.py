@@ -1,4 +1,6 @@
 #!/usr/bin/env python3
+# SPDX-FileCopyrightText: the libjni_kyface_api authors
+# SPDX-License-Identifier: Apache-2.0
 """Makes the verifier's model file out of published weights.
 
   make_verifier_model.py WEIGHTS_FOLDER OUTPUT [--landmarks FILE]

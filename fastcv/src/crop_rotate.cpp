@@ -1,3 +1,6 @@
+// SPDX-FileCopyrightText: the libjni_kyface_api authors
+// SPDX-License-Identifier: Apache-2.0
+
 // crop, rotate and rotate_YUV420: their checks, and the kernel behind each.
 
 #include <cmath>

@@ -1,3 +1,6 @@
+// SPDX-FileCopyrightText: the libjni_kyface_api authors
+// SPDX-License-Identifier: Apache-2.0
+
 // cvtColor: the checks of the three families of conversions, and the kernel behind each conversion.
 
 #include "check.h"

@@ -1,3 +1,6 @@
+// SPDX-FileCopyrightText: the libjni_kyface_api authors
+// SPDX-License-Identifier: Apache-2.0
+
 // Colour conversions of whole camera frames. Their messages are written whatever the debug switch says.
 #include "base/log.h"
 #include "frame/frame.h"

@@ -1,3 +1,6 @@
+// SPDX-FileCopyrightText: the libjni_kyface_api authors
+// SPDX-License-Identifier: Apache-2.0
+
 // A camera's planes decoded and copied row by row, mirrored in registers, or transposed by tiles through a
 // scratch block of 6 KB, which is decoded while it is in the first-level cache. Blocks are of 32 columns, the
 // 16 chroma samples of a register; the last block of a row is flush with the row's end, over its neighbour.

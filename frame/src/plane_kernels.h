@@ -1,3 +1,5 @@
+// SPDX-FileCopyrightText: the libjni_kyface_api authors
+// SPDX-License-Identifier: Apache-2.0
 /// The pixel work behind `convert_planes`. Everything is trusted here, and pictures are not small.
 #pragma once
 

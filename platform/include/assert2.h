@@ -1,3 +1,5 @@
+// SPDX-FileCopyrightText: the libjni_kyface_api authors
+// SPDX-License-Identifier: Apache-2.0
 /// The report of a failed assertion. Android declares it in <assert.h>; a desktop's C library has none.
 #pragma once
 

@@ -1,3 +1,5 @@
+# SPDX-FileCopyrightText: the libjni_kyface_api authors
+# SPDX-License-Identifier: Apache-2.0
 """The checks of libraries that are packaged, over small libraries of both ABIs: each finds what it is there for."""
 
 import argparse

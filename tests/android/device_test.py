@@ -1,3 +1,5 @@
+# SPDX-FileCopyrightText: the libjni_kyface_api authors
+# SPDX-License-Identifier: Apache-2.0
 """Running programs of an Android build: scripts/device, scripts/test and .ci/run against a pretended adb, which takes a
 folder of this machine for the device's, and against a pretended runner."""
 

@@ -1,3 +1,5 @@
+# SPDX-FileCopyrightText: the libjni_kyface_api authors
+# SPDX-License-Identifier: Apache-2.0
 """What the tests of this folder share: a copy of the project to run its scripts in, and a pretended NDK."""
 
 import os

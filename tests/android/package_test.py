@@ -1,3 +1,5 @@
+# SPDX-FileCopyrightText: the libjni_kyface_api authors
+# SPDX-License-Identifier: Apache-2.0
 """scripts/package for Android: two ABIs, by a pretended NDK, in copies of the project in two folders."""
 
 import argparse

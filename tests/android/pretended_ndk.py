@@ -1,3 +1,5 @@
+# SPDX-FileCopyrightText: the libjni_kyface_api authors
+# SPDX-License-Identifier: Apache-2.0
 """Makes a folder that the build and the scripts take for an Android NDK: its toolchain file, its tools by their names and
 places, its system's headers as far as the project includes them, and its stand-ins for the system's libraries at API
 level 24. Behind it are this machine's clang and the C libraries of Linux.

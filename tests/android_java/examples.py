@@ -1,4 +1,6 @@
 #!/usr/bin/env python3
+# SPDX-FileCopyrightText: the libjni_kyface_api authors
+# SPDX-License-Identifier: Apache-2.0
 """Writes the Java and Kotlin examples of documents as sources that a compiler takes.
 
 examples.py --java FOLDER --kotlin FOLDER DOCUMENT...

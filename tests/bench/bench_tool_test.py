@@ -1,3 +1,5 @@
+# SPDX-FileCopyrightText: the libjni_kyface_api authors
+# SPDX-License-Identifier: Apache-2.0
 """Tests what scripts/bench makes of its measurements. Takes the folder of the package `tool`."""
 
 import sys

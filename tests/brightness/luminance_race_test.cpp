@@ -1,3 +1,6 @@
+// SPDX-FileCopyrightText: the libjni_kyface_api authors
+// SPDX-License-Identifier: Apache-2.0
+
 // Lightness measured, and so the tables rebuilt, by several threads at once. A report of ThreadSanitizer ends
 // the program with an error.
 

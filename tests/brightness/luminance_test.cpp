@@ -1,3 +1,6 @@
+// SPDX-FileCopyrightText: the libjni_kyface_api authors
+// SPDX-License-Identifier: Apache-2.0
+
 // The tables of the lightness metrics, their rebuilding, and the sum over them.
 
 #include <gtest/gtest.h>

@@ -1,3 +1,6 @@
+// SPDX-FileCopyrightText: the libjni_kyface_api authors
+// SPDX-License-Identifier: Apache-2.0
+
 // The five metrics against the formulas, written out per pixel.
 
 #include <gtest/gtest.h>

@@ -1,3 +1,5 @@
+# SPDX-FileCopyrightText: the libjni_kyface_api authors
+# SPDX-License-Identifier: Apache-2.0
 """Compiles every conceivable instance of the image library's front-ends: those that are listed must compile, each of the
 others must fail with the message that says that it does not exist."""
 

@@ -1,3 +1,5 @@
+# SPDX-FileCopyrightText: the libjni_kyface_api authors
+# SPDX-License-Identifier: Apache-2.0
 """Looks at the built shared library: what it exports, what it needs and imports, how it is laid out."""
 
 import argparse

@@ -1,3 +1,6 @@
+// SPDX-FileCopyrightText: the libjni_kyface_api authors
+// SPDX-License-Identifier: Apache-2.0
+
 // Refers to every C++ function that the shared library is meant to export. It is compiled, not linked: what
 // its object leaves undefined is the list.
 

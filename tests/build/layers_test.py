@@ -1,3 +1,5 @@
+# SPDX-FileCopyrightText: the libjni_kyface_api authors
+# SPDX-License-Identifier: Apache-2.0
 """Reads every #include: a layer may include the public headers of the layers that it stands on, and its own; headers of
 other layers are named with their layer's name. What stands on what is the table in docs/architecture.md."""
 

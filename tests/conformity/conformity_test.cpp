@@ -1,3 +1,6 @@
+// SPDX-FileCopyrightText: the libjni_kyface_api authors
+// SPDX-License-Identifier: Apache-2.0
+
 // OpenCV as a second opinion. For every conversion that both have, the largest difference between the two
 // over all inputs (8-bit) or a dense set of them (float) must be the one that the table of docs/conformity.md
 // holds, which says what it comes from.

@@ -1,3 +1,6 @@
+// SPDX-FileCopyrightText: the libjni_kyface_api authors
+// SPDX-License-Identifier: Apache-2.0
+
 // The picture of a face that the descriptor takes: where the eyes come to, and how pixels are resampled.
 #include "engine/src/aligned_face.h"
 

@@ -1,3 +1,6 @@
+// SPDX-FileCopyrightText: the libjni_kyface_api authors
+// SPDX-License-Identifier: Apache-2.0
+
 // Verifiers with a descriptor's model: random weights, written as a file.
 #include <array>
 #include <bit>

@@ -1,3 +1,5 @@
+// SPDX-FileCopyrightText: the libjni_kyface_api authors
+// SPDX-License-Identifier: Apache-2.0
 /// Seeded random models of the face descriptor, as files, and what a network with such weights gives, worked
 /// out from the definitions in double precision.
 #pragma once

@@ -1,3 +1,6 @@
+// SPDX-FileCopyrightText: the libjni_kyface_api authors
+// SPDX-License-Identifier: Apache-2.0
+
 // The face descriptor's network against its definition, and its model files.
 #include "engine/src/descriptor.h"
 

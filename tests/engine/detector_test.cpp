@@ -1,3 +1,6 @@
+// SPDX-FileCopyrightText: the libjni_kyface_api authors
+// SPDX-License-Identifier: Apache-2.0
+
 // The detector: what it finds in which frames, and how it refuses what it cannot take.
 #include <algorithm>
 #include <limits>

@@ -1,3 +1,6 @@
+// SPDX-FileCopyrightText: the libjni_kyface_api authors
+// SPDX-License-Identifier: Apache-2.0
+
 // Landmarks of dlib's model of 68 points, on the portrait and in frames that are tracked.
 #include <cmath>
 #include <vector>

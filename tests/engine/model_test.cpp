@@ -1,3 +1,6 @@
+// SPDX-FileCopyrightText: the libjni_kyface_api authors
+// SPDX-License-Identifier: Apache-2.0
+
 // Model files: detectors and landmark models that dlib serialized, and everything else.
 #include "engine/src/dlib_config.h"
 // The configuration of dlib comes first.

@@ -1,3 +1,5 @@
+// SPDX-FileCopyrightText: the libjni_kyface_api authors
+// SPDX-License-Identifier: Apache-2.0
 /// Pictures for the engine's tests: the portrait, parts and views of it, and the frames that a camera makes
 /// of them.
 #pragma once

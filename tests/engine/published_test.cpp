@@ -1,3 +1,6 @@
+// SPDX-FileCopyrightText: the libjni_kyface_api authors
+// SPDX-License-Identifier: Apache-2.0
+
 // The verifier with the published weights, where scripts/setup.sh models has fetched them.
 #include <array>
 #include <filesystem>

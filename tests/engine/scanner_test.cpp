@@ -1,3 +1,6 @@
+// SPDX-FileCopyrightText: the libjni_kyface_api authors
+// SPDX-License-Identifier: Apache-2.0
+
 // The search itself, against dlib's own: gradients, features, resized pictures and detections.
 #include "engine/src/scanner.h"
 

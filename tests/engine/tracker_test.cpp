@@ -1,3 +1,6 @@
+// SPDX-FileCopyrightText: the libjni_kyface_api authors
+// SPDX-License-Identifier: Apache-2.0
+
 // The tracker: faces keep their identities from frame to frame.
 #include <sys/mman.h>
 #include <unistd.h>

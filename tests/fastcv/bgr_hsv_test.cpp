@@ -1,3 +1,6 @@
+// SPDX-FileCopyrightText: the libjni_kyface_api authors
+// SPDX-License-Identifier: Apache-2.0
+
 // HSV and back, against the formulas: those of the pixels after a row's groups of 8, and those of the groups.
 
 #include <gtest/gtest.h>

@@ -1,3 +1,6 @@
+// SPDX-FileCopyrightText: the libjni_kyface_api authors
+// SPDX-License-Identifier: Apache-2.0
+
 // crop, rotate and rotate_YUV420: which check answers, in which order, and what reaches the kernel.
 
 #include <gtest/gtest.h>

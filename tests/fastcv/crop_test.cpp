@@ -1,3 +1,6 @@
+// SPDX-FileCopyrightText: the libjni_kyface_api authors
+// SPDX-License-Identifier: Apache-2.0
+
 // The crop kernel against its formulas: copies, 8-bit samples in groups of 8 pixels and one by one, floats.
 
 #include <gtest/gtest.h>

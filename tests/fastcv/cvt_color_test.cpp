@@ -1,3 +1,6 @@
+// SPDX-FileCopyrightText: the libjni_kyface_api authors
+// SPDX-License-Identifier: Apache-2.0
+
 // cvtColor's checks, in their order, and what it calls: every instance over kernels that only record their
 // arguments. The definitions of the kernels here take the place of the library's.
 

@@ -1,3 +1,6 @@
+// SPDX-FileCopyrightText: the libjni_kyface_api authors
+// SPDX-License-Identifier: Apache-2.0
+
 // Images whose rows lie further apart than 32 bits can say: every operation gives what it gives with the rows
 // close together.
 #include <gtest/gtest.h>

@@ -1,3 +1,6 @@
+// SPDX-FileCopyrightText: the libjni_kyface_api authors
+// SPDX-License-Identifier: Apache-2.0
+
 // Malformed matrices that pass the checks, over buffers of exactly the rows that a kernel works on: row r
 // begins r steps behind the first, whatever the step, and nothing else is touched.
 #include <gtest/gtest.h>

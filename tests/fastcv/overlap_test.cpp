@@ -1,3 +1,6 @@
+// SPDX-FileCopyrightText: the libjni_kyface_api authors
+// SPDX-License-Identifier: Apache-2.0
+
 // Images that overlap, where the front-ends allow it: what comes out is what comes out of images apart.
 #include <gtest/gtest.h>
 

@@ -1,3 +1,6 @@
+// SPDX-FileCopyrightText: the libjni_kyface_api authors
+// SPDX-License-Identifier: Apache-2.0
+
 // Right-angle rotation of packed images against the index mapping, pixel by pixel.
 
 #include <gtest/gtest.h>

@@ -1,3 +1,6 @@
+// SPDX-FileCopyrightText: the libjni_kyface_api authors
+// SPDX-License-Identifier: Apache-2.0
+
 // Rotation of whole 4:2:0 frames against the layouts, sample by sample.
 
 #include <gtest/gtest.h>

@@ -1,3 +1,6 @@
+// SPDX-FileCopyrightText: the libjni_kyface_api authors
+// SPDX-License-Identifier: Apache-2.0
+
 // The luma plane of a 4:2:0 buffer as a gray image.
 
 #include <gtest/gtest.h>

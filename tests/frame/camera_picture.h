@@ -1,3 +1,5 @@
+// SPDX-FileCopyrightText: the libjni_kyface_api authors
+// SPDX-License-Identifier: Apache-2.0
 /// A camera's picture for tests: planes of every shape, each ending at a protected page, and what any view of
 /// it is, step by step.
 #pragma once

@@ -1,3 +1,6 @@
+// SPDX-FileCopyrightText: the libjni_kyface_api authors
+// SPDX-License-Identifier: Apache-2.0
+
 // One pass over a camera's planes, against the planes turned and converted step by step.
 
 #include "frame/planes.h"

@@ -1,3 +1,5 @@
+// SPDX-FileCopyrightText: the libjni_kyface_api authors
+// SPDX-License-Identifier: Apache-2.0
 /// What the tests of the native methods share: a virtual machine that has loaded the library, a fresh engine,
 /// and an empty journal.
 #pragma once

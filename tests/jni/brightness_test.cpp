@@ -1,3 +1,6 @@
+// SPDX-FileCopyrightText: the libjni_kyface_api authors
+// SPDX-License-Identifier: Apache-2.0
+
 // The brightness methods. The metrics themselves are tested beside them; here it is which one is called, and
 // how.
 #include <cmath>

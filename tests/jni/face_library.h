@@ -1,3 +1,5 @@
+// SPDX-FileCopyrightText: the libjni_kyface_api authors
+// SPDX-License-Identifier: Apache-2.0
 /// The native methods of com.vantrel.faceapi.FaceLibrary as a virtual machine calls them.
 #pragma once
 

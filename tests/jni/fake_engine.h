@@ -1,3 +1,5 @@
+// SPDX-FileCopyrightText: the libjni_kyface_api authors
+// SPDX-License-Identifier: Apache-2.0
 /// A face engine for tests: it answers as scripted and records every call in the journal.
 #pragma once
 

@@ -1,3 +1,5 @@
+// SPDX-FileCopyrightText: the libjni_kyface_api authors
+// SPDX-License-Identifier: Apache-2.0
 /// Android's bitmap interface for tests. Log messages need no script: each is a journal line "log PRIORITY
 /// TAG: TEXT".
 #pragma once

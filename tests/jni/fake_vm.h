@@ -1,3 +1,5 @@
+// SPDX-FileCopyrightText: the libjni_kyface_api authors
+// SPDX-License-Identifier: Apache-2.0
 /// A virtual machine for tests, as one thread sees it: it records every call in the journal, models the few
 /// classes that the bridge uses, counts what is borrowed and not given back, and can refuse any call.
 #pragma once

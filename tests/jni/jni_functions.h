@@ -1,3 +1,5 @@
+// SPDX-FileCopyrightText: the libjni_kyface_api authors
+// SPDX-License-Identifier: Apache-2.0
 /// The names of every function of a JNIEnv's table, in no particular order: KY_JNI_FUNCTIONS(X) calls
 /// X(name).
 #pragma once

@@ -1,3 +1,6 @@
+// SPDX-FileCopyrightText: the libjni_kyface_api authors
+// SPDX-License-Identifier: Apache-2.0
+
 // The native methods over the open engine: faces and features go through both. What a method
 // never gives back stays in the engine's tables; tests/leaks.supp says what that is.
 #include <gtest/gtest.h>

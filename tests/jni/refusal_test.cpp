@@ -1,3 +1,6 @@
+// SPDX-FileCopyrightText: the libjni_kyface_api authors
+// SPDX-License-Identifier: Apache-2.0
+
 // The virtual machine saying no: every call that can be refused is refused, at its first, second and last
 // time, in every native method. The method answers with its failure value, nothing stays borrowed, no further
 // call is made under the exception, and the exception stays.

@@ -1,3 +1,6 @@
+// SPDX-FileCopyrightText: the libjni_kyface_api authors
+// SPDX-License-Identifier: Apache-2.0
+
 // Loading the library: what it looks up, in which order, and what a look-up that fails leaves behind.
 #include "bridge_test.h"
 

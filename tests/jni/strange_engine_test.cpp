@@ -1,3 +1,6 @@
+// SPDX-FileCopyrightText: the libjni_kyface_api authors
+// SPDX-License-Identifier: Apache-2.0
+
 // An engine that does not keep to its contract: what it says of its results is believed as far as the bridge
 // cannot know better, and nothing outside them is touched.
 #include <functional>

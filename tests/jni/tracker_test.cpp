@@ -1,3 +1,6 @@
+// SPDX-FileCopyrightText: the libjni_kyface_api authors
+// SPDX-License-Identifier: Apache-2.0
+
 // The tracker's native methods. The conversion of faces is the detector's and is tested there.
 #include "bridge_test.h"
 

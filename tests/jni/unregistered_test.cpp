@@ -1,3 +1,6 @@
+// SPDX-FileCopyrightText: the libjni_kyface_api authors
+// SPDX-License-Identifier: Apache-2.0
+
 // The library in a process where it is loaded without, or with half of, its Java classes.
 #include "bridge_test.h"
 

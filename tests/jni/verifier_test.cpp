@@ -1,3 +1,6 @@
+// SPDX-FileCopyrightText: the libjni_kyface_api authors
+// SPDX-License-Identifier: Apache-2.0
+
 // The verifier's native methods, and the conversion of faces from Java.
 #include "bridge_test.h"
 

@@ -1,3 +1,6 @@
+// SPDX-FileCopyrightText: the libjni_kyface_api authors
+// SPDX-License-Identifier: Apache-2.0
+
 // Every intrinsic that neon_x86.h takes over, against SIMDe's own; against a plain loop where SIMDe has none.
 
 #include <gtest/gtest.h>

@@ -1,3 +1,5 @@
+// SPDX-FileCopyrightText: the libjni_kyface_api authors
+// SPDX-License-Identifier: Apache-2.0
 /// Takes the place of the platform's assertion report, for death tests of what asserts its arguments: include
 /// it in one source of a test program.
 #pragma once

@@ -1,3 +1,5 @@
+// SPDX-FileCopyrightText: the libjni_kyface_api authors
+// SPDX-License-Identifier: Apache-2.0
 /// What the conversions of `cvtColor` are, read off their names: an enumerator is CVT_, the source's layout,
 /// a 2, and the destination's.
 #pragma once

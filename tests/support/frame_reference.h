@@ -1,3 +1,5 @@
+// SPDX-FileCopyrightText: the libjni_kyface_api authors
+// SPDX-License-Identifier: Apache-2.0
 /// Semi-planar 4:2:0 conversions pixel by pixel, from the formulas: what the frame helpers are compared with.
 #pragma once
 

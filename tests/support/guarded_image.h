@@ -1,3 +1,5 @@
+// SPDX-FileCopyrightText: the libjni_kyface_api authors
+// SPDX-License-Identifier: Apache-2.0
 /// Images for kernel tests: rows with padding that must stay untouched, ending flush with a protected page.
 #pragma once
 

@@ -1,3 +1,6 @@
+// SPDX-FileCopyrightText: the libjni_kyface_api authors
+// SPDX-License-Identifier: Apache-2.0
+
 // Stands in for Android's libjnigraphics, which is not everywhere where its C library is: there are no
 // bitmaps.
 #include <android/bitmap.h>

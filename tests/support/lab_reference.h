@@ -1,3 +1,5 @@
+// SPDX-FileCopyrightText: the libjni_kyface_api authors
+// SPDX-License-Identifier: Apache-2.0
 /// The tables of Lab and lightness, entry by entry from their formulas, with the platform's own math library
 /// and every rounding written out.
 #pragma once

@@ -1,3 +1,5 @@
+// SPDX-FileCopyrightText: the libjni_kyface_api authors
+// SPDX-License-Identifier: Apache-2.0
 /// Runs colour kernels over packed images, in every shape that they must take, against a formula for one
 /// pixel.
 #pragma once

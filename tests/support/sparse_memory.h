@@ -1,3 +1,5 @@
+// SPDX-FileCopyrightText: the libjni_kyface_api authors
+// SPDX-License-Identifier: Apache-2.0
 /// Memory that is only taken where it is touched, for images that are larger than any test may be.
 #pragma once
 

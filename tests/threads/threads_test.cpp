@@ -1,3 +1,6 @@
+// SPDX-FileCopyrightText: the libjni_kyface_api authors
+// SPDX-License-Identifier: Apache-2.0
+
 // Eight threads that call everything at once, from the first call on, against one thread that calls it alone.
 
 #include <gtest/gtest.h>

@@ -1,3 +1,5 @@
+// SPDX-FileCopyrightText: the libjni_kyface_api authors
+// SPDX-License-Identifier: Apache-2.0
 /// Logging of the face bridge: Android's log under one tag, and the debug switch that gates the native
 /// methods' messages.
 #pragma once

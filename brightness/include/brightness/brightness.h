@@ -1,3 +1,5 @@
+// SPDX-FileCopyrightText: the libjni_kyface_api authors
+// SPDX-License-Identifier: Apache-2.0
 /// Brightness metrics: how bright a rectangle of an image is, from 0 (dark) to 255 (bright).
 ///
 /// All five take the same arguments:

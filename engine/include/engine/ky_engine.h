@@ -1,3 +1,5 @@
+// SPDX-FileCopyrightText: the libjni_kyface_api authors
+// SPDX-License-Identifier: Apache-2.0
 /// The values that the open face engine gives to the arguments and results of the C interface in
 /// `kyface_api.h`.
 ///

@@ -1,3 +1,5 @@
+// SPDX-FileCopyrightText: the libjni_kyface_api authors
+// SPDX-License-Identifier: Apache-2.0
 /// HPC::fastcv: image kernels for camera frames, vectorised for 64-bit Arm.
 ///
 /// Callers wrap their pixel buffers in matrices (`Mat`) and call a front-end: `cvtColor`, `crop`, `rotate` or

@@ -1,3 +1,5 @@
+// SPDX-FileCopyrightText: the libjni_kyface_api authors
+// SPDX-License-Identifier: Apache-2.0
 /// The kernels of HPC::fastcv: one entry point for each operation, called by the front-ends once their checks
 /// have passed.
 ///

@@ -1,3 +1,6 @@
+// SPDX-FileCopyrightText: the libjni_kyface_api authors
+// SPDX-License-Identifier: Apache-2.0
+
 // Gray of BGR and BGRA, and gray spread over the colour channels.
 //
 //   8-bit: gray = (29 B + 150 G + 77 R + 128) >> 8

@@ -1,3 +1,6 @@
+// SPDX-FileCopyrightText: the libjni_kyface_api authors
+// SPDX-License-Identifier: Apache-2.0
+
 // BGR and BGRA to HSV and back.
 //
 // With max, min the largest and smallest of B, G, R, all scaled to 1 in 8 bits, and the epsilon of a float:

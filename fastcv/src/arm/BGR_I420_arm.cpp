@@ -1,3 +1,6 @@
+// SPDX-FileCopyrightText: the libjni_kyface_api authors
+// SPDX-License-Identifier: Apache-2.0
+
 // Planar YUV 4:2:0 (I420) to and from BGR and BGRA.
 //
 // BT.601, limited range, in 20-bit fixed point. Shifts floor; U and V are the stored bytes minus 128:

@@ -1,3 +1,6 @@
+// SPDX-FileCopyrightText: the libjni_kyface_api authors
+// SPDX-License-Identifier: Apache-2.0
+
 // BGR to and from CIE L*a*b* (sRGB primaries, D65 white).
 //
 // 8-bit BGR to Lab is integer arithmetic over the tables of gamma and cube roots:

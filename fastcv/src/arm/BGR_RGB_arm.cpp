@@ -1,3 +1,6 @@
+// SPDX-FileCopyrightText: the libjni_kyface_api authors
+// SPDX-License-Identifier: Apache-2.0
+
 // Channel reorderings: alpha added or dropped, red and blue swapped. Values are moved bit for bit.
 
 #include "entry.h"

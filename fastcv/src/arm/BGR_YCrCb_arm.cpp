@@ -1,3 +1,6 @@
+// SPDX-FileCopyrightText: the libjni_kyface_api authors
+// SPDX-License-Identifier: Apache-2.0
+
 // BGR and BGRA to YCrCb and back: full-range BT.601 weights, chroma around 128, or 0.5 in float.
 //
 //   8-bit:  Y  = (1868 B + 9617 G + 4899 R + 8192) >> 14

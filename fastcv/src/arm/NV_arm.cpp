@@ -1,3 +1,6 @@
+// SPDX-FileCopyrightText: the libjni_kyface_api authors
+// SPDX-License-Identifier: Apache-2.0
+
 // Semi-planar YUV 4:2:0 (NV21, NV12) to and from BGR, RGB, BGRA and RGBA: the way that every camera frame
 // takes.
 //

@@ -1,3 +1,6 @@
+// SPDX-FileCopyrightText: the libjni_kyface_api authors
+// SPDX-License-Identifier: Apache-2.0
+
 // The gray image of a YUV 4:2:0 buffer: its luma plane, which every layout has first.
 
 #include <cstddef>

@@ -1,3 +1,6 @@
+// SPDX-FileCopyrightText: the libjni_kyface_api authors
+// SPDX-License-Identifier: Apache-2.0
+
 // Cropping, with or without a scale factor.
 //
 // A factor of exactly 1 copies. With any other, a float sample becomes the product, and an 8-bit sample s

@@ -1,3 +1,5 @@
+// SPDX-FileCopyrightText: the libjni_kyface_api authors
+// SPDX-License-Identifier: Apache-2.0
 /// How a kernel family defines its entry points: one line for each instance, as in a table.
 #pragma once
 

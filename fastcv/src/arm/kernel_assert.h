@@ -1,3 +1,5 @@
+// SPDX-FileCopyrightText: the libjni_kyface_api authors
+// SPDX-License-Identifier: Apache-2.0
 /// Argument checks of the kernels that have them: a failed check is reported through the platform's
 /// `__assert2` and ends the process, in every build type.
 #pragma once

@@ -1,3 +1,5 @@
+// SPDX-FileCopyrightText: the libjni_kyface_api authors
+// SPDX-License-Identifier: Apache-2.0
 /// powf(t, 0.33333334f), the cube root of the float way to Lab, four at a time.
 #pragma once
 

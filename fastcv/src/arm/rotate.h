@@ -1,3 +1,5 @@
+// SPDX-FileCopyrightText: the libjni_kyface_api authors
+// SPDX-License-Identifier: Apache-2.0
 /// Rotation of images whose pixels are `bytes` bytes of no type: what the rotation workers and the 4:2:0
 /// rotations share.
 #pragma once

@@ -1,3 +1,6 @@
+// SPDX-FileCopyrightText: the libjni_kyface_api authors
+// SPDX-License-Identifier: Apache-2.0
+
 // Rotation of whole YUV 4:2:0 frames by right angles: the luma as an image of one-byte pixels; the chroma of
 // a semi-planar frame as one of two-byte pixels, of a planar frame plane by plane.
 //

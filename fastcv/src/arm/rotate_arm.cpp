@@ -1,3 +1,6 @@
+// SPDX-FileCopyrightText: the libjni_kyface_api authors
+// SPDX-License-Identifier: Apache-2.0
+
 // Rotation of packed images by right angles. With H and W the source's height and width, destination pixel
 // (row r, column c) is source pixel
 //

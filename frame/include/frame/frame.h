@@ -1,3 +1,5 @@
+// SPDX-FileCopyrightText: the libjni_kyface_api authors
+// SPDX-License-Identifier: Apache-2.0
 /// Frame helpers: conversions, crop and rotation of whole camera frames in caller memory.
 ///
 /// Every buffer is packed (no stride): a semi-planar 4:2:0 frame is `width * height` luma bytes followed by

@@ -1,3 +1,5 @@
+// SPDX-FileCopyrightText: the libjni_kyface_api authors
+// SPDX-License-Identifier: Apache-2.0
 /// The picture of a camera (YUV_420_888: a luma plane and two chroma planes, with strides) as the picture
 /// that an app shows or analyses: any rectangle of it, upright, mirrored, in its pixel format, in one pass.
 #pragma once

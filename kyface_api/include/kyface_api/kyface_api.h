@@ -1,3 +1,5 @@
+// SPDX-FileCopyrightText: the libjni_kyface_api authors
+// SPDX-License-Identifier: Apache-2.0
 /// The face engine's C interface (`libkyface_api`), as the bridge uses it.
 ///
 /// The engine is a separate shared library with unmangled functions. Records cross the boundary as they stand

@@ -1,3 +1,5 @@
+// SPDX-FileCopyrightText: the libjni_kyface_api authors
+// SPDX-License-Identifier: Apache-2.0
 /// Android's access to the pixels of `android.graphics.Bitmap` objects, as far as the library uses it, for
 /// desktops.
 ///

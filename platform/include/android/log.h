@@ -1,3 +1,5 @@
+// SPDX-FileCopyrightText: the libjni_kyface_api authors
+// SPDX-License-Identifier: Apache-2.0
 /// Android's logging interface, as far as the library uses it, for desktops.
 ///
 /// Messages go to standard error, one line each: the priority's letter, the tag, the text ("E/FaceAPI:

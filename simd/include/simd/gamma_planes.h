@@ -1,3 +1,5 @@
+// SPDX-FileCopyrightText: the libjni_kyface_api authors
+// SPDX-License-Identifier: Apache-2.0
 /// Look-ups in the gamma table for 16 bytes at a time.
 #pragma once
 

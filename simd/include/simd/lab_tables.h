@@ -1,3 +1,5 @@
+// SPDX-FileCopyrightText: the libjni_kyface_api authors
+// SPDX-License-Identifier: Apache-2.0
 /// The tables behind Lab and lightness, computed at compile time: immutable, and the same on every platform.
 ///
 /// No math library takes part. The entries are defined through `pow` in double and through fused steps in

@@ -1,3 +1,5 @@
+// SPDX-FileCopyrightText: the libjni_kyface_api authors
+// SPDX-License-Identifier: Apache-2.0
 /// The loops that all kernels share: along a row, over rows, over pairs of rows.
 ///
 /// A kernel brings what happens to a block of pixels and to a single one; the loops bring blocks in flight,

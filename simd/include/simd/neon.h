@@ -1,3 +1,5 @@
+// SPDX-FileCopyrightText: the libjni_kyface_api authors
+// SPDX-License-Identifier: Apache-2.0
 /// The NEON intrinsics: the compiler's own on Arm, SIMDe's on x86-64, some of them in a better form. Kernels
 /// include nothing else for them.
 #pragma once

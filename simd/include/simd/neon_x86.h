@@ -1,3 +1,5 @@
+// SPDX-FileCopyrightText: the libjni_kyface_api authors
+// SPDX-License-Identifier: Apache-2.0
 /// NEON intrinsics in SSE and AVX: those that SIMDe emulates lane by lane (with GCC all that widen or
 /// narrow) or for aligned memory only, and those that it lacks. Included by neon.h after SIMDe; the table at
 /// the end says which names are taken over. SIMDe's own stay reachable with their prefix, and the tests

@@ -1,3 +1,5 @@
+// SPDX-FileCopyrightText: the libjni_kyface_api authors
+// SPDX-License-Identifier: Apache-2.0
 /// Full-range YUV 4:2:0 to colours: what the conversions of whole frames and of a camera's planes share. The
 /// coefficients are this library's own; with U and V the stored bytes minus 128:
 ///

@@ -1,3 +1,5 @@
+// SPDX-FileCopyrightText: the libjni_kyface_api authors
+// SPDX-License-Identifier: Apache-2.0
 /// The pixel vocabulary of the kernels: a block of interleaved pixels in registers, one vector a channel, and
 /// how it is loaded and stored. 8-bit blocks hold 16 pixels, float blocks 4.
 #pragma once

@@ -1,3 +1,5 @@
+// SPDX-FileCopyrightText: the libjni_kyface_api authors
+// SPDX-License-Identifier: Apache-2.0
 /// Tiles: small blocks of whole pixels, read along source rows and written along destination rows after a
 /// transposition in registers. Rotations by 90 and 270 degrees are made of them.
 ///

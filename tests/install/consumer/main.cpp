@@ -1,3 +1,6 @@
+// SPDX-FileCopyrightText: the libjni_kyface_api authors
+// SPDX-License-Identifier: Apache-2.0
+
 #include <fastcv/fastcv.h>
 
 using namespace HPC::fastcv;

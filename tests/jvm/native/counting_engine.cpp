@@ -1,3 +1,5 @@
+// SPDX-FileCopyrightText: the libjni_kyface_api authors
+// SPDX-License-Identifier: Apache-2.0
 /// A face engine that costs nothing and counts what it has handed out.
 ///
 /// Detection and tracking find as many faces as the image's first byte says, each with as many points as its

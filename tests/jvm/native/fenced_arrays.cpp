@@ -1,3 +1,5 @@
+// SPDX-FileCopyrightText: the libjni_kyface_api authors
+// SPDX-License-Identifier: Apache-2.0
 /// An agent of the virtual machine that puts fences around every array that native code borrows: memory of
 /// its own for each, which ends, or begins, at a page that may not be touched. What is read or written beyond
 /// that end is a fault on the spot, what is written beyond the other one is found when the array is given

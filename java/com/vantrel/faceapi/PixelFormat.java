@@ -1,3 +1,6 @@
+// SPDX-FileCopyrightText: the libjni_kyface_api authors
+// SPDX-License-Identifier: Apache-2.0
+
 package com.vantrel.faceapi;
 
 /** How the pixels of an image are laid out in memory. What an engine calls a layout is {@link EngineProfile}'s. */

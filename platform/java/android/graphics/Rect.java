@@ -1,3 +1,6 @@
+// SPDX-FileCopyrightText: the libjni_kyface_api authors
+// SPDX-License-Identifier: Apache-2.0
+
 package android.graphics;
 
 /** Stand-in for Android's rectangle, for desktops: four integer edges. */
