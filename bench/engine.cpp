@@ -1,3 +1,6 @@
+// SPDX-FileCopyrightText: the libjni_kyface_api authors
+// SPDX-License-Identifier: Apache-2.0
+
 // What the open engine needs for a frame: run under the counting plugin, or by itself for its time,
 //
 //   bench_engine count|time REPEATS PORTRAIT [LANDMARKS]
