@@ -7,13 +7,13 @@
 
 #include <algorithm>
 #include <cmath>
-#include <limits>
 #include <memory>
 #include <mutex>
 #include <tuple>
 #include <utility>
 #include <vector>
 
+#include "identities.h"
 #include "search.h"
 
 namespace kyengine {
@@ -198,21 +198,13 @@ class Tracker {
       }
       faces_.erase(least);
     }
-    const int32_t id = NewId();
+    const int32_t id = identities_.Next([this](int32_t number) {
+      return std::any_of(faces_.begin(), faces_.end(),
+                         [number](const TrackedFace& face) { return face.id == number; });
+    });
     TrackedFace& face = faces_.emplace_back();
     face.id = id;
     Confirm(face, found);
-  }
-
-  int32_t NewId() {
-    const auto taken = [this](int32_t id) {
-      return std::any_of(faces_.begin(), faces_.end(),
-                         [id](const TrackedFace& face) { return face.id == id; });
-    };
-    do {
-      last_id_ = last_id_ == std::numeric_limits<int32_t>::max() ? 1 : last_id_ + 1;
-    } while (taken(last_id_));
-    return last_id_;
   }
 
   std::vector<ky_face_t> Records(const Frame& frame) const {
@@ -238,7 +230,7 @@ class Tracker {
   int width_ = 0;
   int height_ = 0;
   int frames_to_detection_ = 0;
-  int32_t last_id_ = 0;
+  Identities identities_;
   Faces faces_;
   GrayImage gray_;
 };

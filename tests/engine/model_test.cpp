@@ -13,6 +13,7 @@
 #include <map>
 #include <sstream>
 #include <string>
+#include <tuple>
 
 #include "engine_calls.h"
 #include "landmark_model.h"
@@ -273,6 +274,19 @@ TEST_F(ModelTest, PoseOfSixtyEightPoints) {
     EXPECT_NEAR(yaw, face.yaw, 4) << pitch;
     EXPECT_NEAR(pitch, face.pitch, 4) << yaw;
   }
+  // A face that is its own mirror image looks straight ahead, whatever its proportions.
+  // Points are whole pixels: their distances from the middle are.
+  const ky_rect_t box = FaceWith(nullptr).rect;
+  const float side = static_cast<float>(box.right - 1 - box.left);
+  const float middle = std::floor(side / 2) / side;
+  std::vector<ky_pointf_t> symmetric(68, {middle, 0.5F});
+  for (const auto& [left, right, pixels, down] :
+       {std::tuple(size_t{36}, size_t{45}, 26, 0.3F), std::tuple(size_t{48}, size_t{54}, 21, 0.8F)}) {
+    symmetric[left] = {middle - static_cast<float>(pixels) / side, down};
+    symmetric[right] = {middle + static_cast<float>(pixels) / side, down};
+  }
+  EXPECT_NEAR(0, FaceWith(Write("pose", Landmarks(symmetric)).c_str()).yaw, 0.01);
+
   // Points in one place are no head.
   const ky_face_t none =
       FaceWith(Write("pose", Landmarks(std::vector<ky_pointf_t>(68, {0.5F, 0.5F}))).c_str());

@@ -281,6 +281,26 @@ TEST(TrackerTest, FaceLimitIsHonoured) {
   EXPECT_EQ(best[0].id, lowered[0].id);
 }
 
+TEST(TrackerTest, FacesComeByTheirScores) {
+  const Detector detector(KY_CONFIG_LARGE_FACES);
+  Detected both;
+  ASSERT_EQ(KY_SUCCESS, Detect(detector, TestFrame(Pair(true, true)), both));
+  ASSERT_EQ(2, both.count);
+  ASSERT_GT(both[0].score, both[1].score);
+  // The less certain one is there first, and has the lower number.
+  const bool left = both[1].rect.left < both[0].rect.left;
+  const EveryNth tracker(1);
+  Tracked first;
+  ASSERT_EQ(KY_SUCCESS, Track(tracker, TestFrame(Pair(left, !left)), first));
+  ASSERT_EQ(1, first.count);
+  Tracked second;
+  ASSERT_EQ(KY_SUCCESS, Track(tracker, TestFrame(Pair(true, true)), second));
+  ASSERT_EQ(2, second.count);
+  EXPECT_GT(second[0].score, second[1].score);
+  EXPECT_GT(second[0].id, first[0].id);
+  EXPECT_EQ(first[0].id, second[1].id);
+}
+
 TEST(TrackerTest, NewFaceTakesThePlaceOfOneOutOfSight) {
   const EveryNth tracker(1);
   ASSERT_EQ(KY_SUCCESS, ky_face_track_set_detect_face_cnt_limit(tracker, 1, nullptr));

@@ -208,10 +208,12 @@ inline void checkColours(const PackedKernel<unsigned char>& kernel, const Colour
 }
 
 /// All 2^24 colours of a kernel of three channels; of one with a fourth somewhere, whose arithmetic is the
-/// same, every 17th. Then every 17th in rows of 4 pixels, which are done pixel by pixel.
+/// same, every 17th. Then every 17th in rows of 4 pixels, which are done pixel by pixel, and in rows of 8, a
+/// group but no block of bytes.
 inline void checkAllColours(const PackedKernel<unsigned char>& kernel) {
   checkColours(kernel, {.step = kernel.ncSrc == 4 || kernel.ncDst == 4 ? 17 : 1});
   checkColours(kernel, {.step = 17, .width = 4, .pad = 1});
+  checkColours(kernel, {.step = 17, .width = 8, .pad = 1});
 }
 
 }  // namespace kyface::test

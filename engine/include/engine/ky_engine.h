@@ -65,6 +65,9 @@ typedef enum ky_config_t {
 /// A face's score is the detector's confidence m (its distance from the border between face and no face) as
 /// 1 / (1 + exp(-m)): 0.5 at the border, towards 1 for what is certainly a face. A detection counts when its
 /// score reaches the threshold; 1 lets nothing pass.
+///
+/// The faces of a frame come in the order of their scores, the most certain first. Of equal ones a detector's
+/// come from top to bottom, then from left to right; a tracker's by their identities.
 #define KY_DEFAULT_THRESHOLD 0.55f
 #define KY_MIN_THRESHOLD 0.01f
 #define KY_MAX_THRESHOLD 1.0f
@@ -72,9 +75,9 @@ typedef enum ky_config_t {
 /// A tracker looks for faces in the first frame and then in every `interval`-th; in the frames between it
 /// follows those that it knows. A face keeps its identity, a number from 1 on, as long as detections overlap
 /// with where it is followed to, through up to KY_FORGIVEN_MISSES detections in a row that miss it; no living
-/// face's number is given to another, and ky_face_reset_tracker does not start the numbers over. The score of
-/// a face is that of its last detection. Frames of one tracker have one size and orientation: a frame of
-/// another size starts anew.
+/// face's number is given to another (after 2^31 - 1 the numbers begin anew), and ky_face_reset_tracker does
+/// not start the numbers over. The score of a face is that of its last detection. Frames of one tracker have
+/// one size and orientation: a frame of another size starts anew.
 #define KY_DEFAULT_DETECT_INTERVAL 10
 #define KY_MIN_DETECT_INTERVAL 1
 #define KY_MAX_DETECT_INTERVAL 1000
