@@ -1,11 +1,10 @@
 # SPDX-FileCopyrightText: the libjni_kyface_api authors
 # SPDX-License-Identifier: Apache-2.0
-# 64-bit Arm Linux with clang 19 (the compiler family of Android's NDK) over the libraries of Debian's cross GCC.
+# 64-bit Arm Linux with clang (the compiler family of Android's NDK) over the libraries of Debian's cross GCC.
 # Programs run under qemu-user; cortex-a76 is a plain NEON core with the dot product, no SVE.
 set(CMAKE_SYSTEM_NAME Linux)
 set(CMAKE_SYSTEM_PROCESSOR aarch64)
-set(CMAKE_C_COMPILER clang-19)
-set(CMAKE_CXX_COMPILER clang++-19)
+include(${CMAKE_CURRENT_LIST_DIR}/clang.cmake)
 set(CMAKE_C_COMPILER_TARGET aarch64-linux-gnu)
 set(CMAKE_CXX_COMPILER_TARGET aarch64-linux-gnu)
 foreach(kind EXE SHARED MODULE)

@@ -12,7 +12,11 @@
 # tests of that label. Nothing else needs the last two. Packages that are there already are left
 # alone, and nothing is asked when all are. Packages of this machine are installed with apt-get (through sudo when not
 # root). Packages of 64-bit Arm are unpacked into .deps/arm64: installing them would pull this system's own packages
-# along.
+# along. Names differ from one Debian to the next:
+#
+#   a|b         one of these: any that is there, or the first that can be had
+#   clang-LLVM  with the version of LLVM's packages that there is, by cmake/llvm-versions
+#   a:pattern   (64-bit Arm) the packages that package a depends on whose names match
 # shellcheck source=scripts/common.sh
 source "$(dirname "${BASH_SOURCE[0]}")/common.sh"
 
@@ -23,14 +27,14 @@ packages_host=(
   libdlib-data                 # its landmark model, for the demo and the tests
   googletest                   # sources; the tests are built from them for both presets
   libopencv-imgproc-dev        # the conformity test's second opinion
-  openjdk-17-jdk-headless      # javac, JNI headers and the virtual machine
+  'java17-sdk-headless|default-jdk-headless' # javac, JNI headers and the virtual machine: any JDK from 17 on
   junit4                       # the tests in the virtual machine
   libjetbrains-annotations-java # nullability annotations, for the compiler only
   python3                      # the tests that look at what was built; scripts/bench
 )
 packages_aarch64=(
   "${packages_host[@]}"
-  clang-19 lld-19 llvm-19      # the compiler family of Android's NDK
+  clang-LLVM lld-LLVM llvm-LLVM # the compiler family of Android's NDK
   g++-aarch64-linux-gnu        # the C and C++ libraries that it compiles and links against
   qemu-user                    # runs the result
 )
@@ -44,12 +48,12 @@ packages_android_java=(
 )
 packages_lint=(
   "${packages_aarch64[@]}"
-  clang-format-19 clang-tidy-19
+  clang-format-LLVM clang-tidy-LLVM
 )
 packages_fuzz=(
   "${packages_host[@]}"
-  clang-19 lld-19 llvm-19
-  libclang-rt-19-dev           # libFuzzer, the sanitizers, coverage
+  clang-LLVM lld-LLVM llvm-LLVM
+  libclang-rt-LLVM-dev         # libFuzzer, the sanitizers, coverage
 )
 packages_coverage=("${packages_fuzz[@]}")
 packages_bench=(
@@ -61,15 +65,16 @@ packages_bench=(
 # Unpacked for 64-bit Arm: a root folder that qemu-aarch64 takes with -L.
 arm64_aarch64=(
   libdlib-dev                                 # the open engine's static library
-  openjdk-17-jre-headless                     # the virtual machine,
+  'default-jre-headless:openjdk-.*'           # the virtual machine,
   libc6 libgcc-s1 libstdc++6 zlib1g           # what it is linked with,
   liblcms2-2 libjpeg62-turbo                  # and what it reads pictures with
 )
 arm64_bench=(
   "${arm64_aarch64[@]}"
-  libyuv-dev libyuv0                                                # the peers,
-  libopencv-core-dev libopencv-imgproc-dev
-  libopencv-core406 libopencv-imgproc406 libtbb12                   # and what they are linked with
+  libyuv-dev 'libyuv-dev:libyuv[0-9]+'                              # the peers,
+  libopencv-core-dev 'libopencv-core-dev:libopencv-core[0-9].*'
+  libopencv-imgproc-dev 'libopencv-imgproc-dev:libopencv-imgproc[0-9].*'
+  libtbb12                                                          # and what they are linked with
   libblas3 liblapack3 libgfortran5
   libglx0 libglvnd0 libx11-6 libxcb1 libxau6 libxdmcp6 libbsd0 libmd0
 )
@@ -87,25 +92,64 @@ as_root() {
   fi
 }
 
+# The packages that are installed and what they provide, each between spaces.
+installed=" $(dpkg-query -W -f '${db:Status-Abbrev}${Package}, ${Provides}\n' 2>/dev/null |
+  sed -n 's/^ii *//p' | sed 's/([^)]*)//g' | tr -s ', \n' ' ') "
+is_installed() { [[ $installed == *" $1 "* ]]; }
+
+# Package lists may be absent or out of date: they are fetched when something is not in them, not before, and once.
+fresh_lists=
+fetch_lists() {
+  [ -z "$fresh_lists" ] || return 1
+  say "fetching package lists"
+  as_root apt-get update -q >&2 || return 1
+  fresh_lists=yes
+}
+
+# first_available NAME...: sets $available to the first package of these that the package lists have.
+first_available() {
+  while :; do
+    for available in "$@"; do
+      [ -z "$(apt-cache show --no-all-versions "$available" 2>/dev/null)" ] || return 0
+    done
+    fetch_lists || return 1
+  done
+}
+
+# choose_llvm: sets $llvm to the version of LLVM's packages.
+choose_llvm() {
+  local versions
+  readarray -t versions <cmake/llvm-versions
+  llvm=${versions[0]}
+  ! is_installed "clang-$llvm" || return 0
+  if first_available "${versions[@]/#/clang-}"; then
+    llvm=${available#clang-}
+  else
+    fail "there is no package of clang from 16 on"
+  fi
+}
+
 # install_packages NAME...: installs those that are missing.
 install_packages() {
-  local installed missing=() name
-  installed=" $(dpkg-query -W -f '${db:Status-Abbrev}${binary:Package}\n' 2>/dev/null |
-    sed -n 's/^ii *\([^:]*\).*/\1/p' | tr '\n' ' ') "
+  local missing=() name alternatives alternative
   for name in "$@"; do
-    case $installed in
-      *" $name "*) ;;
-      *) missing+=("$name") ;;
-    esac
+    IFS='|' read -r -a alternatives <<<"$name"
+    for alternative in "${alternatives[@]}"; do
+      ! is_installed "$alternative" || continue 2
+    done
+    if [ ${#alternatives[@]} -gt 1 ]; then
+      first_available "${alternatives[@]}" || fail "there is no package of $name"
+      missing+=("$available")
+    else
+      missing+=("$name")
+    fi
   done
   [ ${#missing[@]} -gt 0 ] || return 0
 
   say "installing ${missing[*]}"
-  # Package lists may be absent or out of date: fetch them when a first attempt fails, not before.
   local install=(apt-get install -y -q --no-install-recommends "${missing[@]}")
   if ! as_root "${install[@]}" >&2; then
-    say "trying again with fresh package lists"
-    as_root apt-get update -q >&2
+    fetch_lists || fail "could not install ${missing[*]}"
     as_root "${install[@]}" >&2 || fail "could not install ${missing[*]}"
   fi
 }
@@ -124,20 +168,20 @@ relink() {
 # an empty list of installed packages and folders of its own on the command line, so that this system's
 # configuration stays as it is and no root is needed.
 unpack_arm64() {
-  local record=$deps/arm64.packages missing=() name work
+  local record=$deps/arm64.packages missing=() names=() found name work
   mkdir -p "$arm64_root"
   exec 9>"$deps/lock"
   flock 9 # another script may be at it
   touch "$record"
   for name in "$@"; do
-    grep -qx "$name" "$record" || missing+=("$name")
+    grep -qxF "$name" "$record" || missing+=("$name")
   done
   if [ ${#missing[@]} -eq 0 ]; then
     exec 9>&-
     return 0
   fi
 
-  say "unpacking ${missing[*]} for arm64 into .deps/arm64"
+  say "unpacking packages of arm64 into .deps/arm64"
   work=$deps/apt
   rm -rf "$work"
   mkdir -p "$work"/lists/partial "$work"/cache/archives/partial "$work"/packages
@@ -147,8 +191,19 @@ unpack_arm64() {
     -o Dir::Cache="$work/cache" -o Acquire::Languages=none -o APT::Sandbox::User=root)
   # A source without arm64 packages is no obstacle as long as another has what is needed.
   "${apt[@]}" update >&2 || say "not every package source could be read"
-  (cd "$work/packages" && "${apt[@]}" download "${missing[@]}" >&2) ||
-    fail "could not download ${missing[*]} for arm64 from this system's package sources"
+  for name in "${missing[@]}"; do
+    case $name in
+      *:*)
+        readarray -t found < <(apt-cache "${apt[@]:1}" depends --important "${name%%:*}" |
+          sed -nE "s/^ *\|?Depends: (${name#*:})$/\1/p")
+        [ ${#found[@]} -gt 0 ] || fail "${name%%:*} of arm64 depends on nothing like ${name#*:}"
+        names+=("${found[@]}")
+        ;;
+      *) names+=("$name") ;;
+    esac
+  done
+  (cd "$work/packages" && "${apt[@]}" download "${names[@]}" >&2) ||
+    fail "could not download ${names[*]} for arm64 from this system's package sources"
   for name in "$work"/packages/*.deb; do
     dpkg-deb -x "$name" "$arm64_root"
   done
@@ -297,8 +352,15 @@ for group in "$@"; do
   esac
 done
 readarray -t packages < <(printf '%s\n' "${packages[@]}" | awk '!seen[$0]++')
+if [[ ${packages[*]} == *LLVM* ]]; then
+  choose_llvm
+  packages=("${packages[@]//LLVM/$llvm}")
+fi
 install_packages "${packages[@]}"
-[ ${#arm64[@]} -eq 0 ] || unpack_arm64 "${arm64[@]}"
+if [ ${#arm64[@]} -gt 0 ]; then
+  readarray -t arm64 < <(printf '%s\n' "${arm64[@]}" | awk '!seen[$0]++')
+  unpack_arm64 "${arm64[@]}"
+fi
 [ -z "$models" ] || make_models
 [ -z "$android_java" ] || fetch_android_java
 [ -z "$dlib" ] || unpack_dlib_source

@@ -20,6 +20,9 @@
 // is counted when it is entered, so the block of a marker belongs to the lap that the marker ends; a program
 // that subtracts one lap from another need not care.
 
+#define _GNU_SOURCE  // RTLD_DEFAULT
+
+#include <dlfcn.h>
 #include <inttypes.h>
 #include <stdbool.h>
 #include <stddef.h>
@@ -28,11 +31,13 @@
 #include <stdlib.h>
 #include <string.h>
 
-// The emulator's plugin interface, version 1, as far as it is used here. No package brings it as a header.
+// The emulator's plugin interface, as far as it is used here, in both of its forms: version 1 (before QEMU 9)
+// and version 3 (from 9.1 on; the 2 in between is refused by the emulator). No package brings it as a header.
 typedef uint64_t qemu_plugin_id_t;
 struct qemu_info;
 struct qemu_plugin_tb;
 struct qemu_plugin_insn;
+struct qemu_plugin_scoreboard;
 enum qemu_plugin_op { QEMU_PLUGIN_INLINE_ADD_U64 };
 enum qemu_plugin_cb_flags { QEMU_PLUGIN_CB_NO_REGS };
 typedef void (*qemu_plugin_vcpu_tb_trans_cb_t)(qemu_plugin_id_t id, struct qemu_plugin_tb* tb);
@@ -42,31 +47,62 @@ extern void qemu_plugin_register_vcpu_tb_trans_cb(qemu_plugin_id_t id,
                                                   qemu_plugin_vcpu_tb_trans_cb_t callback);
 extern void qemu_plugin_register_atexit_cb(qemu_plugin_id_t id, qemu_plugin_udata_cb_t callback,
                                            void* userdata);
-extern void qemu_plugin_register_vcpu_tb_exec_inline(struct qemu_plugin_tb* tb, enum qemu_plugin_op op,
-                                                     void* counter, uint64_t addend);
 extern void qemu_plugin_register_vcpu_insn_exec_cb(struct qemu_plugin_insn* insn,
                                                    qemu_plugin_vcpu_udata_cb_t callback,
                                                    enum qemu_plugin_cb_flags flags, void* userdata);
 extern size_t qemu_plugin_tb_n_insns(const struct qemu_plugin_tb* tb);
 extern uint64_t qemu_plugin_tb_vaddr(const struct qemu_plugin_tb* tb);
 extern struct qemu_plugin_insn* qemu_plugin_tb_get_insn(const struct qemu_plugin_tb* tb, size_t index);
-extern const void* qemu_plugin_insn_data(const struct qemu_plugin_insn* insn);
+
+// Version 1 alone: a counter is a number of the plugin's, and instructions are where the emulator has them.
+#define WEAK __attribute__((weak))
+WEAK extern void qemu_plugin_register_vcpu_tb_exec_inline(struct qemu_plugin_tb* tb, enum qemu_plugin_op op,
+                                                          void* counter, uint64_t addend);
+typedef const void* (*insn_data_1)(const struct qemu_plugin_insn* insn);
+
+// Version 3 alone: a counter is a place in an array that each processor has its own of, and instructions are
+// copied.
+typedef struct {
+  struct qemu_plugin_scoreboard* score;
+  size_t offset;
+} qemu_plugin_u64;
+WEAK extern struct qemu_plugin_scoreboard* qemu_plugin_scoreboard_new(size_t element_size);
+WEAK extern uint64_t qemu_plugin_u64_sum(qemu_plugin_u64 entry);
+WEAK extern void qemu_plugin_register_vcpu_tb_exec_inline_per_vcpu(struct qemu_plugin_tb* tb,
+                                                                   enum qemu_plugin_op op,
+                                                                   qemu_plugin_u64 entry, uint64_t addend);
+typedef size_t (*insn_data_3)(const struct qemu_plugin_insn* insn, void* data, size_t size);
 
 #define EXPORTED __attribute__((visibility("default")))
 
 EXPORTED extern int qemu_plugin_version;
 EXPORTED int qemu_plugin_install(qemu_plugin_id_t id, const struct qemu_info* info, int argc, char** argv);
 
-int qemu_plugin_version = 1;
+// Read before anything of this library is called, but for what runs when it is loaded.
+int qemu_plugin_version;
+
+static union {
+  void* symbol;
+  insn_data_1 of_version_1;
+  insn_data_3 of_version_3;
+} insn_data;
+
+__attribute__((constructor)) static void choose_version(void) {
+  qemu_plugin_version = qemu_plugin_register_vcpu_tb_exec_inline != NULL ? 1 : 3;
+  insn_data.symbol = dlsym(RTLD_DEFAULT, "qemu_plugin_insn_data");
+}
 
 static const uint32_t kMarker = 0xd5032e1f;  // hint #112
 
 struct block {
   struct block* next;  // in the bucket
   uint64_t address;
-  size_t length;        // instructions
-  uint64_t executions;  // incremented by the emulated code itself
-  uint64_t before;      // executions when the lap began
+  size_t length;      // instructions
+  union {             // incremented by the emulated code itself
+    uint64_t number;  // of version 1
+    qemu_plugin_u64 entry;
+  } executions;
+  uint64_t before;  // executions when the lap began
   size_t id;
   uint32_t words[];
 };
@@ -86,6 +122,20 @@ static void* checked(void* memory) {
   return memory;
 }
 
+static uint64_t executions_of(const struct block* block) {
+  return qemu_plugin_version == 1 ? block->executions.number : qemu_plugin_u64_sum(block->executions.entry);
+}
+
+// Version 3 hands counters out by the thousand.
+static qemu_plugin_u64 new_entry(size_t id) {
+  enum { kEntries = 4096 };
+  static struct qemu_plugin_scoreboard* score;
+  if (id % kEntries == 0) {
+    score = qemu_plugin_scoreboard_new(kEntries * sizeof(uint64_t));
+  }
+  return (qemu_plugin_u64){score, id % kEntries * sizeof(uint64_t)};
+}
+
 static struct block* new_block(uint64_t address, size_t length, const uint32_t* words) {
   if (block_count == block_capacity) {
     block_capacity = block_capacity == 0 ? 4096 : 2 * block_capacity;
@@ -96,6 +146,9 @@ static struct block* new_block(uint64_t address, size_t length, const uint32_t* 
   block->length = length;
   memcpy(block->words, words, length * sizeof(*words));
   block->id = block_count;
+  if (qemu_plugin_version != 1) {
+    block->executions.entry = new_entry(block->id);
+  }
   blocks[block_count++] = block;
   return block;
 }
@@ -111,7 +164,12 @@ static struct block* block_of(const struct qemu_plugin_tb* tb) {
     abort();
   }
   for (size_t i = 0; i < length; ++i) {
-    memcpy(&words[i], qemu_plugin_insn_data(qemu_plugin_tb_get_insn(tb, i)), sizeof(words[i]));
+    const struct qemu_plugin_insn* insn = qemu_plugin_tb_get_insn(tb, i);
+    if (qemu_plugin_version == 1) {
+      memcpy(&words[i], insn_data.of_version_1(insn), sizeof(words[i]));
+    } else {
+      insn_data.of_version_3(insn, &words[i], sizeof(words[i]));
+    }
   }
   struct block** link = &buckets[address / sizeof(uint32_t) % kBuckets];
   for (; *link != NULL; link = &(*link)->next) {
@@ -129,14 +187,15 @@ static void on_marker(unsigned int vcpu_index, void* userdata) {
   (void)userdata;
   uint64_t instructions = 0;
   for (size_t i = 0; i < block_count; ++i) {
-    instructions += (blocks[i]->executions - blocks[i]->before) * blocks[i]->length;
+    instructions += (executions_of(blocks[i]) - blocks[i]->before) * blocks[i]->length;
   }
   fprintf(out, "lap %" PRIu64 "\n", instructions);
   for (size_t i = 0; i < block_count; ++i) {
     struct block* block = blocks[i];
-    if (block->executions != block->before) {
-      fprintf(out, "block %zu %" PRIu64 "\n", block->id, block->executions - block->before);
-      block->before = block->executions;
+    const uint64_t executions = executions_of(block);
+    if (executions != block->before) {
+      fprintf(out, "block %zu %" PRIu64 "\n", block->id, executions - block->before);
+      block->before = executions;
     }
   }
 }
@@ -144,7 +203,12 @@ static void on_marker(unsigned int vcpu_index, void* userdata) {
 static void on_translation(qemu_plugin_id_t id, struct qemu_plugin_tb* tb) {
   (void)id;
   struct block* block = block_of(tb);
-  qemu_plugin_register_vcpu_tb_exec_inline(tb, QEMU_PLUGIN_INLINE_ADD_U64, &block->executions, 1);
+  if (qemu_plugin_version == 1) {
+    qemu_plugin_register_vcpu_tb_exec_inline(tb, QEMU_PLUGIN_INLINE_ADD_U64, &block->executions.number, 1);
+  } else {
+    qemu_plugin_register_vcpu_tb_exec_inline_per_vcpu(tb, QEMU_PLUGIN_INLINE_ADD_U64, block->executions.entry,
+                                                      1);
+  }
   for (size_t i = 0; i < block->length; ++i) {
     if (block->words[i] == kMarker) {
       qemu_plugin_register_vcpu_insn_exec_cb(qemu_plugin_tb_get_insn(tb, i), on_marker,

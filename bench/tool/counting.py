@@ -4,6 +4,7 @@
 
 import collections
 import dataclasses
+import re
 import subprocess
 import sys
 import tempfile
@@ -66,6 +67,14 @@ class CallCount:
     instructions: float  # of the shared library alone
 
 
+def tools(build):
+    """What the counts of the folder `build` depend on beside the sources: {tool: major version}."""
+    (compiler,) = build.glob("CMakeFiles/*/CMakeCXXCompiler.cmake")
+    clang = re.search(r'CMAKE_CXX_COMPILER_VERSION "(\d+)', compiler.read_text())
+    emulator = subprocess.run(["qemu-aarch64", "--version"], stdout=subprocess.PIPE, text=True, check=True).stdout
+    return {"clang": clang[1], "qemu": re.search(r"version (\d+)", emulator)[1]}
+
+
 def count(build, root, own, pattern, sizes, repeats=1):
     """Runs bench_count of the folder `build` and returns the Counts of the operations matching `pattern`."""
     arguments = ["bench_count", "own" if own else "all", str(repeats), pattern, *sizes]
@@ -97,6 +106,9 @@ def count_bridge(build, root, repeats=10):
 
 def _run(build, root, arguments):
     """Runs a program of `build` under the plugin: the lines it prints, its laps, its blocks by id."""
+    options = subprocess.run(["qemu-aarch64", "-h"], stdout=subprocess.PIPE, text=True, check=False).stdout
+    if "-plugin" not in options:
+        sys.exit("bench: this machine's qemu-aarch64 takes no plugins (Debian 13's does not), so nothing can be counted")
     with tempfile.NamedTemporaryFile(suffix=".laps") as laps_file:
         command = ["qemu-aarch64", "-cpu", "cortex-a76", "-L", str(root)]
         command += ["-E", f"LD_LIBRARY_PATH={EXTRA_LIBRARY_PATH}"]

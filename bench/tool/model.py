@@ -7,8 +7,10 @@ an instruction as what is.
 """
 
 import re
+import shutil
 import subprocess
 import sys
+from pathlib import Path
 
 CORES = {"A55": "cortex-a55", "N1": "neoverse-n1"}
 
@@ -62,6 +64,15 @@ def _hot_stretches(count, blocks):
     return hot
 
 
+def _llvm(tool):
+    """The name of one of LLVM's tools, of the version that everything is built with."""
+    versions = (Path(__file__).parents[2] / "cmake" / "llvm-versions").read_text().split()
+    for version in versions:
+        if shutil.which(f"clang-{version}"):
+            return f"{tool}-{version}"
+    sys.exit("bench: there is no clang from 16 on")
+
+
 def _run(command, text):
     run = subprocess.run(command, input=text, stdout=subprocess.PIPE, stderr=subprocess.PIPE, text=True, check=False)
     if run.returncode != 0:
@@ -73,7 +84,7 @@ def _disassembled(words):
     """{word: assembly} of instruction words."""
     words = sorted(words)
     lines = "\n".join(" ".join(f"0x{byte:02x}" for byte in int(word, 16).to_bytes(WORD_BYTES, "little")) for word in words)
-    output = _run(["llvm-mc-19", "--disassemble", "--triple=aarch64", "-mattr=+all"], lines)
+    output = _run([_llvm("llvm-mc"), "--disassemble", "--triple=aarch64", "-mattr=+all"], lines)
     assembly = [line.strip() for line in output.splitlines() if line.strip() and not line.strip().startswith(".")]
     if len(assembly) != len(words):
         sys.exit("bench: some hot code could not be disassembled")
@@ -87,7 +98,7 @@ def _cycles_of(codes, assembly, cpu):
         source.append(f"# LLVM-MCA-BEGIN {number}")
         source += [assembly[word] for word in words]
         source.append("# LLVM-MCA-END")
-    command = ["llvm-mca-19", "-mtriple=aarch64", "-mattr=+all", f"-mcpu={cpu}", f"-iterations={ITERATIONS}"]
+    command = [_llvm("llvm-mca"), "-mtriple=aarch64", "-mattr=+all", f"-mcpu={cpu}", f"-iterations={ITERATIONS}"]
     command += ["-instruction-info=false", "-resource-pressure=false", "-skip-unsupported-instructions=any"]
     output = _run(command, "\n".join(source) + "\n") if codes else ""
     found = re.findall(r"Code Region - (\d+)\s.*?Total Cycles:\s+(\d+)", output, flags=re.DOTALL)

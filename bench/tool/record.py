@@ -16,6 +16,15 @@ def figures(counts, bridge):
     return result
 
 
+def difference(recorded, here):
+    """Why counts made with the tools `here` say nothing beside those made with `recorded`, each {tool: version}: a
+    sentence, or nothing where the tools are the same."""
+    if recorded == here:
+        return None
+    before, now = (" and ".join(f"{tool} {version}" for tool, version in tools.items()) for tools in (recorded, here))
+    return f"the counts were recorded with {before}; those of {now} are not comparable"
+
+
 def complaints(recorded, measured):
     """Why `measured` is not as good as `recorded`, a line for each figure; nothing when it is."""
     lines = []

@@ -51,6 +51,13 @@ class Record(unittest.TestCase):
         (line,) = record.complaints(self.RECORDED, {**self.RECORDED, "gray": {SIZE: 0.7}})
         self.assertIn("not measured", line)
 
+    def test_counts_of_other_tools_are_not_compared(self):
+        recorded = {"clang": "19", "qemu": "7"}
+        self.assertIsNone(record.difference(recorded, dict(recorded)))
+        for here in ({"clang": "16", "qemu": "7"}, {"clang": "19", "qemu": "10"}):
+            self.assertIn("clang 19 and qemu 7", record.difference(recorded, here))
+            self.assertIn(f"clang {here['clang']} and qemu {here['qemu']}", record.difference(recorded, here))
+
     def test_figures_are_per_pixel_and_per_call(self):
         counts = {Key("gray", "fastcv", SIZE): count_of(0.7), Key("gray", "fastcv", ODD_SIZE): count_of(0.75)}
         kept = record.figures(counts, {"track": CallCount(machine_calls=4, instructions=130)})

@@ -1,3 +1,5 @@
+// SPDX-FileCopyrightText: the libjni_kyface_api authors
+// SPDX-License-Identifier: Apache-2.0
 // The numbers of faces, at the end of their range.
 #include "engine/src/identities.h"
 

@@ -1,3 +1,5 @@
+// SPDX-FileCopyrightText: the libjni_kyface_api authors
+// SPDX-License-Identifier: Apache-2.0
 // The features of local binary patterns against their definition, written out.
 #include <algorithm>
 #include <array>

@@ -40,6 +40,7 @@ import org.w3c.dom.Element;
 public final class PackageTest {
     private static final File SOURCE = new File(System.getProperty("kyface.source"));
     private static final String VERSION = System.getProperty("kyface.version");
+    private static final String LLVM = System.getProperty("kyface.llvm");
     private static final File FOLDER = new File(SOURCE, "out/package");
     private static final String LIBRARY = "jni/arm64-v8a/libjni_kyface_api.so";
     private static final String MODULE = "prefab/modules/jni_kyface_api/";
@@ -160,7 +161,7 @@ public final class PackageTest {
             }
         }
         Set<String> exported = new TreeSet<>();
-        for (String line : run("llvm-nm-19", "-D", "--defined-only", "-j", extracted(LIBRARY).toString())) {
+        for (String line : run("llvm-nm-" + LLVM, "-D", "--defined-only", "-j", extracted(LIBRARY).toString())) {
             if (line.startsWith("Java_")) {
                 exported.add(line);
             }
@@ -215,7 +216,7 @@ public final class PackageTest {
     public void theLibraryIsFitForAPhone() throws Exception {
         String library = extracted(LIBRARY).toString();
         int segments = 0;
-        for (String line : run("llvm-readelf-19", "-lW", library)) {
+        for (String line : run("llvm-readelf-" + LLVM, "-lW", library)) {
             String[] columns = line.trim().split("\\s+");
             if (columns[0].equals("LOAD")) {
                 segments++;
@@ -224,13 +225,13 @@ public final class PackageTest {
         }
         assertTrue(segments > 1);
         boolean engine = false;
-        for (String line : run("llvm-readelf-19", "-d", library)) {
+        for (String line : run("llvm-readelf-" + LLVM, "-d", library)) {
             assertFalse(line, line.contains("TEXTREL"));
             engine |= line.contains("[libkyface_api.so]");
         }
         assertTrue("the engine is not imported", engine);
         boolean sections = false;
-        for (String line : run("llvm-readelf-19", "-SW", library)) {
+        for (String line : run("llvm-readelf-" + LLVM, "-SW", library)) {
             assertFalse("not stripped: " + line, line.contains(" .symtab "));
             sections |= line.contains(".note.gnu.build-id");
         }
@@ -248,7 +249,7 @@ public final class PackageTest {
         }
         Set<String> imported = new TreeSet<>();
         for (String line : run(
-                "llvm-nm-19", "-D", "--undefined-only", "--no-weak", "-j", extracted(LIBRARY).toString())) {
+                "llvm-nm-" + LLVM, "-D", "--undefined-only", "--no-weak", "-j", extracted(LIBRARY).toString())) {
             String name = line.replaceFirst("@.*", "");
             // The engine's come with the app.
             if (!name.startsWith("ky_")) {
