@@ -20,6 +20,8 @@ namespace {
 
 constexpr size_t kLargestArray = 64U << 20;
 
+constexpr char kBufferClass[] = "java/nio/DirectByteBuffer";
+
 std::string class_title(const std::string& class_name) {
   return class_name.substr(class_name.find_last_of('/') + 1);
 }
@@ -271,6 +273,54 @@ struct Functions {
     return static_cast<jint*>(vm(env).pin(array, "[I", "GetIntArrayElements"));
   }
 
+  static const std::string& array_class(Vm& self, jarray array) {
+    return self.resolve(array, "the critical functions")->class_name;
+  }
+
+  static void* JNICALL GetPrimitiveArrayCritical(JNIEnv* env, jarray array, jboolean* is_copy) {
+    EXPECT_EQ(is_copy, nullptr);
+    Vm& self = vm(env);
+    const std::string kind = array_class(self, array);
+    void* elements = self.pin(array, kind.c_str(), "GetPrimitiveArrayCritical");
+    self.criticals_ += elements != nullptr ? 1 : 0;
+    return elements;
+  }
+
+  static void JNICALL ReleasePrimitiveArrayCritical(JNIEnv* env, jarray array, void* elements, jint mode) {
+    Vm& self = vm(env);
+    const std::string kind = array_class(self, array);
+    self.unpin(array, elements, mode, kind.c_str(), "ReleasePrimitiveArrayCritical");
+    --self.criticals_;
+  }
+
+  static void* JNICALL GetDirectBufferAddress(JNIEnv* env, jobject buffer) {
+    Vm& self = vm(env);
+    Object* object = self.resolve(buffer, "GetDirectBufferAddress");
+    self.enter("GetDirectBufferAddress");
+    return object->class_name == kBufferClass ? object->bytes.data() : nullptr;
+  }
+
+  static jlong JNICALL GetDirectBufferCapacity(JNIEnv* env, jobject buffer) {
+    Vm& self = vm(env);
+    Object* object = self.resolve(buffer, "GetDirectBufferCapacity");
+    self.enter("GetDirectBufferCapacity");
+    return object->class_name == kBufferClass ? static_cast<jlong>(object->bytes.size()) : -1;
+  }
+
+  static jboolean JNICALL IsSameObject(JNIEnv* env, jobject a, jobject b) {
+    Vm& self = vm(env);
+    self.enter("IsSameObject");
+    return self.resolve(a, "IsSameObject") == self.resolve(b, "IsSameObject") ? JNI_TRUE : JNI_FALSE;
+  }
+
+  static void JNICALL GetIntArrayRegion(JNIEnv* env, jintArray array, jsize start, jsize length, jint* to) {
+    Vm& self = vm(env);
+    const Object* object = self.resolve(array, "GetIntArrayRegion");
+    self.enter("GetIntArrayRegion");
+    ASSERT_LE(static_cast<size_t>(start) + static_cast<size_t>(length), object->words.size());
+    std::copy_n(object->words.begin() + start, length, to);
+  }
+
   static const char* JNICALL GetStringUTFChars(JNIEnv* env, jstring string, jboolean* is_copy) {
     EXPECT_EQ(is_copy, nullptr);
     return static_cast<const char*>(vm(env).pin(string, "java/lang/String", "GetStringUTFChars"));
@@ -336,6 +386,12 @@ JniFunctions makeFunctions() {
   KY_MODELLED(NewByteArray)
   KY_MODELLED(GetByteArrayElements)
   KY_MODELLED(GetIntArrayElements)
+  KY_MODELLED(GetPrimitiveArrayCritical)
+  KY_MODELLED(ReleasePrimitiveArrayCritical)
+  KY_MODELLED(GetDirectBufferAddress)
+  KY_MODELLED(GetDirectBufferCapacity)
+  KY_MODELLED(IsSameObject)
+  KY_MODELLED(GetIntArrayRegion)
   KY_MODELLED(GetStringUTFChars)
   KY_MODELLED(ReleaseByteArrayElements)
   KY_MODELLED(ReleaseIntArrayElements)
@@ -395,6 +451,12 @@ jstring Vm::string(const std::string& name, const std::string& text) {
   Object* string = make("java/lang/String", name);
   string->text = text;
   return static_cast<jstring>(refer(string, Scope::kArgument));
+}
+
+jobject Vm::buffer(const std::string& name, const std::vector<unsigned char>& bytes) {
+  Object* buffer = make(kBufferClass, name);
+  buffer->bytes.assign(bytes.begin(), bytes.end());
+  return refer(buffer, Scope::kArgument);
 }
 
 jobject Vm::object(const std::string& name, const std::string& class_name) {
@@ -495,6 +557,9 @@ Object* Vm::resolve(jobject reference, const char* function) {
 bool Vm::enter(const char* function, bool allowed_under_exception) {
   if (exception_pending_ && !allowed_under_exception && !tolerate_calls_under_exception) {
     ADD_FAILURE() << function << " is called with an exception pending";
+  }
+  if (criticals_ > 0 && std::string(function).find("PrimitiveArrayCritical") == std::string::npos) {
+    ADD_FAILURE() << function << " is called while an array is borrowed critically";
   }
   const int count = ++calls_[function];
   auto refusal = refusals_.find(function);

@@ -41,6 +41,8 @@ class Vm {
   jbyteArray byte_array(const std::string& name, const std::vector<unsigned char>& bytes);
   jintArray int_array(const std::string& name, const std::vector<jint>& words);
   jstring string(const std::string& name, const std::string& text);
+  /// A direct buffer of bytes.
+  jobject buffer(const std::string& name, const std::vector<unsigned char>& bytes);
   jobject object(const std::string& name, const std::string& class_name);
   jobjectArray object_array(const std::string& name, const std::string& element_class,
                             const std::vector<Object*>& elements);
@@ -58,7 +60,8 @@ class Vm {
   void hide_member(const std::string& class_name, const std::string& name_and_signature);
   /// What `GetEnv` answers.
   jint get_env_result = JNI_OK;
-  /// Calls that are made with an exception pending fail the test unless this is set.
+  /// Calls that are made with an exception pending fail the test unless this is set, and so do calls between
+  /// the borrowing and the giving back of a critical array.
   bool tolerate_calls_under_exception = false;
 
   // ---- what it has seen
@@ -132,6 +135,7 @@ class Vm {
   int live_locals_ = 0;
   int peak_locals_ = 0;
   int globals_ = 0;
+  int criticals_ = 0;
   bool exception_pending_ = false;
 };
 
