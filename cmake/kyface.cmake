@@ -64,8 +64,8 @@ target_link_libraries(kyface_options INTERFACE kyface_warnings kyface_arithmetic
 if(ANDROID)
   # What an NDK's compiler notes for a debugger names no folder of the machine that it ran on: the same sources give the
   # same bytes everywhere.
-  target_compile_options(kyface_options INTERFACE -ffile-prefix-map=${PROJECT_SOURCE_DIR}/=
-                                                  -ffile-prefix-map=${KYFACE_NDK}=ndk)
+  set(kyface_prefix_map -ffile-prefix-map=${PROJECT_SOURCE_DIR}/= -ffile-prefix-map=${KYFACE_NDK}=ndk)
+  target_compile_options(kyface_options INTERFACE ${kyface_prefix_map})
 endif()
 
 # Hardening of a shared library: read-only relocations, everything bound at load, nothing left undefined.

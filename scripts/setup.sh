@@ -236,7 +236,7 @@ unpack_descriptor_package() {
 # unpack_dlib_source: puts Debian's source package of dlib, without the models that come with it, into .deps/dlib. It is
 # found through this system's own package sources.
 unpack_dlib_source() {
-  [ ! -e "$deps/dlib/dlib/revision.h" ] || return 0
+  [ ! -e "$deps/dlib/dlib/revision.h.in" ] || return 0
   local work file uri name size sum
   mkdir -p "$deps"
   work=$(mktemp -d "$deps/dlib.XXXXXX")
