@@ -162,11 +162,13 @@ final class AnyCalls {
         if (type == FaceEngineException.class) {
             return new FaceEngineException("a call", EngineProfile.OPEN, calls.random.nextInt());
         }
-        Object instance = any(type);
-        while (instance == null) {
-            instance = any(type);
+        for (int tries = 0; tries < 1000; tries++) {
+            Object instance = any(type);
+            if (instance != null) {
+                return instance;
+            }
         }
-        return instance;
+        throw new AssertionError("nothing here makes a " + type.getSimpleName());
     }
 
     /** Closed objects serve for a while too. */
@@ -241,6 +243,9 @@ final class AnyCalls {
         }
         if (type == FaceInfo.class) {
             return calls.anyFace();
+        }
+        if (type == Feature.class) {
+            return calls.decodedFeature();
         }
         if (type == List.class) {
             return Arrays.asList(calls.anyFace(), calls.rarely() ? null : calls.anyFace());

@@ -1042,6 +1042,11 @@ public final class RandomCalls {
         return bytes != null && bytes.length > 0 && bytes[bytes.length - 1] == 0;
     }
 
+    /** The feature, decoded. */
+    Feature decodedFeature() {
+        return Feature.decode(feature);
+    }
+
     /** The feature, or what is none. */
     private byte[] feature() {
         if (random.nextInt(3) != 0) {
