@@ -98,6 +98,20 @@ class Checks(unittest.TestCase):
             self.assertEqual(self.findings("needed", self.library(abi, "-Wl,-soname,other.so", without=SOUND[3:])),
                              ["has another name than libjni_kyface_api.so"])
 
+    def test_the_engine_needs_the_system_alone(self):
+        for abi in TRIPLES:
+            engine = machine.empty("engine") / "libkyface_api.so"
+            source = "int erf(void);\nint ky_face_detect(void) { return erf(); }"
+            options = ["-L", self.system / abi, *SOUND[:3], "-Wl,-soname,libkyface_api.so", "-lm"]
+            self.link(abi, engine, source, *options)
+            for check in ("layout", "needed"):
+                self.assertEqual(self.findings(check, engine, "--engine"), [])
+            self.link(abi, engine, source, *options, "-llog")
+            self.assertEqual(self.findings("needed", engine, "--engine"), ["needs liblog.so"])
+            self.assertEqual(set(self.findings("needed", self.library(abi), "--engine")), {
+                "needs libjnigraphics.so", "needs libkyface_api.so", "needs liblog.so",
+                "has another name than libkyface_api.so"})
+
 
 if __name__ == "__main__":
     parser = argparse.ArgumentParser(description=__doc__)

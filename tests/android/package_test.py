@@ -80,6 +80,10 @@ class Refusals(unittest.TestCase):
         self.refused("there is no nowhere.so", "--engine", "nowhere.so", ANDROID_NDK_HOME=self.ndk)
         self.refused("--engine takes an Android NDK: set ANDROID_NDK_HOME to its folder", "--engine", arm)
 
+    def test_a_folder_of_dlib_that_is_not_there(self):
+        self.refused('KYFACE_DLIB_SOURCE is "/no/such/dlib", and there is no such folder', ANDROID_NDK_HOME=self.ndk,
+                     KYFACE_DLIB_SOURCE="/no/such/dlib")
+
     def test_abis(self):
         self.refused("there is no ABI mips; the ABIs are arm64-v8a and x86_64", "--abi", "mips")
         self.refused("x86_64 takes an Android NDK: set ANDROID_NDK_HOME to its folder", "--abi", "x86_64")
@@ -99,7 +103,7 @@ class Package(unittest.TestCase):
         cls.listing = cls.package_of(cls.project, "both", "--engine", cls.engines)
         (cls.aar,) = (machine.work / "both").glob("*.aar")
         for project, name in ((cls.project, "here"), (cls.elsewhere, "elsewhere")):
-            cls.package_of(project, name, "--abi", "arm64-v8a")
+            cls.package_of(project, name, "--abi", "arm64-v8a", "--without-engine")
 
     @classmethod
     def package_of(cls, project, name, *options):

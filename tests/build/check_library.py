@@ -11,9 +11,12 @@ from pathlib import Path
 JNI_PREFIX = "Java_com_vantrel_faceapi_"
 PAGE = 16384
 NEEDED = {"liblog.so", "libjnigraphics.so", "libkyface_api.so"}
+NAMES = {False: "libjni_kyface_api.so", True: "libkyface_api.so"}
 # What the compiler and the C library bring along: on Linux, and on Android.
 LINUX = re.compile(r"lib(c|m|stdc\+\+|gcc_s)\.so\.\d+|ld-linux-[\w-]+\.so\.\d+")
 ANDROID = re.compile(r"lib(c|m|dl)\.so")
+# The open engine has its C++ library in it.
+LINUX_ENGINE = re.compile(r"lib(c|m)\.so\.\d+|ld-linux-[\w-]+\.so\.\d+")
 # The functions of the face engine, which the app brings along.
 ENGINE_PREFIX = "ky_"
 
@@ -54,15 +57,16 @@ def check_exports(arguments):
 def check_needed(arguments):
     dynamic = output(arguments.readelf, "-d", arguments.library)
     needed = needed_libraries(dynamic)
-    platform = ANDROID if arguments.android else LINUX
+    platform = ANDROID if arguments.android else LINUX_ENGINE if arguments.engine else LINUX
+    wanted = set() if arguments.engine else NEEDED
     print("needs " + ", ".join(sorted(needed)))
-    for name in sorted(NEEDED - needed):
+    for name in sorted(wanted - needed):
         yield f"does not need {name}"
-    for name in sorted(needed - NEEDED):
+    for name in sorted(needed - wanted):
         if not platform.fullmatch(name):
             yield f"needs {name}"
-    if re.findall(r"\(SONAME\).*\[(.*)\]", dynamic) != ["libjni_kyface_api.so"]:
-        yield "has another name than libjni_kyface_api.so"
+    if re.findall(r"\(SONAME\).*\[(.*)\]", dynamic) != [NAMES[arguments.engine]]:
+        yield f"has another name than {NAMES[arguments.engine]}"
     for path in re.findall(r"\((?:RPATH|RUNPATH)\).*\[(.*)\]", dynamic):
         if arguments.android or path != "$ORIGIN":
             yield f"looks for libraries in {path}"
@@ -71,7 +75,8 @@ def check_needed(arguments):
 def check_imports(arguments):
     """Weak imports are left out: they may be missing."""
     imported = dynamic_symbols(arguments, arguments.library, "--undefined-only", "--no-weak")
-    known = {line for line in Path(arguments.imports).read_text().splitlines() if line and not line.startswith("#")}
+    listed = Path(arguments.imports).read_text().splitlines() if arguments.imports else []
+    known = {line for line in listed if line and not line.startswith("#")}
     if arguments.system:
         for name in needed_libraries(output(arguments.readelf, "-d", arguments.library)):
             stub = Path(arguments.system) / name
@@ -122,6 +127,7 @@ def main():
     parser.add_argument("--intended", help="the object of intended_exports.cpp")
     parser.add_argument("--java", nargs="+", help="the sources of the Java classes")
     parser.add_argument("--android", action="store_true", help="the library is one for Android")
+    parser.add_argument("--engine", action="store_true", help="the library is the open engine, libkyface_api.so")
     parser.add_argument("--imports", help="the list of what the library may import")
     parser.add_argument("--system", help="the folder of an NDK's stand-ins for the system's libraries, whose symbols may "
                                          "be imported too")

@@ -43,15 +43,24 @@ public final class PackageTest {
     private static final String LLVM = System.getProperty("kyface.llvm");
     private static final File FOLDER = new File(SOURCE, "out/package");
     private static final String LIBRARY = "jni/arm64-v8a/libjni_kyface_api.so";
+    private static final String ENGINE = "jni/arm64-v8a/libkyface_api.so";
     private static final String MODULE = "prefab/modules/jni_kyface_api/";
 
     private static File aar() {
         return new File(FOLDER, "faceapi-" + VERSION + "-linux-aarch64.aar");
     }
 
+    private static File engine() {
+        return new File(FOLDER, "faceapi-engine-" + VERSION + "-linux-aarch64.aar");
+    }
+
     private static Path extracted(String entry) throws IOException {
+        return extracted(aar(), entry);
+    }
+
+    private static Path extracted(File archive, String entry) throws IOException {
         Path file = new File(System.getProperty("kyface.work"), new File(entry).getName()).toPath();
-        try (ZipFile zip = new ZipFile(aar()); InputStream in = zip.getInputStream(zip.getEntry(entry))) {
+        try (ZipFile zip = new ZipFile(archive); InputStream in = zip.getInputStream(zip.getEntry(entry))) {
             Files.copy(in, file, StandardCopyOption.REPLACE_EXISTING);
         }
         return file;
@@ -90,16 +99,71 @@ public final class PackageTest {
     }
 
     @Test
-    public void manifestAndPomParse() throws Exception {
+    public void theEngineHoldsExactlyItsEntries() throws IOException {
+        Set<String> entries;
+        try (ZipFile zip = new ZipFile(engine())) {
+            entries = zip.stream().map(ZipEntry::getName).collect(Collectors.toCollection(TreeSet::new));
+        }
+        assertEquals(new TreeSet<>(Arrays.asList("AndroidManifest.xml", "LICENSE", "NOTICE.txt", "R.txt",
+                "README.txt", "classes.jar", ENGINE)), entries);
+        assertTrue(new File(FOLDER, "symbols/arm64-v8a/libkyface_api.so").length() > 0);
+        String notices = new String(Files.readAllBytes(extracted(engine(), "NOTICE.txt")), StandardCharsets.UTF_8);
+        assertTrue(notices.contains("Boost Software License - Version 1.0"));
+        try (ZipFile jar = new ZipFile(extracted(engine(), "classes.jar").toFile())) {
+            assertEquals(0, jar.stream().filter(entry -> entry.getName().endsWith(".class")).count());
+        }
+    }
+
+    /** It has its C++ library in it, all that the other library asks for, and no folder of this machine. */
+    @Test
+    public void theEngineIsWhatTheLibraryAsksFor() throws Exception {
+        String library = extracted(engine(), ENGINE).toString();
+        int segments = 0;
+        for (String line : run("llvm-readelf-" + LLVM, "-dlW", library)) {
+            String[] columns = line.trim().split("\\s+");
+            if (columns[0].equals("LOAD")) {
+                segments++;
+                assertTrue(line, Long.decode(columns[columns.length - 1]) >= 16384);
+            }
+            assertTrue(line, !line.contains("(NEEDED)") || line.matches(".*\\[(lib[cm]|ld-linux-aarch64)\\.so\\.\\d+]"));
+            assertTrue(line, !line.contains("(SONAME)") || line.contains("[libkyface_api.so]"));
+        }
+        assertTrue(segments > 1);
+        Set<String> exported =
+                new TreeSet<>(run("llvm-nm-" + LLVM, "-D", "--defined-only", "-j", library));
+        for (String name : exported) {
+            assertTrue(name, name.startsWith("ky_"));
+        }
+        Set<String> asked = new TreeSet<>();
+        for (String line : run("llvm-nm-" + LLVM, "-D", "--undefined-only", "-j", extracted(LIBRARY).toString())) {
+            if (line.startsWith("ky_")) {
+                asked.add(line);
+            }
+        }
+        assertFalse(asked.isEmpty());
+        asked.removeAll(exported);
+        assertEquals(new TreeSet<String>(), asked);
+        String bytes = new String(Files.readAllBytes(new File(library).toPath()), StandardCharsets.ISO_8859_1);
+        assertFalse("names the project's folder", bytes.contains(SOURCE.getPath()));
+    }
+
+    @Test
+    public void manifestsAndPomsParse() throws Exception {
+        parse(aar(), "faceapi", "com.vantrel.faceapi");
+        parse(engine(), "faceapi-engine", "com.vantrel.faceapi.engine");
+    }
+
+    private static void parse(File archive, String artifact, String name) throws Exception {
         DocumentBuilderFactory parser = DocumentBuilderFactory.newInstance();
         parser.setNamespaceAware(true);
-        Element manifest = parser.newDocumentBuilder().parse(extracted("AndroidManifest.xml").toFile())
+        Element manifest = parser.newDocumentBuilder().parse(extracted(archive, "AndroidManifest.xml").toFile())
                 .getDocumentElement();
-        assertEquals("com.vantrel.faceapi", manifest.getAttribute("package"));
+        assertEquals(name, manifest.getAttribute("package"));
         Element sdk = (Element) manifest.getElementsByTagName("uses-sdk").item(0);
         assertEquals("24", sdk.getAttributeNS("http://schemas.android.com/apk/res/android", "minSdkVersion"));
-        Element pom = parser.newDocumentBuilder().parse(new File(FOLDER, "faceapi-" + VERSION + ".pom"))
+        Element pom = parser.newDocumentBuilder().parse(new File(FOLDER, artifact + "-" + VERSION + ".pom"))
                 .getDocumentElement();
+        assertEquals(artifact, pom.getElementsByTagName("artifactId").item(0).getTextContent());
         assertEquals(VERSION, pom.getElementsByTagName("version").item(0).getTextContent());
         assertEquals("aar", pom.getElementsByTagName("packaging").item(0).getTextContent());
     }
