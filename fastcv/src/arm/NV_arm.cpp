@@ -141,6 +141,9 @@ inline void decode(int height, int width, int inWidthStride, const unsigned char
   const ptrdiff_t inStride = inWidthStride;
   const ptrdiff_t outStride = outWidthStride;
   const ptrdiff_t length = width & ~1;
+  if (length < 1) {
+    return;
+  }
   for (ptrdiff_t row = 0; row + 1 < height; row += 2) {
     const unsigned char* const luma = inData + row * inStride;
     const unsigned char* const pairs = inData + (height + row / 2) * inStride;
