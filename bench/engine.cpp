@@ -20,7 +20,7 @@
 #include "engine/ky_engine.h"
 #include "kyface_api/kyface_api.h"
 #include "lap.h"
-#include "tests/engine/picture.h"
+#include "tests/support/picture.h"
 
 namespace {
 

@@ -9,7 +9,7 @@
 
 #include "engine/ky_engine.h"
 #include "kyface_api/kyface_api.h"
-#include "picture.h"
+#include "tests/support/picture.h"
 
 namespace kyengine::test {
 

@@ -12,8 +12,8 @@
 #include <random>
 #include <vector>
 
-#include "picture.h"
 #include "tests/support/guarded_image.h"
+#include "tests/support/picture.h"
 
 namespace kyengine::test {
 namespace {

@@ -8,7 +8,7 @@
 #include "engine/ky_engine.h"
 #include "face_library.h"
 #include "fake_vm.h"
-#include "tests/engine/picture.h"
+#include "tests/support/picture.h"
 
 namespace {
 
