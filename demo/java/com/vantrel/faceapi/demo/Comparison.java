@@ -10,8 +10,8 @@ import com.vantrel.faceapi.Feature;
 import java.io.File;
 
 /**
- * Tells whether the largest faces of two pictures are one person's: {@code Comparison <picture> <picture> <landmark
- * model> [verifier's model]}.
+ * Tells whether the largest faces of two pictures are one person's: {@code Comparison <picture> <picture> <degrees to
+ * turn the first clockwise by> <landmark model> [verifier's model]}.
  *
  * <p>Exit status as the demo's: 1 when a picture has no face that can be compared.
  */
@@ -29,14 +29,16 @@ public final class Comparison {
     }
 
     private static int run(String[] args) throws UnusablePicture {
-        if (args.length != 3 && args.length != 4) {
-            System.err.println("Give two pictures, a landmark model and, if there is one, a verifier's model.");
+        if (args.length != 4 && args.length != 5) {
+            System.err.println("Give two pictures, degrees, a landmark model and, as wanted, a verifier's model.");
             return 2;
         }
-        try (Portraits portraits = new Portraits(args[2], args.length > 3 ? args[3] : null)) {
+        int degrees = Integer.parseInt(args[2]);
+        try (Portraits portraits = new Portraits(args[3], args.length > 4 ? args[4] : null)) {
             Feature[] features = new Feature[2];
             for (int i = 0; i < features.length; i++) {
-                Portraits.Portrait portrait = portraits.find(Picture.read(new File(args[i])));
+                Picture picture = Picture.read(new File(args[i])).rotated(i == 0 ? degrees : 0);
+                Portraits.Portrait portrait = find(portraits, picture);
                 features[i] = portrait == null ? null : portraits.feature(portrait);
                 if (features[i] == null) {
                     System.err.println("There is no face in " + args[i] + " that can be compared.");
@@ -52,5 +54,16 @@ public final class Comparison {
                     FaceVerifier.RECOMMENDED_THRESHOLD);
             return 0;
         }
+    }
+
+    /** The largest face of a picture, which is reduced when the engine takes none so large; null when there is none. */
+    private static Portraits.Portrait find(Portraits portraits, Picture picture) {
+        int limit = EngineValues.MAX_FRAME_SIDE;
+        int factor = (Math.max(picture.width, picture.height) + limit - 1) / limit;
+        if (factor == 1) {
+            return portraits.find(picture);
+        }
+        boolean line = Math.min(picture.width, picture.height) < factor; // of which nothing would be left
+        return line ? null : portraits.find(picture.reduced(factor));
     }
 }

@@ -17,14 +17,21 @@ import java.security.NoSuchAlgorithmException;
 
 /**
  * A photograph goes in as an NV21 camera frame, the faces in it come out: {@code Demo <picture> <output folder>
- * [landmark model]}. With a landmark model faces have points, a pose and a distance of their eyes.
+ * [<landmark model> [<degrees to turn the picture clockwise by>]]}. With a landmark model faces have points, a pose and
+ * a distance of their eyes.
+ *
+ * <p>The frame is as large as the picture, up to the engine's limit; NV21 wants even sides, so a black column or row
+ * may join it. It is written also when nothing is found in it, and results of an earlier run are removed.
  *
  * <p>Exit status: 0 when a face was found, 1 when none was, 2 when the arguments or the picture cannot be used, 3 when
  * the engine or the output fails.
  */
 public final class Demo {
-    private static final int WIDTH = 640;
-    private static final int HEIGHT = 480;
+    /** The size of the moving scene's frames. */
+    private static final int SCENE_WIDTH = 640;
+    private static final int SCENE_HEIGHT = 480;
+
+    private static final String[] RESULTS = {"faces.png", "face.png", "turned.png", "track.png"};
 
     private Demo() {}
 
@@ -33,18 +40,35 @@ public final class Demo {
     }
 
     private static int run(String[] args) {
-        if (args.length != 2 && args.length != 3) {
-            return stop(2, "Give a picture, a folder for the results and, if there is one, a landmark model.");
+        if (args.length < 2 || args.length > 4) {
+            return stop(2, "Give a picture, a folder for the results and, as wanted, a landmark model and degrees.");
         }
+        if (args.length == 4 && !args[3].matches("0|90|180|270")) {
+            return stop(2, "A picture is turned by 90, 180 or 270 degrees, not by " + args[3] + ".");
+        }
+        int degrees = args.length == 4 ? Integer.parseInt(args[3]) : 0;
         File picture = new File(args[0]);
         File folder = new File(args[1]);
         try {
-            Files.createDirectories(folder.toPath());
-            return detect(picture, folder, args.length > 2 ? args[2] : null);
+            prepare(folder);
+            return detect(picture, degrees, folder, args.length > 2 ? args[2] : null);
         } catch (UnusablePicture unusable) {
             return stop(2, unusable.getMessage());
         } catch (IOException failed) {
             return stop(3, "The results cannot be written to " + folder + ": " + failed.getMessage() + ".");
+        } catch (OutOfMemoryError large) {
+            return stop(2, "The picture " + picture + " is too large for this virtual machine's memory.");
+        }
+    }
+
+    /** Makes the folder, and empties it of what an earlier run left. */
+    private static void prepare(File folder) throws IOException {
+        if (folder.exists() && !folder.isDirectory()) {
+            throw new IOException("it is no folder");
+        }
+        Files.createDirectories(folder.toPath());
+        for (String name : RESULTS) {
+            Files.deleteIfExists(new File(folder, name).toPath());
         }
     }
 
@@ -53,11 +77,23 @@ public final class Demo {
         return status;
     }
 
-    private static int detect(File file, File folder, String landmarks) throws UnusablePicture, IOException {
+    /** What the frame shows: the picture itself, or as much smaller as the engine wants it. */
+    private static View viewOf(Picture picture) {
+        int limit = EngineValues.MAX_FRAME_SIDE;
+        double zoom = Math.min(1, (double) limit / Math.max(picture.width, picture.height));
+        int width = Math.min((int) Math.ceil(picture.width * zoom) + 1 & ~1, limit);
+        int height = Math.min((int) Math.ceil(picture.height * zoom) + 1 & ~1, limit);
+        return zoom == 1 ? View.pixelByPixel(width, height) : View.whole(picture, width, height);
+    }
+
+    private static int detect(File file, int degrees, File folder, String landmarks)
+            throws UnusablePicture, IOException {
         Stopwatch time = new Stopwatch();
-        Picture picture = Picture.read(file);
+        Picture picture = Picture.read(file).rotated(degrees);
         time.stage("read the picture");
-        View view = View.whole(picture, WIDTH, HEIGHT);
+        View view = viewOf(picture);
+        final int width = view.width;
+        final int height = view.height;
         byte[] rgba = view.render(picture);
         time.stage("lay it into the frame");
 
@@ -67,33 +103,35 @@ public final class Demo {
         if (detector == 0) {
             return stop(3, "The engine could not create a detector.");
         }
-        byte[] nv21 = new byte[WIDTH * HEIGHT * 3 / 2];
-        FaceLibrary.convertColorSpace(rgba, WIDTH, HEIGHT, nv21, ColorConversion.RGBA_TO_NV21);
+        byte[] nv21 = new byte[width * height * 3 / 2];
+        FaceLibrary.convertColorSpace(rgba, width, height, nv21, ColorConversion.RGBA_TO_NV21);
         time.stage("RGBA to NV21");
         int[] status = {Integer.MIN_VALUE};
         FaceInfo[] faces = FaceLibrary.kyFaceDetectBytes(
-                detector, nv21, EngineValues.PIXEL_NV21, WIDTH, HEIGHT, WIDTH, EngineValues.ORIENTATION_0, status);
+                detector, nv21, EngineValues.PIXEL_NV21, width, height, width, EngineValues.ORIENTATION_0, status);
         time.stage("detect on NV21");
         FaceLibrary.kyFaceDestroyDetector(detector);
         if (status[0] != EngineValues.SUCCESS) {
             return stop(3, "The engine failed with status " + status[0] + ".");
         }
-        if (faces == null) {
-            return stop(1, "There is no face in " + file + ".");
-        }
 
-        byte[] shown = new byte[WIDTH * HEIGHT * 4];
+        byte[] shown = new byte[width * height * 4];
         time.skip();
-        FaceLibrary.convertColorSpace(nv21, WIDTH, HEIGHT, shown, ColorConversion.NV21_TO_RGBA);
+        FaceLibrary.convertColorSpace(nv21, width, height, shown, ColorConversion.NV21_TO_RGBA);
         time.stage("NV21 to RGBA");
-        BufferedImage image = Drawing.fromRgba(shown, WIDTH, HEIGHT);
-        Drawing.faces(image, faces);
-        File output = new File(folder, "faces.png");
+        BufferedImage image = Drawing.fromRgba(shown, width, height);
+        File output = new File(folder, RESULTS[0]);
+        if (faces != null) {
+            Drawing.faces(image, faces);
+        }
         Drawing.writePng(image, output);
+        if (faces == null) {
+            return stop(1, "There is no face in " + file + "; what was searched is in " + output + ".");
+        }
         time.stage("draw and write");
 
         System.out.printf("%s, %d x %d, as an NV21 frame of %d x %d%n", file.getName(), picture.width, picture.height,
-                WIDTH, HEIGHT);
+                width, height);
         System.out.println("frame sha-256 " + sha256(nv21));
         System.out.printf("status %d, %d face%s, drawn in %s%n%n", status[0], faces.length, faces.length == 1 ? "" : "s",
                 output);
@@ -108,10 +146,10 @@ public final class Demo {
         System.out.println();
         time.print();
         System.out.println();
-        new Lighting(WIDTH, HEIGHT).print(shown, nv21, faces);
+        new Lighting(width, height).print(shown, nv21, faces);
         System.out.println();
 
-        Turning turning = new Turning(nv21, WIDTH, HEIGHT);
+        Turning turning = new Turning(nv21, width, height);
         File crop = new File(folder, "face.png");
         turning.writeCrop(faces[0].faceRect, crop);
         File turned = new File(folder, "turned.png");
@@ -119,7 +157,8 @@ public final class Demo {
         System.out.println("cut out of the frame in " + crop + ", the frame turned by right angles in " + turned);
         System.out.println();
 
-        MovingScene scene = new MovingScene(picture, view.toPicture(faces[0].faceRect), WIDTH, HEIGHT, landmarks);
+        MovingScene scene = new MovingScene(
+                picture, view.toPicture(faces[0].faceRect), SCENE_WIDTH, SCENE_HEIGHT, landmarks);
         return scene.run(new File(folder, "track.png")) ? 0 : stop(3, "The engine failed while it tracked.");
     }
 

@@ -33,11 +33,16 @@ final class MovingScene {
     private static final int DETECT_INTERVAL = 10;
     private static final int COLUMNS = 6;
     private static final int SHRINK = 3;
+    /** What the face is wide in the frames at least: smaller ones would be for another tracker. */
+    private static final int LEAST_FACE_WIDTH = 80;
 
     private final Picture picture;
     private final String landmarks; // a model, or null
     private final double faceX;
     private final double faceY;
+    private final double farZoom;
+    private final double farX;
+    private final double farY;
     private final int width;
     private final int height;
     private final Stopwatch time = new Stopwatch();
@@ -68,20 +73,29 @@ final class MovingScene {
         this.faceY = (face.top + face.bottom) / 2.0;
         this.width = width;
         this.height = height;
+        this.farZoom = Math.max(View.whole(picture, width, height).zoom(), (double) LEAST_FACE_WIDTH / face.width());
+        this.farX = middle(picture.width, faceX, width / farZoom);
+        this.farY = middle(picture.height, faceY, height / farZoom);
         this.sheet = new ContactSheet(COLUMNS, FRAMES, width / SHRINK, height / SHRINK);
     }
 
+    /** The middle of a view of {@code extent} that is as near to the middle of the picture as shows the face. */
+    private static double middle(int size, double face, double extent) {
+        double reach = extent / 4;
+        return Math.min(Math.max(size / 2.0, face - reach), face + reach);
+    }
+
     /**
-     * Where the camera is at frame {@code number}: it starts with the whole picture, moves half the way to the face while
-     * it zooms in, returns, and rolls a little to either side.
+     * Where the camera is at frame {@code number}: it starts with the whole picture, or with as much as leaves the face
+     * large enough, moves half the way to the face while it zooms in, returns, and rolls a little to either side.
      */
     private View view(int number) {
         double t = (double) number / (FRAMES - 1);
         double near = StrictMath.sin(Math.PI * t);
         double roll = Math.toRadians(6) * StrictMath.sin(2 * Math.PI * t);
-        double zoom = View.whole(picture, width, height).zoom() * (1 + 0.25 * near);
-        double x = picture.width / 2.0 + (faceX - picture.width / 2.0) * near / 2;
-        double y = picture.height / 2.0 + (faceY - picture.height / 2.0) * near / 2;
+        double zoom = farZoom * (1 + 0.25 * near);
+        double x = farX + (faceX - farX) * near / 2;
+        double y = farY + (faceY - farY) * near / 2;
         return new View(x, y, zoom, roll, width, height);
     }
 

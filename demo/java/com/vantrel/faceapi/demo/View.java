@@ -16,8 +16,9 @@ final class View {
     private final double zoom;
     private final double cos;
     private final double sin;
-    private final int width;
-    private final int height;
+    /** The size of the frame in pixels. */
+    final int width;
+    final int height;
 
     /**
      * @param centreX the picture's point in the middle of the frame, in pixels
@@ -33,6 +34,11 @@ final class View {
         this.sin = StrictMath.sin(roll);
         this.width = width;
         this.height = height;
+    }
+
+    /** The picture pixel by pixel, in the top left of a frame that is at least as large. */
+    static View pixelByPixel(int width, int height) {
+        return new View(width / 2.0, height / 2.0, 1, 0, width, height);
     }
 
     /** The view that shows the whole picture, as large as it fits and centred. */

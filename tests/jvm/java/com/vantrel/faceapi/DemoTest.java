@@ -3,6 +3,7 @@
 
 package com.vantrel.faceapi;
 
+import static org.junit.Assert.assertArrayEquals;
 import static org.junit.Assert.assertEquals;
 import static org.junit.Assert.assertFalse;
 import static org.junit.Assert.assertTrue;
@@ -27,7 +28,7 @@ public class DemoTest {
     /** A tight box around the portrait's face. */
     private static final Rect FACE = new Rect(179, 83, 266, 170);
     /** The camera frame is the same on every machine. */
-    private static final String FRAME = "3cbd3de2674885756e77b344b9ba15f2352be69ba587f624905607379bba4d35";
+    private static final String FRAME = "f3382a0305e64ec6f00974559a7991bcf013204e62ea7a59f5b4129a0b0e7cc4";
 
     @Rule public final TemporaryFolder folder = new TemporaryFolder();
 
@@ -90,11 +91,50 @@ public class DemoTest {
         assertEquals(Arrays.asList(sentence), child.errors);
     }
 
+    /** Two faces of 87 pixels in a frame that has the picture's size. */
+    @Test
+    public void twoPortraitsSideBySide() throws IOException, InterruptedException {
+        BufferedImage portrait = ImageIO.read(new File(System.getProperty("kyface.source"), "demo/portrait.png"));
+        BufferedImage two = new BufferedImage(1024, 512, BufferedImage.TYPE_INT_RGB);
+        two.createGraphics().drawImage(portrait, 0, 0, null);
+        two.createGraphics().drawImage(portrait, 512, 0, null);
+        File file = folder.newFile("two.png");
+        ImageIO.write(two, "png", file);
+        Child child = demo(file);
+        assertEquals(child.errors.toString(), 0, child.exitStatus);
+        find(child.output, "1024 x 512, as an NV21 frame of 1024 x 512\n");
+        find(child.output, "status 0, 2 faces, drawn in ");
+        String row = " +\\d+ +\\d+ +\\d+ +([\\d.]+)\n";
+        Matcher luma = find(child.output, "\nface 1" + row + "face 2" + row);
+        assertEquals("luma", Float.parseFloat(luma.group(1)), Float.parseFloat(luma.group(2)), 0.02);
+        find(child.output, "in view in 30 and tracked in 30, ");
+    }
+
+    /** The frame is written, with what NV21 adds to odd sides, and nothing of an earlier run stays. */
     @Test
     public void aPictureWithoutAFace() throws IOException, InterruptedException {
+        File out = folder.newFolder("out");
+        for (String name : new String[] {"face.png", "turned.png", "track.png"}) {
+            assertTrue(new File(out, name).createNewFile());
+        }
+        BufferedImage gray = new BufferedImage(301, 199, BufferedImage.TYPE_INT_RGB);
+        gray.setRGB(300, 198, 0xFFFFFF);
         File file = folder.newFile("gray.png");
-        ImageIO.write(new BufferedImage(300, 200, BufferedImage.TYPE_INT_RGB), "png", file);
-        assertRefuses(1, "There is no face in " + file + ".", file);
+        ImageIO.write(gray, "png", file);
+        File faces = new File(out, "faces.png");
+        assertRefuses(1, "There is no face in " + file + "; what was searched is in " + faces + ".", file);
+        assertArrayEquals(new String[] {"faces.png"}, out.list());
+        BufferedImage frame = ImageIO.read(faces);
+        assertEquals(302, frame.getWidth());
+        assertEquals(200, frame.getHeight());
+        assertTrue((frame.getRGB(300, 198) & 0xFF) > (frame.getRGB(299, 197) & 0xFF) + 50);
+    }
+
+    @Test
+    public void resultsThatCannotBeWritten() throws IOException, InterruptedException {
+        File file = folder.newFile("out");
+        assertRefuses(3, "The results cannot be written to " + file + ": it is no folder.",
+                new File(System.getProperty("kyface.source"), "demo/portrait.png"));
     }
 
     @Test
