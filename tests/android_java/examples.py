@@ -37,6 +37,8 @@ GIVEN = """
   protected Bitmap bitmap;
   protected View preview;
   protected FaceInfo face;
+  protected FaceVerifier verifier;
+  protected List<Feature> album;
   protected abstract void draw(Object... what);
 """
 

@@ -18,7 +18,9 @@ import org.jetbrains.annotations.NotNull;
  * <pre>{@code
  * Feature wanted = Feature.decode(verifier.extract(frame, face));
  * for (Feature known : album) {
- *     if (wanted.similarityTo(known) >= FaceVerifier.RECOMMENDED_THRESHOLD) ...
+ *     if (wanted.similarityTo(known) >= FaceVerifier.RECOMMENDED_THRESHOLD) {
+ *         draw(face);
+ *     }
  * }
  * }</pre>
  *
