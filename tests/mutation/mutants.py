@@ -108,7 +108,8 @@ def _constants(code):
         in_brackets = match.group(2) is not None
         before = code[max(0, match.start() - 7) : match.start()]
         kind = "channel" if in_brackets and re.search(r"\b(?:c|val|x)\[$", before) else "constant"
-        yield kind, match.start(), value, str(int(value) + 1 if int(value) % 4 < 2 or kind == "constant" else int(value) - 1)
+        step = -1 if kind == "channel" and int(value) > 1 else 1
+        yield kind, match.start(), value, str(int(value) + step)
     for match in re.finditer(r"(?<![\w.])0x[0-9a-fA-F]+", code):
         yield "constant", match.start(), match.group(), hex(int(match.group(), 16) + 1)
     for match in re.finditer(r"(?<![\w.])\d+\.\d*(?=[fF]?(?![\w.]))", code):
