@@ -207,13 +207,7 @@ public final class Images {
      */
     public static byte @NotNull [] rotate(
             byte @NotNull [] src, int width, int height, int degrees, byte @Nullable [] reuse) {
-        Check.packedImage("src", src, PixelFormat.BGR, width, height);
-        if (degrees != 90 && degrees != 180 && degrees != 270) {
-            throw Check.refusal("degrees", "90, 180 or 270", degrees);
-        }
-        byte[] out = Check.output(reuse, src.length, src);
-        PixelConversion.check(PixelConversion.rotate(src, width, height, 3, degrees, out));
-        return out;
+        return rotate(src, PixelFormat.BGR, width, height, degrees, reuse);
     }
 
     /**
