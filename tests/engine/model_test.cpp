@@ -115,7 +115,7 @@ TEST_F(ModelTest, FilesThatHoldSomethingElse) {
   EXPECT_EQ(KY_ERROR_MODEL, CreateDetector(Write("text", "This is no model, however long one reads on.")));
   EXPECT_EQ(KY_ERROR_MODEL, CreateDetector(Write("zeros", std::string(5000, '\0'))));
   EXPECT_EQ(KY_ERROR_MODEL, CreateDetector(Write("ones", std::string(5000, '\1'))));
-  EXPECT_EQ(KY_ERROR_MODEL, CreateDetector(KY_PORTRAIT));
+  EXPECT_EQ(KY_ERROR_MODEL, CreateDetector(Write("picture", std::string(PortraitFile()))));
 
   ky_handle_t handle = nullptr;
   EXPECT_EQ(KY_ERROR_MODEL, ky_face_create_tracker(&handle, Write("text", "none").c_str(), 0));

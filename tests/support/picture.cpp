@@ -4,12 +4,8 @@
 #include "picture.h"
 
 #include <algorithm>
-#include <array>
 #include <cmath>
 #include <cstdlib>
-#include <fstream>
-#include <iterator>
-#include <stdexcept>
 
 #include "engine/ky_engine.h"
 
@@ -17,169 +13,6 @@ namespace kyengine::test {
 namespace {
 
 constexpr uint8_t kOutside = 128;
-
-// ---- PNG
-// -----------------------------------------------------------------------------------------------------
-
-[[noreturn]] void Malformed() { throw std::runtime_error("not a PNG file of 8-bit RGB pixels"); }
-
-class Bits {
- public:
-  explicit Bits(const std::vector<uint8_t>& bytes) : bytes_(bytes) {}
-
-  uint32_t Take(int count) {
-    uint32_t value = 0;
-    for (int i = 0; i < count; ++i, ++position_) {
-      value |= static_cast<uint32_t>(bytes_.at(position_ / 8) >> (position_ % 8) & 1) << i;
-    }
-    return value;
-  }
-  void SkipToByte() { position_ = (position_ + 7) / 8 * 8; }
-
- private:
-  const std::vector<uint8_t>& bytes_;
-  size_t position_ = 0;
-};
-
-/// A canonical prefix code, from the lengths of its symbols' codes.
-class PrefixCode {
- public:
-  explicit PrefixCode(const std::vector<int>& lengths) {
-    for (int length = 1; length <= kLongest; ++length) {
-      for (size_t symbol = 0; symbol < lengths.size(); ++symbol) {
-        if (lengths[symbol] == length) {
-          symbols_.push_back(static_cast<int>(symbol));
-          ++count_[static_cast<size_t>(length)];
-        }
-      }
-    }
-  }
-
-  int Take(Bits& bits) const {
-    int code = 0;
-    int first = 0;
-    int index = 0;
-    for (size_t length = 1; length <= kLongest; ++length) {
-      code = code << 1 | static_cast<int>(bits.Take(1));
-      if (code - first < count_[length]) {
-        return symbols_[static_cast<size_t>(index + code - first)];
-      }
-      index += count_[length];
-      first = (first + count_[length]) << 1;
-    }
-    Malformed();
-  }
-
- private:
-  static constexpr int kLongest = 15;
-  std::array<int, kLongest + 1> count_ = {};
-  std::vector<int> symbols_;
-};
-
-void InflateBlock(Bits& bits, const PrefixCode& literals, const PrefixCode& distances,
-                  std::vector<uint8_t>& out) {
-  static constexpr int kLengthBase[] = {3,  4,  5,  6,  7,  8,  9,  10, 11,  13,  15,  17,  19,  23, 27,
-                                        31, 35, 43, 51, 59, 67, 83, 99, 115, 131, 163, 195, 227, 258};
-  static constexpr int kLengthBits[] = {0, 0, 0, 0, 0, 0, 0, 0, 1, 1, 1, 1, 2, 2, 2,
-                                        2, 3, 3, 3, 3, 4, 4, 4, 4, 5, 5, 5, 5, 0};
-  for (;;) {
-    int symbol = literals.Take(bits);
-    if (symbol == 256) {
-      return;
-    }
-    if (symbol < 256) {
-      out.push_back(static_cast<uint8_t>(symbol));
-      continue;
-    }
-    symbol -= 257;
-    if (symbol >= static_cast<int>(std::size(kLengthBase))) {
-      Malformed();
-    }
-    const size_t length = static_cast<size_t>(kLengthBase[symbol]) + bits.Take(kLengthBits[symbol]);
-    const int code = distances.Take(bits);
-    const int extra = code < 4 ? 0 : code / 2 - 1;
-    const size_t base = code < 4 ? static_cast<size_t>(code) : static_cast<size_t>(2 + code % 2) << extra;
-    const size_t distance = base + bits.Take(extra) + 1;
-    if (distance > out.size()) {
-      Malformed();
-    }
-    for (size_t i = 0; i < length; ++i) {
-      out.push_back(out[out.size() - distance]);
-    }
-  }
-}
-
-std::vector<uint8_t> Inflate(const std::vector<uint8_t>& zlib) {
-  Bits bits(zlib);
-  bits.Take(16);  // the zlib header
-  std::vector<uint8_t> out;
-  for (bool last = false; !last;) {
-    last = bits.Take(1) != 0;
-    const uint32_t kind = bits.Take(2);
-    if (kind == 0) {
-      bits.SkipToByte();
-      const uint32_t length = bits.Take(16);
-      bits.Take(16);
-      for (uint32_t i = 0; i < length; ++i) {
-        out.push_back(static_cast<uint8_t>(bits.Take(8)));
-      }
-    } else if (kind == 1) {
-      std::vector<int> lengths(288, 8);
-      std::fill(lengths.begin() + 144, lengths.begin() + 256, 9);
-      std::fill(lengths.begin() + 256, lengths.begin() + 280, 7);
-      InflateBlock(bits, PrefixCode(lengths), PrefixCode(std::vector<int>(30, 5)), out);
-    } else if (kind == 2) {
-      static constexpr size_t kOrder[] = {16, 17, 18, 0, 8, 7, 9, 6, 10, 5, 11, 4, 12, 3, 13, 2, 14, 1, 15};
-      const size_t literals = bits.Take(5) + 257;
-      const size_t distances = bits.Take(5) + 1;
-      const size_t codes = bits.Take(4) + 4;
-      std::vector<int> code_lengths(19, 0);
-      for (size_t i = 0; i < codes; ++i) {
-        code_lengths[kOrder[i]] = static_cast<int>(bits.Take(3));
-      }
-      const PrefixCode code(code_lengths);
-      std::vector<int> lengths;
-      while (lengths.size() < literals + distances) {
-        const int symbol = code.Take(bits);
-        if (symbol < 16) {
-          lengths.push_back(symbol);
-        } else if (symbol == 16) {
-          lengths.insert(lengths.end(), 3 + bits.Take(2), lengths.empty() ? 0 : lengths.back());
-        } else {
-          lengths.insert(lengths.end(), symbol == 17 ? 3 + bits.Take(3) : 11 + bits.Take(7), 0);
-        }
-      }
-      const auto split = lengths.begin() + static_cast<ptrdiff_t>(literals);
-      InflateBlock(bits, PrefixCode({lengths.begin(), split}), PrefixCode({split, lengths.end()}), out);
-    } else {
-      Malformed();
-    }
-  }
-  return out;
-}
-
-/// The prediction of PNG's filters from the bytes to the left, above, and above to the left.
-int Predict(int filter, int left, int above, int corner) {
-  switch (filter) {
-    case 0:
-      return 0;
-    case 1:
-      return left;
-    case 2:
-      return above;
-    case 3:
-      return (left + above) / 2;
-    case 4: {
-      const int p = left + above - corner;
-      const int to_left = std::abs(p - left);
-      const int to_above = std::abs(p - above);
-      const int to_corner = std::abs(p - corner);
-      return to_left <= to_above && to_left <= to_corner ? left : to_above <= to_corner ? above : corner;
-    }
-    default:
-      Malformed();
-  }
-}
 
 uint8_t ToByte(double value) { return static_cast<uint8_t>(std::lround(std::clamp(value, 0.0, 255.0))); }
 
@@ -193,46 +26,17 @@ struct Turn {
 
 }  // namespace
 
-Picture ReadPng(const std::string& path) {
-  std::ifstream file(path, std::ios::binary);
-  const std::vector<uint8_t> bytes((std::istreambuf_iterator<char>(file)), std::istreambuf_iterator<char>());
-  const auto word = [&bytes](size_t at) {
-    return static_cast<uint32_t>(bytes.at(at)) << 24 | static_cast<uint32_t>(bytes.at(at + 1)) << 16 |
-           static_cast<uint32_t>(bytes.at(at + 2)) << 8 | bytes.at(at + 3);
-  };
-  constexpr size_t kFirstChunk = 8;
-  constexpr size_t kHeader = kFirstChunk + 8;
-  // 8 bits, RGB, the one compression, the one filtering, not interlaced.
-  if (word(0) != 0x89504e47 || word(kHeader + 8) != 0x08020000 || bytes.at(kHeader + 12) != 0) {
-    Malformed();
-  }
-  Picture picture(static_cast<int>(word(kHeader)), static_cast<int>(word(kHeader + 4)));
-  std::vector<uint8_t> packed;
-  for (size_t chunk = kFirstChunk; chunk + 12 <= bytes.size(); chunk += word(chunk) + 12) {
-    if (word(chunk + 4) == 0x49444154) {  // IDAT
-      const auto data = bytes.begin() + static_cast<ptrdiff_t>(chunk) + 8;
-      packed.insert(packed.end(), data, data + static_cast<ptrdiff_t>(word(chunk)));
-    }
-  }
-
-  const std::vector<uint8_t> lines = Inflate(packed);
-  const size_t row = static_cast<size_t>(picture.width) * 3;
-  for (size_t y = 0; y < static_cast<size_t>(picture.height); ++y) {
-    const int filter = lines.at(y * (row + 1));
-    for (size_t i = 0; i < row; ++i) {
-      const size_t at = y * row + i;
-      const int left = i >= 3 ? picture.rgb[at - 3] : 0;
-      const int above = y > 0 ? picture.rgb[at - row] : 0;
-      const int corner = i >= 3 && y > 0 ? picture.rgb[at - row - 3] : 0;
-      picture.rgb[at] =
-          static_cast<uint8_t>(lines.at(y * (row + 1) + 1 + i) + Predict(filter, left, above, corner));
-    }
-  }
-  return picture;
-}
-
 const Picture& Portrait() {
-  static const Picture portrait = ReadPng(KY_PORTRAIT);
+  static const Picture portrait = [] {
+    Picture picture(512, 512);
+    const std::string_view file = PortraitFile();
+    const std::string_view header = "P6\n512 512\n255\n";
+    if (!file.starts_with(header) || file.size() != header.size() + picture.rgb.size()) {
+      std::abort();
+    }
+    std::copy(file.begin() + header.size(), file.end(), picture.rgb.begin());
+    return picture;
+  }();
   return portrait;
 }
 

@@ -5,7 +5,7 @@
 #pragma once
 
 #include <cstdint>
-#include <string>
+#include <string_view>
 #include <vector>
 
 #include "kyface_api/kyface_api.h"
@@ -27,12 +27,13 @@ struct Picture {
   const uint8_t* at(int x, int y) const { return const_cast<Picture*>(this)->at(x, y); }
 };
 
-/// Reads a PNG file of 8-bit RGB pixels; throws std::runtime_error.
-Picture ReadPng(const std::string& path);
-
-/// The portrait, 512 x 512, and the box about its one face.
+/// The portrait, 512 x 512, and the box about its one face. It is part of the program, which so needs no
+/// file.
 const Picture& Portrait();
 constexpr ky_rect_t kPortraitFace = {179, 83, 266, 170};
+
+/// The portrait's file, a portable pixmap.
+std::string_view PortraitFile();
 
 /// The part of `picture` from (left, top) on; what lies outside the picture is gray.
 Picture Part(const Picture& picture, int left, int top, int width, int height);

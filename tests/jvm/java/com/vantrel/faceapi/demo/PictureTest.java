@@ -3,6 +3,7 @@
 
 package com.vantrel.faceapi.demo;
 
+import static org.junit.Assert.assertArrayEquals;
 import static org.junit.Assert.assertEquals;
 import static org.junit.Assert.assertTrue;
 import static org.junit.Assert.fail;
@@ -241,6 +242,22 @@ public class PictureTest {
             fail("a folder is read");
         } catch (UnusablePicture expected) {
             assertEquals("The path " + folder.getRoot() + " is a folder, not a picture.", expected.getMessage());
+        }
+    }
+
+    /** The native tests take the portrait as a portable pixmap: its pixels, after a header of three lines. */
+    @Test
+    public void theNativeTestsPortraitIsTheDemos() throws IOException {
+        File source = new File(System.getProperty("kyface.source"));
+        byte[] pixmap = Files.readAllBytes(new File(source, "tests/support/portrait.ppm").toPath());
+        byte[] header = "P6\n512 512\n255\n".getBytes(StandardCharsets.US_ASCII);
+        assertArrayEquals(header, Arrays.copyOf(pixmap, header.length));
+
+        Raster portrait = ImageIO.read(new File(source, "demo/portrait.png")).getRaster();
+        int[] samples = portrait.getPixels(0, 0, 512, 512, (int[]) null);
+        assertEquals(header.length + samples.length, pixmap.length);
+        for (int i = 0; i < samples.length; i++) {
+            assertEquals("sample " + i, samples[i], pixmap[header.length + i] & 0xFF);
         }
     }
 }
