@@ -10,6 +10,8 @@
 // each call in the order of their laps: name, calls into the virtual machine, and the calls in the
 // difference.
 
+#include <com_vantrel_faceapi_ColorConversion.h>
+#include <com_vantrel_faceapi_FaceLibrary.h>
 #include <dlfcn.h>
 #include <jni.h>
 #include <link.h>
@@ -24,16 +26,6 @@
 #include "frame/frame.h"
 #include "kyface_api/kyface_api.h"
 #include "lap.h"
-
-extern "C" {
-JNIEXPORT jint JNICALL JNI_OnLoad(JavaVM* vm, void* reserved);
-JNIEXPORT void JNICALL Java_com_vantrel_faceapi_FaceLibrary_convertColorSpace(JNIEnv*, jclass, jbyteArray,
-                                                                              jint, jint, jbyteArray, jint);
-JNIEXPORT jobjectArray JNICALL Java_com_vantrel_faceapi_FaceLibrary_kyFaceTrackBytes(JNIEnv*, jclass, jlong,
-                                                                                     jbyteArray, jint, jint,
-                                                                                     jint, jint, jint,
-                                                                                     jintArray);
-}
 
 namespace {
 
@@ -161,8 +153,7 @@ struct Call {
 std::vector<Call> calls() {
   using namespace HPC::fastcv;
   constexpr int kSide = 64;
-  constexpr int kToRgba = 2;
-  constexpr int kNv21 = 3;
+  constexpr int kToRgba = com_vantrel_faceapi_ColorConversion_NV21_TO_RGBA;
   constexpr int kPoints = 106;
   auto* const pixels = reinterpret_cast<unsigned char*>(bytes);
   static std::vector<unsigned char> out(sizeof(bytes));
@@ -172,7 +163,8 @@ std::vector<Call> calls() {
          armNV212RGBImage<unsigned char, 1, unsigned char, 4>(kSide, kSide, kSide, pixels, 4 * kSide,
                                                               out.data());
        }},
-      {"frame helper nv2RGB, 64 x 64", [=] { nv2RGB(pixels, kNv21, kSide, kSide, out.data()); }},
+      {"frame helper nv2RGB, 64 x 64",
+       [=] { nv2RGB(pixels, kyface::kFormatNv21, kSide, kSide, out.data()); }},
       {"convertColorSpace, 64 x 64",
        [] {
          auto* const array = someObject<_jbyteArray>();

@@ -34,10 +34,9 @@ configure_file(${CMAKE_CURRENT_LIST_DIR}/java.sh.in ${KYFACE_JAVA} @ONLY USE_SOU
 
 # kyface_jar(NAME sources... [DOCUMENTED] [JARS jar...]): target NAME_jar, which makes
 # ${CMAKE_BINARY_DIR}/jar/NAME.jar. JARS are names given to this function before, or paths of other jars.
-# With NATIVES, names of classes, the declarations of their native methods are made in ${KYFACE_JAVA_DECLARATIONS}.
 # With DOCUMENTED whatever is public must carry complete documentation.
 function(kyface_jar name)
-  cmake_parse_arguments(PARSE_ARGV 1 arg "DOCUMENTED" "" "JARS;NATIVES")
+  cmake_parse_arguments(PARSE_ARGV 1 arg "DOCUMENTED" "" "JARS")
   set(jar ${CMAKE_BINARY_DIR}/jar/${name}.jar)
   set(classes ${CMAKE_CURRENT_BINARY_DIR}/${name}.classes)
   set(class_path)
@@ -56,20 +55,11 @@ function(kyface_jar name)
     set(doclint -Xdoclint:all/protected)
   endif()
   list(JOIN class_path ":" class_path)
-  set(native_options)
-  set(declarations)
-  if(arg_NATIVES)
-    set(native_options -h ${KYFACE_JAVA_DECLARATIONS})
-    foreach(class IN LISTS arg_NATIVES)
-      string(REPLACE "." "_" file ${class})
-      list(APPEND declarations ${KYFACE_JAVA_DECLARATIONS}/${file}.h)
-    endforeach()
-  endif()
   add_custom_command(
-    OUTPUT ${jar} ${declarations}
+    OUTPUT ${jar}
     COMMAND ${CMAKE_COMMAND} -E rm -rf ${classes}
     COMMAND ${CMAKE_COMMAND} -E make_directory ${classes} ${CMAKE_BINARY_DIR}/jar
-    COMMAND ${Java_JAVAC_EXECUTABLE} --release 8 -Xlint:${kyface_lint} -Werror -encoding UTF-8 -implicit:none ${doclint} ${native_options}
+    COMMAND ${Java_JAVAC_EXECUTABLE} --release 8 -Xlint:${kyface_lint} -Werror -encoding UTF-8 -implicit:none ${doclint}
             -cp "${class_path}" -d ${classes} ${arg_UNPARSED_ARGUMENTS}
     COMMAND ${Java_JAR_EXECUTABLE} --create --file ${jar} -C ${classes} .
     DEPENDS ${arg_UNPARSED_ARGUMENTS} ${needed}

@@ -12,8 +12,20 @@
 
 namespace {
 
-/// The `format` argument of the frame helpers.
-enum FrameFormat { kNv12 = 2, kNv21 = 3 };
+using kyface::kFormatNv12;
+using kyface::kFormatNv21;
+
+/// The codes of convertColorSpace.
+enum ColorConversion : jint {
+  kNv21ToBgra = JAVA_CONSTANT(ColorConversion, NV21_TO_BGRA, 1),
+  kNv21ToRgba = JAVA_CONSTANT(ColorConversion, NV21_TO_RGBA, 2),
+  kRgbaToNv21 = JAVA_CONSTANT(ColorConversion, RGBA_TO_NV21, 3),
+  kNv12ToBgra = JAVA_CONSTANT(ColorConversion, NV12_TO_BGRA, 5),
+  kBgraToRgba = JAVA_CONSTANT(ColorConversion, BGRA_TO_RGBA, 14),
+  kRgbaToNv12 = JAVA_CONSTANT(ColorConversion, RGBA_TO_NV12, 20),
+  kBgraToRgbaAlias = JAVA_CONSTANT(ColorConversion, BGRA_TO_RGBA_ALIAS, 101),
+  kNv21ToBgr = JAVA_CONSTANT(ColorConversion, NV21_TO_BGR, 1001),
+};
 
 /// Converts the pixels of an RGBA bitmap into `out`. Rows are taken as packed, whatever the bitmap's stride.
 /// Both methods over it write the messages of the first (C11 in docs/compatibility.md).
@@ -60,27 +72,27 @@ JNIEXPORT void JNICALL Java_com_vantrel_faceapi_FaceLibrary_convertColorSpace(JN
     return;
   }
   switch (code) {
-    case 1:
-      nv2BGR(in.bytes(), kNv21, width, height, out.bytes());
+    case kNv21ToBgra:
+      nv2BGR(in.bytes(), kFormatNv21, width, height, out.bytes());
       break;
-    case 2:
-      nv2RGB(in.bytes(), kNv21, width, height, out.bytes());
+    case kNv21ToRgba:
+      nv2RGB(in.bytes(), kFormatNv21, width, height, out.bytes());
       break;
-    case 3:
-      RGB2nv(in.bytes(), kNv21, width, height, out.bytes());
+    case kRgbaToNv21:
+      RGB2nv(in.bytes(), kFormatNv21, width, height, out.bytes());
       break;
-    case 5:
-      nv2BGR(in.bytes(), kNv12, width, height, out.bytes());
+    case kNv12ToBgra:
+      nv2BGR(in.bytes(), kFormatNv12, width, height, out.bytes());
       break;
-    case 14:
-    case 101:
+    case kBgraToRgba:
+    case kBgraToRgbaAlias:
       BGR2RGB(in.bytes(), width, height, out.bytes());
       break;
-    case 20:
-      RGB2nv(in.bytes(), kNv12, width, height, out.bytes());
+    case kRgbaToNv12:
+      RGB2nv(in.bytes(), kFormatNv12, width, height, out.bytes());
       break;
-    case 1001:
-      nv212BGR(in.bytes(), kNv21, width, height, out.bytes());
+    case kNv21ToBgr:
+      nv212BGR(in.bytes(), kFormatNv21, width, height, out.bytes());
       break;
     default:
       break;

@@ -20,20 +20,29 @@ using kyface::brightness::reachesBeyond;
 
 using Metric = decltype(calcGray_YUV);
 
+/// The formats of faceBrightEvaluate; 2 is none (C5).
+enum BrightnessMetric : jint {
+  kLightnessRgba = JAVA_CONSTANT(BrightnessMetric, LIGHTNESS_RGBA, 0),
+  kLightnessBgra = JAVA_CONSTANT(BrightnessMetric, LIGHTNESS_BGRA, 1),
+  kLumaYuv = JAVA_CONSTANT(BrightnessMetric, LUMA_YUV, 3),
+  kGrayBgra = JAVA_CONSTANT(BrightnessMetric, GRAY_BGRA, 4),
+  kGrayRgba = JAVA_CONSTANT(BrightnessMetric, GRAY_RGBA, 5),
+};
+
 /// The metric of a `format`, null for one that has none.
 Metric* metric_of(jint format) {
   switch (format) {
-    case 0:
+    case kLightnessRgba:
       return calcLuminance_RGBA;
-    case 1:
+    case kLightnessBgra:
       return calcLuminance_BGRA;
-    case 3:
+    case kLumaYuv:
       return calcGray_YUV;
-    case 4:
+    case kGrayBgra:
       return calcGray_BGRA;
-    case 5:
+    case kGrayRgba:
       return calcGray_RGBA;
-    default:  // 2 among them (C5)
+    default:
       return nullptr;
   }
 }

@@ -19,17 +19,22 @@ namespace {
 using kyface::CriticalArray;
 using kyface::Image;
 
-/// What the methods answer; the numbers are those of the Java class. Sums are not negative.
+/// What the methods answer. Sums are not negative.
 enum Status : jint {
-  kSuccess = 0,
-  kSizes = -1,      ///< sizes that there are not, or that an array does not hold
-  kNoPixels = -2,   ///< a bitmap without pixels, such as a recycled one
-  kChanged = -3,    ///< a bitmap of other sizes or another configuration than it was said to have
-  kNoElements = -4  ///< the machine does not give an array's elements; its exception is pending
+  kSuccess = JAVA_CONSTANT(PixelConversion, SUCCESS, 0),
+  kSizes = -1,  ///< sizes that there are not, or that an array does not hold
+  /// A bitmap without pixels, such as a recycled one.
+  kNoPixels = JAVA_CONSTANT(PixelConversion, NO_PIXELS, -2),
+  /// A bitmap of other sizes or another configuration than it was said to have.
+  kChanged = JAVA_CONSTANT(PixelConversion, CHANGED, -3),
+  kNoElements = -4,  ///< the JVM does not give an array's elements; its exception is pending
 };
 
-/// The conversions; the numbers are those of the Java class.
-enum Conversion : jint { kSwapRedAndBlue = 0, kRgbaToNv21 = 1, kRgbaToNv12 = 2 };
+enum Conversion : jint {
+  kSwapRedAndBlue = JAVA_CONSTANT(PixelConversion, SWAP_RED_AND_BLUE, 0),
+  kRgbaToNv21 = JAVA_CONSTANT(PixelConversion, RGBA_TO_NV21, 1),
+  kRgbaToNv12 = JAVA_CONSTANT(PixelConversion, RGBA_TO_NV12, 2),
+};
 
 /// The pixels of an image, 0 when there is no such image.
 std::int64_t pixels_of(jint width, jint height) {

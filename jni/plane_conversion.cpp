@@ -21,27 +21,51 @@ using kyface::Plane;
 using kyface::PlanesStatus;
 using kyface::Target;
 
-/// What the methods answer beside a PlanesStatus; the numbers are those of the Java class.
+/// What the methods answer beside a PlanesStatus.
 enum BridgeStatus : jint {
-  kMemory = 16,     ///< planes or output that are null, no direct buffer, or shorter than they are said to be
-  kNotLocked = 17,  ///< a bitmap without pixels, such as a recycled one
-  kNotRgba = 18,    ///< a bitmap of another configuration than ARGB_8888
-  kSmall = 19,      ///< a bitmap smaller than the result
-  kNoElements = 20,  ///< the machine does not give an array's elements; its exception is pending
+  /// Planes or output that are null, no direct buffer, or shorter than they are said to be.
+  kMemory = JAVA_CONSTANT(PlaneConversion, MEMORY, 16),
+  /// A bitmap without pixels, such as a recycled one.
+  kNotLocked = JAVA_CONSTANT(PlaneConversion, NOT_LOCKED, 17),
+  /// A bitmap of another configuration than ARGB_8888.
+  kNotRgba = JAVA_CONSTANT(PlaneConversion, NOT_RGBA, 18),
+  /// A bitmap smaller than the result.
+  kSmall = JAVA_CONSTANT(PlaneConversion, SMALL, 19),
+  kNoElements = 20,  ///< the JVM does not give an array's elements; its exception is pending
 };
+
+// Java's numbers of layouts and statuses are those of `convert_planes`.
+#define SAME_IN_JAVA(value, name) \
+  static_assert(static_cast<jint>(value) == JAVA_CONSTANT(PlaneConversion, name, static_cast<jint>(value)))
+SAME_IN_JAVA(PixelLayout::kRgba, RGBA);
+SAME_IN_JAVA(PixelLayout::kBgra, BGRA);
+SAME_IN_JAVA(PixelLayout::kRgb, RGB);
+SAME_IN_JAVA(PixelLayout::kBgr, BGR);
+SAME_IN_JAVA(PixelLayout::kNv21, NV21);
+SAME_IN_JAVA(PixelLayout::kNv12, NV12);
+SAME_IN_JAVA(PixelLayout::kGray, GRAY);
+SAME_IN_JAVA(PlanesStatus::kSuccess, SUCCESS);
+SAME_IN_JAVA(PlanesStatus::kPicture, PICTURE);
+SAME_IN_JAVA(PlanesStatus::kLuma, LUMA);
+SAME_IN_JAVA(PlanesStatus::kChroma, CHROMA);
+SAME_IN_JAVA(PlanesStatus::kRectangle, RECTANGLE);
+SAME_IN_JAVA(PlanesStatus::kOrientation, ORIENTATION);
+SAME_IN_JAVA(PlanesStatus::kLayout, LAYOUT);
+SAME_IN_JAVA(PlanesStatus::kTarget, TARGET);
+SAME_IN_JAVA(PlanesStatus::kOverlap, OVERLAP);
 
 /// The picture's numbers: width and height, four for each plane (where it begins and ends in its memory, row
 /// stride, pixel stride), and a bit for each plane that is a direct buffer, Y's the lowest.
 constexpr int kWidth = 0;
 constexpr int kHeight = 1;
-constexpr int kPlanes = 2;
+constexpr int kPlanes = JAVA_CONSTANT(PlaneConversion, PLANES, 2);
 constexpr int kFrom = 0;
 constexpr int kTo = 1;
 constexpr int kRowStride = 2;
 constexpr int kPixelStride = 3;
-constexpr int kPlaneNumbers = 4;
-constexpr int kDirect = kPlanes + 3 * kPlaneNumbers;
-constexpr int kNumbers = kDirect + 1;
+constexpr int kPlaneNumbers = JAVA_CONSTANT(PlaneConversion, PLANE_NUMBERS, 4);
+constexpr int kDirect = JAVA_CONSTANT(PlaneConversion, DIRECT, kPlanes + 3 * kPlaneNumbers);
+constexpr int kNumbers = JAVA_CONSTANT(PlaneConversion, NUMBERS, kDirect + 1);
 
 /// Bytes of a direct buffer from `from` on and before `to`; none when the buffer has not as many.
 struct Bytes {

@@ -11,13 +11,10 @@ using kyface::view_420;
 
 namespace {
 
-/// The `format` of an NV21 frame; every other value is NV12.
-constexpr int kFormatNv21 = 3;
-
 /// The conversion for the chroma order that `format` names.
 template <HPC::fastcv::ColorCvtType nv21, HPC::fastcv::ColorCvtType nv12, int src_channels, int dst_channels>
 void convert_420(int format, const Image<src_channels>& src, Image<dst_channels>* dst) {
-  if (format == kFormatNv21) {
+  if (format == kyface::kFormatNv21) {
     kyface::convert<nv21>(src, dst);
   } else {
     kyface::convert<nv12>(src, dst);

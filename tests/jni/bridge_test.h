@@ -11,10 +11,10 @@
 #include <string>
 #include <vector>
 
-#include "face_library.h"
 #include "fake_engine.h"
 #include "fake_platform.h"
 #include "fake_vm.h"
+#include "jni/java_declarations.h"
 #include "journal.h"
 
 /// Calls a native method in the fixture's virtual machine.

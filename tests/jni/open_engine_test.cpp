@@ -6,8 +6,8 @@
 #include <gtest/gtest.h>
 
 #include "engine/ky_engine.h"
-#include "face_library.h"
 #include "fake_vm.h"
+#include "jni/java_declarations.h"
 #include "tests/support/picture.h"
 
 namespace {

@@ -4,7 +4,7 @@
 ///
 /// Every buffer is packed (no stride): a semi-planar 4:2:0 frame is `width * height` luma bytes followed by
 /// `width * height / 2` bytes of interleaved chroma pairs, a 4- or 3-channel image is `width * height * 4` or
-/// `* 3` bytes. `format` selects the chroma order: 3 is NV21 (V before U), any other value NV12 (U before V).
+/// `* 3` bytes. `format` selects the chroma order: `kFormatNv21`, or NV12 for any other value.
 ///
 /// Caller memory is neither kept nor freed, and pointers and sizes are not checked here: the image library
 /// checks the sizes, and on a mismatch (an odd width or height of a 4:2:0 frame) nothing is written and
@@ -16,6 +16,13 @@
 #pragma once
 
 #define KYFACE_EXPORT __attribute__((visibility("default")))
+
+namespace kyface {
+
+constexpr int kFormatNv12 = 2;  ///< U before V
+constexpr int kFormatNv21 = 3;  ///< V before U
+
+}  // namespace kyface
 
 /// 4:2:0 frame `nv` to RGBA `out`, alpha 255.
 KYFACE_EXPORT void nv2RGB(unsigned char* nv, int format, int width, int height, unsigned char* out);

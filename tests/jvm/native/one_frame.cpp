@@ -3,14 +3,9 @@
 /// Calls native methods again and again from one native frame. A method called from Java drops whatever
 /// references it leaves behind; called from here they would pile up, and the virtual machine's checks
 /// complain.
-#include <jni.h>
+#include "jni/java_declarations.h"
 
 extern "C" {
-
-jobjectArray Java_com_vantrel_faceapi_FaceLibrary_kyFaceTrackBytes(JNIEnv* env, jclass type, jlong handle,
-                                                                   jbyteArray image, jint format, jint width,
-                                                                   jint height, jint stride, jint orientation,
-                                                                   jintArray status);
 
 JNIEXPORT jint JNICALL Java_com_vantrel_faceapi_LeakTest_trackInOneFrame(JNIEnv* env, jclass type,
                                                                          jlong handle, jbyteArray image,

@@ -3,6 +3,8 @@
 
 package com.vantrel.faceapi;
 
+import java.lang.annotation.Native;
+
 /**
  * The conversions of {@link FaceLibrary#convertColorSpace}.
  *
@@ -13,20 +15,28 @@ package com.vantrel.faceapi;
  */
 public final class ColorConversion {
     /** NV21 frame to BGRA, {@code width * height * 4} bytes. */
+    @Native
     public static final int NV21_TO_BGRA = 1;
     /** NV21 frame to RGBA, {@code width * height * 4} bytes. */
+    @Native
     public static final int NV21_TO_RGBA = 2;
     /** RGBA to NV21 frame, {@code width * height * 3 / 2} bytes. */
+    @Native
     public static final int RGBA_TO_NV21 = 3;
     /** NV12 frame to BGRA, {@code width * height * 4} bytes. */
+    @Native
     public static final int NV12_TO_BGRA = 5;
     /** BGRA to RGBA (or back: red and blue change places), {@code width * height * 4} bytes. */
+    @Native
     public static final int BGRA_TO_RGBA = 14;
     /** RGBA to NV12 frame, {@code width * height * 3 / 2} bytes. */
+    @Native
     public static final int RGBA_TO_NV12 = 20;
     /** The same as {@link #BGRA_TO_RGBA}. */
+    @Native
     public static final int BGRA_TO_RGBA_ALIAS = 101;
     /** NV21 frame to BGR, {@code width * height * 3} bytes. */
+    @Native
     public static final int NV21_TO_BGR = 1001;
 
     private ColorConversion() {}

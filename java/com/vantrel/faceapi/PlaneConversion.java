@@ -33,6 +33,19 @@ final class PlaneConversion {
 
     static final int SUCCESS = 0;
 
+    private static final int PICTURE = 1;
+    private static final int LUMA = 2;
+    private static final int CHROMA = 3;
+    private static final int RECTANGLE = 4;
+    private static final int ORIENTATION = 5;
+    private static final int LAYOUT = 6;
+    private static final int TARGET = 7;
+    private static final int OVERLAP = 8;
+    private static final int MEMORY = 16;
+    private static final int NOT_LOCKED = 17;
+    private static final int NOT_RGBA = 18;
+    private static final int SMALL = 19;
+
     private static final int PLANES = 2;
     private static final int PLANE_NUMBERS = 4;
     private static final int DIRECT = PLANES + 3 * PLANE_NUMBERS;
@@ -109,29 +122,29 @@ final class PlaneConversion {
         switch (status) {
             case SUCCESS:
                 return;
-            case 1:
+            case PICTURE:
                 throw new IllegalArgumentException("width and height must be even and above 0");
-            case 2:
+            case LUMA:
                 throw new IllegalArgumentException("the luma plane does not hold the picture");
-            case 3:
+            case CHROMA:
                 throw new IllegalArgumentException("the chroma planes do not hold the picture");
-            case 4:
+            case RECTANGLE:
                 throw new IllegalArgumentException("the rectangle must be inside the picture");
-            case 5:
+            case ORIENTATION:
                 throw new IllegalArgumentException("degrees must be 0, 90, 180 or 270");
-            case 6:
+            case LAYOUT:
                 throw new IllegalArgumentException("there is no such layout");
-            case 7:
+            case TARGET:
                 throw new IllegalArgumentException("the output does not hold the result");
-            case 8:
+            case OVERLAP:
                 throw new IllegalArgumentException("the output must not be the source");
-            case 16:
+            case MEMORY:
                 throw new IllegalArgumentException("a buffer or array is not as long as it is said to be");
-            case 17:
+            case NOT_LOCKED:
                 throw new IllegalArgumentException("bitmap has no pixels: it is recycled");
-            case 18:
+            case NOT_RGBA:
                 throw new IllegalArgumentException("bitmap must be ARGB_8888");
-            case 19:
+            case SMALL:
                 throw new IllegalArgumentException("bitmap is smaller than the result");
             default:
                 throw new IllegalStateException("the conversion failed with status " + status);
@@ -148,7 +161,7 @@ final class PlaneConversion {
             Object y, Object u, Object v, int[] picture, int left, int top, int width, int height, int degrees,
             boolean mirrored, Bitmap out) {
         if (out.isRecycled()) {
-            check(17);
+            check(NOT_LOCKED);
         }
         if (!out.isMutable()) {
             throw new IllegalArgumentException("bitmap is immutable");
