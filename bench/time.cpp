@@ -1,39 +1,51 @@
 // SPDX-FileCopyrightText: the libjni_kyface_api authors
 // SPDX-License-Identifier: Apache-2.0
 
-// The operations under Google Benchmark:
-//
-//   bench_time PATTERN SIZE... [--benchmark_...]
-//
-// The names of the benchmarks are operation/library/size/traffic.
+// The operations as a shared library, whose clock starts and stops on this side: tool/timing.py loads it and
+// lets the operations take turns, among themselves and with those of libraries that only Python can call.
 
-#include <benchmark/benchmark.h>
-
-#include <cstdio>
+#include <ctime>
 #include <string>
 
 #include "operation.h"
 
-int main(int argc, char** argv) {
-  benchmark::Initialize(&argc, argv);
-  if (argc < 3) {
-    std::fprintf(stderr, "usage: %s PATTERN SIZE... [--benchmark_...]\n", argv[0]);
-    return 2;
+namespace {
+
+std::vector<bench::Operation> chosen;
+
+using Call = std::function<void()>;
+
+std::int64_t processorNanoseconds() {
+  timespec time{};
+  clock_gettime(CLOCK_THREAD_CPUTIME_ID, &time);
+  return std::int64_t{time.tv_sec} * 1'000'000'000 + time.tv_nsec;
+}
+
+}  // namespace
+
+#define BENCH_EXPORT extern "C" __attribute__((visibility("default")))
+
+/// Chooses the operations that match and returns how many they are.
+BENCH_EXPORT int bench_choose(const char* pattern) {
+  chosen = bench::operationsMatching(pattern, false);
+  return static_cast<int>(chosen.size());
+}
+
+BENCH_EXPORT const char* bench_name(size_t index) { return chosen[index].name.c_str(); }
+BENCH_EXPORT const char* bench_library(size_t index) { return chosen[index].library.c_str(); }
+BENCH_EXPORT double bench_traffic(size_t index) { return chosen[index].traffic; }
+
+/// What a chosen operation calls for a picture of a size, until it is released.
+BENCH_EXPORT void* bench_prepare(size_t index, int width, int height) {
+  return new Call(chosen[index].prepare({width, height}));
+}
+BENCH_EXPORT void bench_release(void* call) { delete static_cast<Call*>(call); }
+
+/// The processor's nanoseconds that `times` calls take.
+BENCH_EXPORT std::int64_t bench_run(const void* call, int times) {
+  const std::int64_t start = processorNanoseconds();
+  for (int i = 0; i < times; ++i) {
+    (*static_cast<const Call*>(call))();
   }
-  for (const bench::Operation& operation : bench::operationsMatching(argv[1], false)) {
-    for (int i = 2; i < argc; ++i) {
-      char name[256];
-      std::snprintf(name, sizeof(name), "%s/%s/%s/%g", operation.name.c_str(), operation.library.c_str(),
-                    argv[i], operation.traffic);
-      const bench::Size size = bench::sizeOf(argv[i]);
-      benchmark::RegisterBenchmark(name, [operation, size](benchmark::State& state) {
-        const std::function<void()> call = operation.prepare(size);
-        for (auto _ : state) {
-          call();
-        }
-      })->Unit(benchmark::kMillisecond);
-    }
-  }
-  benchmark::RunSpecifiedBenchmarks();
-  return 0;
+  return processorNanoseconds() - start;
 }

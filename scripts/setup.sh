@@ -8,9 +8,9 @@
 # Groups are `host` and `aarch64`, named after the build presets that need them, both without an argument; `bench`,
 # `coverage`, `fuzz` and `lint`, which add what the scripts of these names need; `dlib`, its sources in .deps/dlib for an
 # engine on Android; `pictures`, the photographs that scripts/accuracy looks at; `models`, which makes the verifier's
-# model in .deps/models out of published weights; and `android-java`, which brings Android's own framework classes for the
-# tests of that label. Nothing else needs the last two. Packages that are there already are left
-# alone, and nothing is asked when all are. Packages of this machine are installed with apt-get (through sudo when not
+# model in .deps/models out of published weights; `android-java`, which brings Android's own framework classes for the
+# tests of that label; and `opencv`, a newer OpenCV than the packaged one in .deps/opencv, for a column of scripts/bench.
+# Nothing else needs the last three. Packages that are there already are left alone, and nothing is asked when all are. Packages of this machine are installed with apt-get (through sudo when not
 # root). Packages of 64-bit Arm are unpacked into .deps/arm64: installing them would pull this system's own packages
 # along. Names differ from one Debian to the next:
 #
@@ -58,7 +58,6 @@ packages_fuzz=(
 packages_coverage=("${packages_fuzz[@]}")
 packages_bench=(
   "${packages_aarch64[@]}"
-  libbenchmark-dev                  # times on this machine
   libyuv-dev libopencv-imgproc-dev  # the peers
 )
 
@@ -330,9 +329,27 @@ fetch_android_java() {
   exec 9>&-
 }
 
+# fetch_opencv: OpenCV for Python, as bench/newer_opencv.txt has it, into .deps/opencv.
+fetch_opencv() {
+  local folder=$deps/opencv work
+  ! cmp -s bench/newer_opencv.txt "$folder/complete" || return 0
+  say "fetching OpenCV for Python into .deps/opencv"
+  mkdir -p "$deps"
+  work=$(mktemp -d "$deps/opencv.XXXXXX")
+  local install=(python3 -m pip install --quiet --disable-pip-version-check --root-user-action ignore --no-deps
+    --only-binary :all: --require-hashes --target "$work" --requirement bench/newer_opencv.txt)
+  if ! "${install[@]}" >&2 || ! PYTHONPATH=$work python3 -c 'import cv2' >&2; then
+    rm -rf "$work"
+    fail "OpenCV for Python could not be had; without it scripts/bench leaves its column out"
+  fi
+  cp bench/newer_opencv.txt "$work/complete"
+  rm -rf "$folder"
+  mv "$work" "$folder"
+}
+
 command -v apt-get >/dev/null || fail "this needs a Debian system (Debian 12 or later): there is no apt-get"
 [ $# -gt 0 ] || set -- host aarch64
-packages=() arm64=() models='' android_java='' dlib='' pictures=''
+packages=() arm64=() models='' android_java='' dlib='' opencv='' pictures=''
 for group in "$@"; do
   case $group in
     host) packages+=("${packages_host[@]}") ;;
@@ -344,14 +361,19 @@ for group in "$@"; do
     models) packages+=("${packages_models[@]}") models=1 ;;
     android-java) packages+=("${packages_android_java[@]}") android_java=1 ;;
     dlib) dlib=1 ;;
+    opencv)
+      # Any Python with these will do, Debian's or another.
+      python3 -c 'import numpy, pip' 2>/dev/null || packages+=(python3-numpy python3-pip)
+      opencv=1
+      ;;
     pictures) packages+=("${packages_host[@]}") pictures=1 ;;
     *)
       fail "there is no group \"$group\"; the groups are host, aarch64, android-java, bench, coverage, dlib, fuzz, lint," \
-        "models and pictures"
+        "models, opencv and pictures"
       ;;
   esac
 done
-readarray -t packages < <(printf '%s\n' "${packages[@]}" | awk '!seen[$0]++')
+readarray -t packages < <(printf '%s\n' "${packages[@]}" | awk 'NF && !seen[$0]++')
 if [[ ${packages[*]} == *LLVM* ]]; then
   choose_llvm
   packages=("${packages[@]//LLVM/$llvm}")
@@ -364,4 +386,5 @@ fi
 [ -z "$models" ] || make_models
 [ -z "$android_java" ] || fetch_android_java
 [ -z "$dlib" ] || unpack_dlib_source
+[ -z "$opencv" ] || fetch_opencv
 [ -z "$pictures" ] || unpack_pictures

@@ -10,6 +10,12 @@ import sys
 import tempfile
 from pathlib import Path
 
+# Whose operations they are: this project's; the peers'; OpenCV's as Python has it, which is only timed; and a plain copy.
+OWN = "fastcv"
+LIBYUV, OPENCV = PEERS = ["libyuv", "opencv"]
+NEWER_OPENCV = "newer opencv"
+FLOOR = "memcpy"
+
 # Where the peers' own libraries are that Debian keeps in folders of their own.
 EXTRA_LIBRARY_PATH = "/usr/lib/aarch64-linux-gnu/blas:/usr/lib/aarch64-linux-gnu/lapack"
 
@@ -35,14 +41,6 @@ class Count:
     @property
     def per_pixel(self):
         return self.instructions / self.pixels
-
-
-@dataclasses.dataclass
-class Time:
-    """How long a call takes on this machine."""
-
-    traffic: float  # bytes per pixel
-    milliseconds: float
 
 
 @dataclasses.dataclass(frozen=True)

@@ -1,10 +1,14 @@
 # SPDX-FileCopyrightText: the libjni_kyface_api authors
 # SPDX-License-Identifier: Apache-2.0
-"""What bench_phone measured on a device's cores, as a table."""
+"""Measures with bench_phone on a device's cores."""
 
 import dataclasses
+import os
+import subprocess
+import sys
 
-from .table import FLOOR, OWN, Table
+from .counting import FLOOR, OWN
+from .table import Table
 
 
 @dataclasses.dataclass
@@ -54,7 +58,7 @@ def table(measured, size):
               for operation, library, _, _ in measured.results if library == FLOOR}
     names = ["operation"]
     for core in measured.cores:
-        names += [f"{core.name} ns", f"{core.name} cycles", f"{core.name} instructions"]
+        names += [f"{core.name} ns", f"{core.name} cycles", f"{core.name} instr"]
         names += [f"{core.name} {peer} ns" for peer in [*peers, FLOOR]]
 
     def cells(operation, core):
@@ -67,3 +71,62 @@ def table(measured, size):
     operations = dict.fromkeys(operation for operation, library, _, _ in measured.results if library == OWN)
     rows = [[operation, *(cell for core in measured.cores for cell in cells(operation, core))] for operation in operations]
     return Table(names, rows)
+
+
+# Builds for Android, by the NDK that the environment names.
+BUILD_ANDROID = """
+source scripts/common.sh
+source scripts/android.sh
+need_ndk
+scripts/setup.sh host
+configure_android "$1" -DKYFACE_LIBYUV_SOURCES="$2"
+cmake --build --preset "$1" --target bench_phone >&2
+"""
+PHONE_PROPERTIES = ["ro.product.manufacturer", "ro.product.model", "ro.soc.model", "ro.build.version.release"]
+
+
+def _phone_name():
+    """What the attached device calls itself."""
+    values = []
+    for name in PHONE_PROPERTIES:
+        run = subprocess.run(["adb", "shell", f"getprop {name}"], stdin=subprocess.DEVNULL, stdout=subprocess.PIPE, text=True,
+                             check=False)
+        values.append(run.stdout.strip())
+    maker, product, chip, version = values
+    return " ".join(word for word in (maker, product, f"({chip})" if chip else "", f"Android {version}") if word)
+
+
+def measure(root, pattern, sizes, libyuv):
+    """Measures on the attached device what the project at `root` has, and libyuv of the sources in a folder, if any; or
+    shows through the runner that the program runs. Prints it."""
+    through_runner = bool(os.environ.get("KYFACE_ANDROID_RUN"))
+    refusals = []
+    for abi, preset in (("arm64-v8a", "android-arm64"), ("x86_64", "android-x86_64")):
+        check = subprocess.run(["scripts/device", "check", abi], cwd=root, stderr=subprocess.PIPE, text=True, check=False)
+        if check.returncode == 0:
+            break
+        refusals.append(check.stderr.replace("device: ", "bench: ", 1).strip())
+    else:
+        sys.exit(refusals[0])
+    sources = str(libyuv.resolve()) if libyuv else ""
+    build = subprocess.run(["bash", "-c", BUILD_ANDROID, "bench", preset, sources], cwd=root, check=False)
+    if build.returncode != 0:
+        sys.exit(1)
+    folder = root / "build" / preset
+    command = ["scripts/device", "run", abi, folder, folder / "bin" / "bench_phone", "0" if through_runner else "20",
+               pattern or ".", *sizes]
+    run = subprocess.run(command, cwd=root, stdout=subprocess.PIPE, text=True, check=False)
+    if run.returncode != 0:
+        sys.exit(f"bench: bench_phone failed with status {run.returncode}")
+    measured = parsed(run.stdout)
+    if through_runner:
+        print(f"bench_phone runs: {len(measured.results)} results; through KYFACE_ANDROID_RUN they are no measurements")
+        return
+    print(_phone_name())
+    for core in measured.cores:
+        print(core.title)
+        if core.counters != "yes":
+            print(f"  cycles and instructions are not counted there ({core.counters}); "
+                  "`adb shell setprop security.perf_harden 0` may allow it")
+    for size in sizes:
+        print(f"\n{size}; per pixel\n\n{table(measured, size).plain()}")

@@ -21,21 +21,18 @@ class Panel:
     series: list
 
 
-def svg(panels):
-    """The panels side by side."""
-    width = (LEFT + PANEL_WIDTH + RIGHT) * len(panels)
+def svg(panel):
+    width = LEFT + PANEL_WIDTH + RIGHT
     height = TOP + PANEL_HEIGHT + BOTTOM
-    parts = [
+    return "\n".join([
         f'<svg xmlns="http://www.w3.org/2000/svg" width="{width}" height="{height}" viewBox="0 0 {width} {height}" '
         f'font-family="sans-serif" font-size="12" fill="{TEXT}">',
         f'<rect width="{width}" height="{height}" fill="#ffffff"/>',
-    ]
-    for index, panel in enumerate(panels):
-        parts.append(f'<g transform="translate({(LEFT + PANEL_WIDTH + RIGHT) * index + LEFT} {TOP})">')
-        parts += _panel(panel)
-        parts.append("</g>")
-    parts.append("</svg>")
-    return "\n".join(parts) + "\n"
+        f'<g transform="translate({LEFT} {TOP})">',
+        *_panel(panel),
+        "</g>",
+        "</svg>",
+    ]) + "\n"
 
 
 def _panel(panel):
@@ -59,7 +56,7 @@ def _panel(panel):
         x = x_of(width, height)
         yield f'<text x="{x:.1f}" y="{PANEL_HEIGHT + 18}" text-anchor="middle">{width}</text>'
         yield f'<text x="{x:.1f}" y="{PANEL_HEIGHT + 32}" text-anchor="middle">x {height}</text>'
-    # A series has its colour in every panel. Names stand at the ends of their lines, moved apart where these are close.
+    # A series has its colour in every diagram. Names stand at the ends of their lines, moved apart where these are close.
     last = math.inf
     for colour, (name, points) in sorted(zip(COLOURS, panel.series), key=lambda series: series[1][1][-1][2]):
         line = " ".join(f"{x_of(width, height):.1f},{y_of(value):.1f}" for width, height, value in points)

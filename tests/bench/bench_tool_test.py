@@ -2,13 +2,18 @@
 # SPDX-License-Identifier: Apache-2.0
 """Tests what scripts/bench makes of its measurements. Takes the folder of the package `tool`."""
 
+import json
 import sys
+import types
 import unittest
+from pathlib import Path
 
-sys.path.insert(0, sys.argv.pop(1))
+BENCH = Path(sys.argv.pop(1))
+sys.path.insert(0, str(BENCH))
 
-from tool import model, phone, record, table  # noqa: E402  (found through the line above)
-from tool.counting import Block, CallCount, Count, Key, Time  # noqa: E402
+from tool import model, newer_opencv, phone, record, table, timing  # noqa: E402  (found through the line above)
+from tool.counting import NEWER_OPENCV, OPENCV, OWN, PEERS, Block, CallCount, Count, Key  # noqa: E402
+from tool.timing import Contender, Time  # noqa: E402
 
 SIZE, ODD_SIZE = "1280x720", "1278x718"
 PIXELS = 1000
@@ -98,13 +103,16 @@ class Tables(unittest.TestCase):
             Key("gray", "fastcv", SIZE): {"A55": own_cycles, "N1": own_cycles},
             Key("gray", "libyuv", SIZE): {"A55": 2.0, "N1": 0.5},
         }
-        times = {Key("gray", "fastcv", SIZE): Time(4, own_time), Key("gray", "libyuv", SIZE): Time(4, 1.2),
-                 Key("gray", "opencv", SIZE): Time(4, 1.0)}
+        times = {Key("gray", library, SIZE): Time(4, milliseconds, own_time / milliseconds)
+                 for library, milliseconds in (("fastcv", own_time), ("libyuv", 1.2), ("opencv", 1.0))}
         known = {"gray": {"by": "Another", "instructions": 0.8, "A55": 1.0}}
         return table.Figures([SIZE, ODD_SIZE], counts, cycles, times, known, {"gray": {"instructions": goal}})
 
     def shortfalls(self, **changes):
-        return [(row[1], row[-1]) for row in table.shortfall_table(self.figures(**changes)).rows]
+        return [(row[1], row[-1]) for row in table.arm64_shortfall_table(self.figures(**changes)).rows]
+
+    def host_shortfalls(self, figures):
+        return [row[2:] for row in table.host_shortfall_table(figures).rows]
 
     def test_the_floor_is_that_of_the_same_traffic(self):
         self.assertEqual(self.figures().operations, ["gray"])
@@ -115,19 +123,68 @@ class Tables(unittest.TestCase):
         self.assertEqual(self.figures().best_peer("N1", "gray"), (0.5, "libyuv"))
 
     def test_nothing_falls_short_at_the_marks(self):
-        self.assertEqual(self.shortfalls(odd=0.7 * 1.14, own_time=1.49), [])
-        nothing = table.shortfall_table(self.figures())
+        self.assertEqual(self.shortfalls(odd=0.7 * 1.14), [])
+        nothing = table.arm64_shortfall_table(self.figures())
         self.assertEqual((nothing.plain(), nothing.markdown()), ("none", "none"))
+        self.assertEqual(self.host_shortfalls(self.figures(own_time=1.04)), [])
 
     def test_each_mark_that_is_passed_is_listed(self):
         self.assertEqual(self.shortfalls(own=0.72, odd=0.72), [("instr/px", "goal")])
+        self.assertEqual(self.shortfalls(own=0.85, odd=0.85, goal=1), [("instr/px", "Another")])
         self.assertEqual(self.shortfalls(odd=0.7 * 1.16), [(f"instr/px at {ODD_SIZE}", f"at {SIZE}")])
         self.assertEqual(self.shortfalls(own_cycles=0.6), [("N1 cycles/px", "libyuv")])
         self.assertEqual(self.shortfalls(own_cycles=1.1), [("A55 cycles/px", "Another"), ("N1 cycles/px", "libyuv")])
-        self.assertEqual(self.shortfalls(own_time=1.51), [("host ms", "opencv")])
+
+    def test_any_peer_that_is_faster_on_this_machine_is_listed(self):
+        self.assertEqual(self.host_shortfalls(self.figures(own_time=1.06)), [["1.060", "1.000", "1.06", "opencv"]])
+        figures = self.figures()
+        figures.times[Key("gray", NEWER_OPENCV, SIZE)] = Time(4, 0.5, 2.0)
+        self.assertEqual(self.host_shortfalls(figures), [["1.000", "0.500", "2.00", NEWER_OPENCV]])
+
+    def test_a_part_of_a_peers_time_can_be_the_goal(self):
+        figures = self.figures(own_time=0.9)
+        figures.goals["gray"]["times"] = {"opencv": 0.6, "libyuv": 0.8, NEWER_OPENCV: 0.1}
+        self.assertEqual(self.host_shortfalls(figures), [["0.900", "0.600", "1.50", "goal: 0.6 of opencv"]])
+
+    def all_operations(self):
+        """Everything that is recorded, with every figure there can be, and wide ones."""
+        operations = [name for name, record in json.loads((BENCH / "expected.json").read_text()).items() if SIZE in record]
+        keys = [Key(name, library, size) for name in operations for library in [OWN, *PEERS] for size in (SIZE, ODD_SIZE)]
+        known = {name: {"by": "Another", "instructions": 10, "A55": 100.123, "N1": 10} for name in operations}
+        return table.Figures(
+            [SIZE, ODD_SIZE], {key: count_of(100.123) for key in keys},
+            {key: {"A55": 100.123, "N1": 100.123} for key in keys},
+            {Key(name, library, SIZE): Time(4, 100.123, 10.12)
+             for name in operations for library in [OWN, *PEERS, NEWER_OPENCV]}, known, known)
+
+    def test_what_is_printed_fits_a_terminal(self):
+        figures = self.all_operations()
+        self.assertGreater(len(figures.operations), 100)
+        for text in (table.terminal_table(figures), table.host_shortfall_table(figures).plain(),
+                     table.arm64_shortfall_table(figures).plain(), table.arm64_planes_table(figures).plain(),
+                     table.host_planes_table(figures, [SIZE]).plain()):
+            self.assertLessEqual(max(map(len, text.splitlines())), 120)
+
+    def test_everything_is_printed_when_asked_for_or_when_it_fits(self):
+        figures = self.all_operations()
+        width = max(map(len, table.terminal_table(figures, wide=True).splitlines()))
+        self.assertGreater(width, 200)
+        self.assertIn("libyuv", table.terminal_table(figures, wide=True))
+        self.assertNotIn("libyuv", table.terminal_table(figures))
+        timed = table.Figures([SIZE], {}, {}, figures.times, {}, {})
+        self.assertIn("libyuv", table.terminal_table(timed))
+
+    def test_two_passes_stand_beside_the_pairs_that_they_equal(self):
+        costs = {"pairs-to-RGBA-90": 1.9, "pairs-to-RGBA-90-mirrored": 1.8, "pairs-to-NV21": 0.2, "gray": 0.7,
+                 "two-passes-NV21-to-RGBA-90": 2.4}
+        counts = {Key(name, OWN, SIZE): count_of(cost) for name, cost in costs.items()}
+        result = table.arm64_planes_table(table.Figures([SIZE], counts, {}, {}, {}, {}))
+        self.assertEqual(result.names, ["operation", "instr", "instr two passes"])
+        self.assertEqual(result.rows, [["pairs-to-RGBA-90", "1.900", "2.400"], ["pairs-to-RGBA-90-mirrored", "1.800", ""],
+                                       ["pairs-to-NV21", "0.200", ""]])
 
     def test_columns_without_figures_are_left_out(self):
-        names = table.operations_table(self.figures(), table.instruction_columns).names
+        names = table.operations_table(self.figures(), ["gray"], table.instruction_columns).names
         self.assertIn("instr libyuv", names)
         self.assertNotIn("instr opencv", names)
 
@@ -148,6 +205,74 @@ class Tables(unittest.TestCase):
         self.assertEqual(row, ["gray", "170", "100", "200", "100"])
 
 
+class Timing(unittest.TestCase):
+    def test_figures_are_medians_and_those_of_pairs(self):
+        turns = []
+
+        def contender(library, milliseconds):
+            """One that slows down with every pass, as on a machine that becomes busy."""
+            passes = []
+
+            def prepare(size):
+                self.assertEqual(size, (64, 48))
+                passes.append(size)
+
+                def run(calls):
+                    turns.append(library)
+                    return int(calls * milliseconds * len(passes) * 1e6)
+
+                return run
+
+            return Contender("gray", library, 4, prepare)
+
+        times = timing.measured([contender(OWN, 3), contender(OPENCV, 2)], ["64x48"])
+        self.assertEqual(times[Key("gray", OWN, "64x48")], Time(4, 6.0, 1.0))
+        self.assertEqual(times[Key("gray", OPENCV, "64x48")], Time(4, 4.0, 1.5))
+        self.assertEqual(turns.count(OWN), turns.count(OPENCV))
+
+    def test_what_has_no_counterpart_has_no_ratio(self):
+        times = timing.measured([Contender("floor", "memcpy", 4, lambda size: lambda calls: calls * 10**9)], ["1x1"])
+        self.assertEqual(times, {Key("floor", "memcpy", "1x1"): Time(4, 1000.0, None)})
+
+
+class NewerOpencv(unittest.TestCase):
+    """Over a stand-in that tells what is called."""
+
+    def called(self, name):
+        calls = []
+
+        def function(name):
+            return lambda *arguments: calls.append((name, *arguments))
+
+        codes = ["COLOR_BGR2HSV", "COLOR_HSV2BGR", "COLOR_BGRA2RGBA", "COLOR_YUV2RGBA_NV21", "COLOR_BGR2YUV_I420",
+                 "COLOR_YUV2GRAY_420", "ROTATE_90_CLOCKWISE", "ROTATE_180", "ROTATE_90_COUNTERCLOCKWISE"]
+        stand_in = types.SimpleNamespace(cvtColor=function("cvtColor"), rotate=function("rotate"),
+                                         copyTo=function("copyTo"), **{code: code for code in codes})
+        opencv = object.__new__(newer_opencv.NewerOpencv)
+        opencv._cv2 = stand_in
+        opencv._numpy = types.SimpleNamespace(shares_memory=lambda result, destination: True)
+        opencv._picture = lambda width, height, channels, sample: f"{width}x{height} {sample}x{channels}"
+        return calls[0] if opencv.prepared(name, (8, 4)) else None
+
+    def test_names_tell_what_is_called(self):
+        for name, call in {
+            "BGR-to-HSV-f32": ("cvtColor", "8x4 f32x3", "COLOR_BGR2HSV", "8x4 f32x3", 3),
+            "BGRA-to-HSV": ("cvtColor", "8x4 u8x4", "COLOR_BGR2HSV", "8x4 u8x3", 3),
+            "HSV-to-BGRA": ("cvtColor", "8x4 u8x3", "COLOR_HSV2BGR", "8x4 u8x4", 4),
+            "BGRA-to-RGBA": ("cvtColor", "8x4 u8x4", "COLOR_BGRA2RGBA", "8x4 u8x4", 4),
+            "NV21-to-RGBA": ("cvtColor", "8x6 u8x1", "COLOR_YUV2RGBA_NV21", "8x4 u8x4", 4),
+            "BGR-to-I420": ("cvtColor", "8x4 u8x3", "COLOR_BGR2YUV_I420", "8x6 u8x1", 0),
+            "YUV-to-GRAY": ("cvtColor", "8x6 u8x1", "COLOR_YUV2GRAY_420", "8x4 u8x1", 1),
+            "rotate90-u8x3": ("rotate", "8x4 u8x3", "ROTATE_90_CLOCKWISE", "4x8 u8x3"),
+            "rotate180-f32x1": ("rotate", "8x4 f32x1", "ROTATE_180", "8x4 f32x1"),
+        }.items():
+            self.assertEqual(self.called(name), call, name)
+
+    def test_what_python_has_not_is_left_out(self):
+        for name in ("BGR-to-NV21", "pairs-to-RGBA", "crop-scaled-u8x1", "rotate90-NV21", "calcLuminance_BGRA"):
+            self.assertIsNone(self.called(name), name)
+
+
 class Phone(unittest.TestCase):
     TEXT = ("core\tsmall\t0\t1800000\ncounters\tyes\n"
             "result\tgray\tfastcv\t8x8\t4\t0\t0.5\t0.9\t0.7\n"
@@ -158,7 +283,7 @@ class Phone(unittest.TestCase):
 
     def test_every_core_has_its_columns(self):
         result = phone.table(phone.parsed(self.TEXT), "8x8")
-        self.assertEqual(result.names, ["operation", "small ns", "small cycles", "small instructions", "small libyuv ns",
+        self.assertEqual(result.names, ["operation", "small ns", "small cycles", "small instr", "small libyuv ns",
                                         "small memcpy ns", "big ns"])
         self.assertEqual(result.rows, [["gray", "0.500", "0.900", "0.700", "0.600", "0.250", "0.125"]])
 
