@@ -55,6 +55,28 @@ def blanked(text):
     return UNSEEN.sub(blank, NO_CODE.sub(blank, text))
 
 
+ARM = re.compile(r"defined\(__(?:ARM_NEON|aarch64__|x86_64__)\)")
+
+
+def only_for(arm, text):
+    """For each line whether it is compiled: True in a branch of the processor's own, False in the other's, else None."""
+    lines, branches = [], []
+    for line in text.split("\n"):
+        directive = re.match(r"\s*#\s*(if|ifdef|ifndef|else|elif|endif)\b(.*)", line)
+        kind = directive.group(1) if directive else ""
+        if kind.startswith("if"):
+            about = ARM.search(directive.group(2))
+            # Whether the branch that begins is the processor's.
+            negated = about is not None and "!" in directive.group(2)[: about.start()]
+            branches.append(None if about is None else (("x86" in about.group()) != arm) != negated)
+        elif kind in ("else", "elif") and branches[-1] is not None:
+            branches[-1] = not branches[-1]
+        elif kind == "endif":
+            branches.pop()
+        lines.append(False if False in branches else True if True in branches else None)
+    return lines
+
+
 # The project's format puts blanks around binary operators and none into template arguments, so a sign with a blank on
 # each side is an operator.
 SWAPPED_OPERATORS = {

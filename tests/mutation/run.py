@@ -11,14 +11,19 @@ import shutil
 import signal
 import subprocess
 import sys
+import time
 import zipfile
 from collections import Counter, defaultdict
+from dataclasses import dataclass
 from pathlib import Path
 
-from mutants import mutants
+from mutants import mutants, only_for
 
 # What is changed. Tests, benchmarks and the demo are not: they are what should notice.
 AREAS = ("base", "simd", "fastcv", "frame", "brightness", "jni", "engine", "java")
+
+# Suites that test an area at first hand, where they are not of its name.
+NEAREST = {"base": ("jni",), "simd": ("simd", "fastcv"), "java": ("jvm",)}
 SOURCES = (".cpp", ".h", ".java")
 
 # Instruction counts are no test of what is computed, and a package is put together from what the other tests saw.
@@ -31,15 +36,27 @@ def area_of(path):
     return path.split("/")[0]
 
 
+@dataclass
+class Test:
+    """A test of the build."""
+
+    folder: str  # its suite's
+    command: list
+    seconds: float = 0  # that it took unchanged
+
+
 class Tree:
     """The copy that is changed, its build, and its tests."""
 
-    def __init__(self, root, preset):
+    def __init__(self, root, preset, jobs):
         self.source = root
         self.preset = preset
+        self.jobs = str(jobs)
         self.root = root / "build" / "mutate" / "tree"
         self.build_folder = self.root / "build" / preset
-        self.tests = {}  # name: (seconds that it took unchanged, files that it runs)
+        self.tests = {}  # name: Test
+        self.needed = {}  # program: shared libraries of the build that it loads
+        self.times = {}  # file that was built: (when, content)
 
     def synchronise(self):
         """Brings the copy to the state of the tracked files, touching only what differs."""
@@ -62,9 +79,13 @@ class Tree:
         if (self.source / ".deps").exists() and not dependencies.exists():
             dependencies.symlink_to(self.source / ".deps")
 
-    def build(self, seconds):
-        """Whether the copy builds."""
-        return self._quiet(["cmake", "--build", "--preset", self.preset], seconds)[0] == 0
+    def build(self, seconds, targets=()):
+        """Whether the copy builds: the targets, or without any all."""
+        command = ["cmake", "--build", "--preset", self.preset, "-j", self.jobs]
+        return self._quiet(command + (["--target", *self._relative(targets)] if targets else []), seconds)[0] == 0
+
+    def _relative(self, files):
+        return [str(Path(file).relative_to(self.build_folder)) for file in files]
 
     def configure(self):
         code, output = self._quiet(["cmake", "--preset", self.preset, "-Wno-dev", "--log-level=WARNING"], 600)
@@ -72,64 +93,117 @@ class Tree:
             sys.exit(output)
 
     def learn_tests(self):
-        """Reads the list of tests and runs them all once; returns the names of those that fail."""
+        """Reads the list of tests and runs them all once, unless the same build has been; the names of those that fail."""
         listed = json.loads(
             subprocess.run(
                 ["ctest", "--preset", self.preset, "--show-only=json-v1"],
                 cwd=self.root, check=True, capture_output=True, text=True,
             ).stdout
-        )
-        programs = {
-            test["name"]: test.get("command", []) for test in listed["tests"] if not LEFT_OUT.search(test["name"])
-        }
-        log = self.root / "build" / "baseline.txt"
-        code, output = self._quiet(self._ctest(programs, 1200, stop=False), 7200)
-        log.write_text(output)
-        passed = dict(re.findall(r"Test +#\d+: (\S+) [ .]*(?:Passed|\*\*\*Skipped) +([\d.]+) sec", output))
-        self.tests = {name: (float(passed[name]), command) for name, command in programs.items() if name in passed}
-        return [] if code == 0 else [name for name in programs if name not in passed]
+        )  # fmt: skip
+        for test in listed["tests"]:
+            if not LEFT_OUT.search(test["name"]):
+                properties = {entry["name"]: entry["value"] for entry in test.get("properties", [])}
+                folder = Path(properties.get("WORKING_DIRECTORY", ".")).name
+                self.tests[test["name"]] = Test(folder, test.get("command", []))
+        contents = self.contents()
+        self.needed = {file: self._libraries(file) for file in contents if "/bin/" in file}
+
+        record = self.root / "build" / f"baseline.{self.preset}.json"
+        state = hashlib.sha256(repr(sorted(contents.items())).encode()).hexdigest()
+        earlier = json.loads(record.read_text()) if record.exists() else {}
+        if earlier.get("state") != state:
+            # One at a time: what they take is what they are ordered by.
+            code, output = self._quiet(self._ctest(self.tests, 1200, stop=False), 7200)
+            passed = dict(re.findall(r"Test +#\d+: (\S+) [ .]*(?:Passed|\*\*\*Skipped) +([\d.]+) sec", output))
+            earlier = {"state": state, "seconds": passed, "failed": code != 0}
+            record.write_text(json.dumps(earlier))
+        failed = [name for name in self.tests if name not in earlier["seconds"]] if earlier["failed"] else []
+        self.tests = {name: test for name, test in self.tests.items() if name in earlier["seconds"]}
+        for name, test in self.tests.items():
+            test.seconds = float(earlier["seconds"][name])
+        return failed
 
     def contents(self):
-        """What was built: file to hash."""
-        hashes = {}
+        """What was built: file to content. Only what is newer than when it was last looked at is read."""
         for folder in ("bin", "lib", "jar"):
-            for file in sorted((self.build_folder / folder).glob("*")):
+            for file in (self.build_folder / folder).glob("*"):
+                if not file.is_file():
+                    continue
+                when = file.stat().st_mtime_ns
+                if self.times.get(str(file), (None,))[0] == when:
+                    continue
                 if file.suffix == ".jar":
                     with zipfile.ZipFile(file) as jar:
-                        entries = [(entry.filename, entry.CRC) for entry in jar.infolist()]
-                    hashes[str(file)] = repr(sorted(entries))
-                elif file.is_file():
-                    hashes[str(file)] = hashlib.sha256(file.read_bytes()).hexdigest()
-        return hashes
+                        content = repr(sorted((entry.filename, entry.CRC) for entry in jar.infolist()))
+                else:
+                    content = hashlib.sha256(file.read_bytes()).hexdigest()
+                self.times[str(file)] = (when, content)
+        return {file: content for file, (_, content) in self.times.items()}
 
-    def first_failure(self, changed):
-        """Runs the tests that use a changed file, short ones first; the name of the first that fails, or None."""
-        libraries = any("/lib/" in file or "/jar/" in file for file in changed)
+    def targets(self, names):
+        """What must be built for these tests: their programs, and what a virtual machine or a script may load."""
+        files = set()
+        for name in names:
+            programs = [part for part in self.tests[name].command if part in self.needed]
+            files.update(part for part in self.tests[name].command if part in self.times)
+            files.update(*(self.needed[program] for program in programs))
+            if not programs:
+                files.update(file for file in self.times if file not in self.needed)
+        return sorted(files)
 
-        def concerned(command):
-            # A virtual machine or a script loads what no command line shows.
-            return any(part in changed for part in command) or libraries
+    def nearest(self, area):
+        """Tests of a layer's own that take no long time."""
+        folders = NEAREST.get(area, (area,))
+        return [name for name, test in self.tests.items() if test.folder in folders and test.seconds < 10]
 
-        names = sorted((seconds, name) for name, (seconds, command) in self.tests.items() if concerned(command))
+    def concerned(self, names, changed):
+        """Those of the tests that use a changed file, short ones first."""
+
+        def uses(test):
+            programs = [part for part in test.command if part in self.needed]
+            if any(part in changed for part in test.command):
+                return True
+            if programs:
+                return any(library in changed for program in programs for library in self.needed[program])
+            return any(file not in self.needed for file in changed)
+
+        return sorted((name for name in names if uses(self.tests[name])), key=lambda name: self.tests[name].seconds)
+
+    def first_failure(self, names):
+        """Runs these tests, short ones first; the name of the first that fails and how, or None."""
         for low, high in ((0, 2), (2, 10), (10, 60), (60, 1e9)):
-            stage = [name for seconds, name in names if low <= seconds < high]
+            stage = [name for name in names if low <= self.tests[name].seconds < high]
             if not stage:
                 continue
-            limit = int(max(self.tests[name][0] for name in stage) * 8 + 20)
+            limit = int(max(self.tests[name].seconds for name in stage) * 8 + 20)
             code, output = self._quiet(self._ctest(stage, limit, stop=True), 7200)
             if code != 0:
-                failed = re.search(r"Test +#\d+: (\S+) [ .]*(\*\*\*\S+)", output)
+                failed = re.search(r"Test +#\d+: (\S+) [ .]*(\*\*\*[^\n]*)", output)
                 if failed is None:
                     return "ctest", ""  # it was ended itself
                 return failed.group(1), failed.group(2)
         return None
 
     def _ctest(self, names, limit, stop):
+        """Tests are limited in the processor's seconds, which no other load adds to; what only waits, in longer ones."""
         pattern = "^(" + "|".join(re.escape(name) for name in names) + ")$"
         return [
-            "ctest", "--test-dir", str(self.build_folder), "-j", str(os.cpu_count()), "--timeout", str(limit),
+            "bash", "-c", f'ulimit -S -t {limit} && ulimit -H -t {limit + 10} && exec "$@"', "bash",
+            "ctest", "--test-dir", str(self.build_folder), "-j", self.jobs, "--timeout", str(limit * 10),
             "-R", pattern, *(["--stop-on-failure"] if stop else []),
         ]  # fmt: skip
+
+    def _libraries(self, program):
+        """The shared libraries of this build that a program loads, and those that they load."""
+        found, queue = set(), [program]
+        while queue:
+            dynamic = subprocess.run(["readelf", "-dW", queue.pop()], capture_output=True, text=True).stdout
+            for name in re.findall(r"\(NEEDED\).*\[(.*)\]", dynamic):
+                library = str(self.build_folder / "lib" / name)
+                if library in self.times and library not in found:
+                    found.add(library)
+                    queue.append(library)
+        return found
 
     def _quiet(self, command, seconds):
         """Runs a step in a process group of its own, which ends with it; its exit status and output."""
@@ -154,6 +228,7 @@ class Campaign:
         self.arguments = arguments
         self.results_file = root / "out" / "mutate" / f"{arguments.preset}.jsonl"
         equivalent = root / "tests" / "mutation" / "equivalent.json"
+        self.noticed_by = defaultdict(list)  # file: tests that noticed a change to it, the last one last
         self.equivalent = json.loads(equivalent.read_text()) if equivalent.exists() else {}
 
     def candidates(self):
@@ -167,7 +242,13 @@ class Campaign:
             for file in [whole] if whole.is_file() else sorted(whole.rglob("*")):
                 if file.suffix in SOURCES:
                     name = str(file.relative_to(self.root))
-                    by_area[area_of(name)] += mutants(name, file.read_text())
+                    text = file.read_text()
+                    lines = only_for(self.arguments.preset == "aarch64", text)
+                    by_area[area_of(name)] += [
+                        mutant
+                        for mutant in mutants(name, text)
+                        if lines[mutant.line - 1] in ((True,) if self.arguments.branches else (True, None))
+                    ]
         if self.arguments.sample is None:
             return [mutant for area in by_area.values() for mutant in area]
         chance = random.Random(self.arguments.seed)
@@ -186,7 +267,7 @@ class Campaign:
             for mutant in candidates:
                 print(f"{mutant.path}:{mutant.line}: {mutant.kind}: {mutant.before} -> {mutant.after}")
             return 0
-        tree = Tree(self.root, self.arguments.preset)
+        tree = Tree(self.root, self.arguments.preset, self.arguments.jobs)
         tree.synchronise()
         tree.configure()
         self._say(f"building and testing the unchanged tree, {self.arguments.preset}")
@@ -200,13 +281,20 @@ class Campaign:
         unchanged = tree.contents()
 
         results = self._earlier()
+        for mutant in candidates:
+            if results.get(mutant.key, {}).get("result") == NOTICED:
+                self.noticed_by[mutant.path].append(results[mutant.key]["by"])
         self.results_file.parent.mkdir(parents=True, exist_ok=True)
         with self.results_file.open("a") as log:
             for number, mutant in enumerate(candidates, 1):
                 if mutant.key in self.equivalent:
                     results[mutant.key] = {"result": EQUIVALENT}
                 if mutant.key not in results:
+                    began = time.monotonic()
                     results[mutant.key] = self._try(tree, unchanged, mutant)
+                    results[mutant.key]["seconds"] = round(time.monotonic() - began)
+                    if results[mutant.key]["result"] == NOTICED:
+                        self.noticed_by[mutant.path].append(results[mutant.key]["by"])
                     log.write(json.dumps({"key": mutant.key, **results[mutant.key]}) + "\n")
                     log.flush()
                 result = results[mutant.key]
@@ -223,22 +311,34 @@ class Campaign:
         # What was not noticed, or is no longer listed as equivalent, may be by now.
         return {entry["key"]: entry for entry in lines if entry["result"] in (NOTICED, UNBUILT, HANGS)}
 
+    def _recent(self, path):
+        """The two tests that were last to notice a change to a file."""
+        return list(dict.fromkeys(reversed(self.noticed_by[path])))[:2]
+
     def _try(self, tree, unchanged, mutant):
         file = tree.root / mutant.path
         text = file.read_text()
         file.write_text(mutant.applied(text))
+        tried, any_change = set(), False
         try:
-            if not tree.build(900):
-                return {"result": UNBUILT}
-            built = tree.contents()
-            changed = {name for name, content in built.items() if unchanged.get(name) != content}
-            if not changed:
-                return {"result": EQUIVALENT, "by": "(the same code)"}
-            failure = tree.first_failure(changed)
-            if failure is None:
-                return {"result": UNNOTICED}
-            name, how = failure
-            return {"result": HANGS if "Timeout" in how else NOTICED, "by": name}
+            # What noticed another change to this file, then what is nearest, then everything: of most changes only the
+            # first has to be built.
+            for stage in (self._recent(mutant.path), tree.nearest(area_of(mutant.path)), list(tree.tests)):
+                names = [name for name in stage if name in tree.tests and name not in tried]
+                if not names:
+                    continue
+                targets = tree.targets(names)
+                if not tree.build(1800, targets):
+                    return {"result": UNBUILT}
+                built = tree.contents()
+                changed = {name for name in targets if unchanged.get(name) != built.get(name)}
+                any_change = any_change or bool(changed)
+                failure = tree.first_failure(tree.concerned(names, changed))
+                if failure is not None:
+                    name, how = failure
+                    return {"result": HANGS if re.search("Timeout|CPU", how) else NOTICED, "by": name}
+                tried.update(names)
+            return {"result": UNNOTICED} if any_change else {"result": EQUIVALENT, "by": "(the same code)"}
         finally:
             file.write_text(text)
 
