@@ -2,6 +2,8 @@
 // SPDX-License-Identifier: Apache-2.0
 
 // Verifiers with a descriptor's model: random weights, written as a file.
+#include <unistd.h>
+
 #include <array>
 #include <bit>
 #include <cmath>
@@ -31,7 +33,7 @@ class Files {
   }
 
   std::string Write(const std::string& name, const std::vector<uint8_t>& bytes) {
-    const std::string path = testing::TempDir() + "ky_described_" + name;
+    const std::string path = testing::TempDir() + "ky_described_" + std::to_string(getpid()) + "_" + name;
     std::ofstream(path, std::ios::binary)
         .write(reinterpret_cast<const char*>(bytes.data()), static_cast<std::streamsize>(bytes.size()));
     paths_.push_back(path);

@@ -6,6 +6,7 @@
 // The configuration of dlib comes first.
 #include <dlib/image_processing/frontal_face_detector.h>
 #include <dlib/serialize.h>
+#include <unistd.h>
 
 #include <cmath>
 #include <cstdio>
@@ -47,7 +48,7 @@ class ModelTest : public testing::Test {
   }
 
   std::string Write(const std::string& name, const std::string& bytes) {
-    const std::string path = testing::TempDir() + "ky_engine_" + name;
+    const std::string path = testing::TempDir() + "ky_engine_" + std::to_string(getpid()) + "_" + name;
     std::ofstream(path, std::ios::binary) << bytes;
     written_.push_back(path);
     return path;

@@ -116,7 +116,8 @@ class Tree:
             code, output = self._quiet(self._ctest(self.tests, 1200, stop=False), 7200)
             passed = dict(re.findall(r"Test +#\d+: (\S+) [ .]*(?:Passed|\*\*\*Skipped) +([\d.]+) sec", output))
             earlier = {"state": state, "seconds": passed, "failed": code != 0}
-            record.write_text(json.dumps(earlier))
+            if code == 0:
+                record.write_text(json.dumps(earlier))
         failed = [name for name in self.tests if name not in earlier["seconds"]] if earlier["failed"] else []
         self.tests = {name: test for name, test in self.tests.items() if name in earlier["seconds"]}
         for name, test in self.tests.items():
