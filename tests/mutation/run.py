@@ -56,6 +56,7 @@ class Tree:
         self.build_folder = self.root / "build" / preset
         self.tests = {}  # name: Test
         self.needed = {}  # program: shared libraries of the build that it loads
+        self.known = set()  # files that can be built
         self.times = {}  # file that was built: (when, content)
 
     def synchronise(self):
@@ -105,6 +106,7 @@ class Tree:
                 properties = {entry["name"]: entry["value"] for entry in test.get("properties", [])}
                 folder = Path(properties.get("WORKING_DIRECTORY", ".")).name
                 self.tests[test["name"]] = Test(folder, test.get("command", []))
+        self.known = self._known()
         contents = self.contents()
         self.needed = {file: self._libraries(file) for file in contents if "/bin/" in file}
 
@@ -128,7 +130,7 @@ class Tree:
         """What was built: file to content. Only what is newer than when it was last looked at is read."""
         for folder in ("bin", "lib", "jar"):
             for file in (self.build_folder / folder).glob("*"):
-                if not file.is_file():
+                if str(file) not in self.known or not file.is_file():
                     continue
                 when = file.stat().st_mtime_ns
                 if self.times.get(str(file), (None,))[0] == when:
@@ -194,6 +196,13 @@ class Tree:
             "-R", pattern, *(["--stop-on-failure"] if stop else []),
         ]  # fmt: skip
 
+    def _known(self):
+        """All that can be built; configuring puts files beside it that are no targets."""
+        listed = subprocess.run(
+            ["ninja", "-C", str(self.build_folder), "-t", "targets", "all"], check=True, capture_output=True, text=True
+        ).stdout
+        return {str(self.build_folder / line.split(": ")[0]) for line in listed.splitlines() if ": " in line}
+
     def _libraries(self, program):
         """The shared libraries of this build that a program loads, and those that they load."""
         found, queue = set(), [program]
@@ -219,6 +228,9 @@ class Tree:
             os.killpg(process.pid, signal.SIGKILL)
             output, _ = process.communicate()
             return -1, output
+        except BaseException:  # an interrupt does not reach the group
+            os.killpg(process.pid, signal.SIGKILL)
+            raise
 
 
 class Campaign:
