@@ -10,7 +10,7 @@
 #include <cmath>
 #include <cstddef>
 
-#include "failure.h"
+#include "serialized.h"
 
 namespace kyengine {
 namespace {
@@ -104,9 +104,8 @@ bool EstimatePose(const std::vector<dlib::dpoint>& points, Pose* pose) {
 }
 
 LandmarkModel::LandmarkModel(std::istream& in) {
+  CheckLandmarks(in);
   deserialize(predictor_, in);
-  Require(predictor_.num_parts() >= 1 && predictor_.num_parts() <= KY_FACE_MAX_POINTS,
-          KY_ERROR_LANDMARK_MODEL);
 }
 
 std::vector<dlib::dpoint> LandmarkModel::Locate(const GrayImage& upright, const dlib::drectangle& box) const {

@@ -40,8 +40,8 @@ bool EstimatePose(const std::vector<dlib::dpoint>& points, Pose* pose);
 /// A landmark model; immutable and shared by the handles that were created from one file.
 class LandmarkModel {
  public:
-  /// Reads a model serialized by dlib; throws when there is none, or one of more than KY_FACE_MAX_POINTS
-  /// points. dlib checks the form of a model but not whether its parts agree: files of models are trusted.
+  /// Reads a model serialized by dlib; throws when there is none, one whose parts do not agree, or one of
+  /// more than KY_FACE_MAX_POINTS points.
   explicit LandmarkModel(std::istream& in);
 
   /// The points of the face in `box` of the upright picture.

@@ -19,60 +19,16 @@
 #include <vector>
 
 #include "failure.h"
+#include "serialized.h"
 
 namespace kyengine {
 namespace {
-
-using Detector = dlib::frontal_face_detector;
-using DlibScanner = dlib::scan_fhog_pyramid<dlib::pyramid_down<6>>;
-using Weights = Detector::feature_vector_type;
 
 /// Unpacking the built-in detector takes long. It is never destroyed: threads may search until the process is
 /// gone.
 const std::shared_ptr<const Filters>& BuiltInDetector() {
   static const auto& detector = *new auto(std::make_shared<const Filters>(dlib::get_frontal_face_detector()));
   return detector;
-}
-
-/// Reads a detector that dlib serialized. dlib's own reading takes the sizes in the file on trust; this
-/// checks that the parts fit one another before they are put together.
-Detector ReadDetector(std::istream& in) {
-  int version = 0;
-  dlib::deserialize(version, in);
-  Require(version == 1 || version == 2, KY_ERROR_MODEL);
-
-  DlibScanner scanner;
-  dlib::test_box_overlap overlap;
-  std::vector<Weights> weights;
-  deserialize(scanner, in);
-  if (version == 1) {
-    deserialize(weights.emplace_back(), in);
-    deserialize(overlap, in);
-  } else {
-    deserialize(overlap, in);
-    unsigned long count = 0;
-    dlib::deserialize(count, in);
-    constexpr unsigned long kMostFilters = 1000;
-    Require(count <= kMostFilters, KY_ERROR_MODEL);
-    weights.resize(count);
-    for (Weights& w : weights) {
-      deserialize(w, in);
-    }
-  }
-
-  constexpr unsigned long kLongestSide = KY_MAX_FRAME_SIDE;
-  const unsigned long cell = scanner.get_cell_size();
-  const auto window_fits = [cell](unsigned long side) { return side >= cell && side <= kLongestSide; };
-  Require(cell >= kSmallestCell && cell <= kLargestCell && scanner.get_padding() <= kLongestSide,
-          KY_ERROR_MODEL);
-  Require(
-      window_fits(scanner.get_detection_window_width()) && window_fits(scanner.get_detection_window_height()),
-      KY_ERROR_MODEL);
-  Require(!weights.empty(), KY_ERROR_MODEL);
-  for (const Weights& w : weights) {
-    Require(w.size() == scanner.get_num_dimensions() + 1, KY_ERROR_MODEL);
-  }
-  return {scanner, overlap, weights};
 }
 
 std::ifstream Open(const std::string& path, ky_result_t code) {
@@ -86,8 +42,7 @@ bool Exists(const std::string& path) {
   return std::filesystem::exists(path, ignored);
 }
 
-/// Runs `read`; false when it threw, which is how dlib says that a file holds something else. A size in such
-/// a file may also be one that no memory suffices for.
+/// Runs `read`; false when it threw, which is how dlib says, too, that a file holds something else.
 template <typename Read>
 bool Reads(Read read) {
   try {
@@ -132,8 +87,12 @@ Model LoadModel(const char* path) {
     return {BuiltInDetector(), nullptr};
   }
   std::ifstream in = Open(path, KY_ERROR_MODEL_FILE);
-  Detector detector;
-  if (Reads([&] { detector = ReadDetector(in); })) {
+  dlib::frontal_face_detector detector;
+  const auto read = [&] {
+    CheckDetector(in);
+    deserialize(detector, in);
+  };
+  if (Reads(read)) {
     const std::string beside = std::string(path) + KY_LANDMARKS_SUFFIX;
     return {std::make_shared<const Filters>(detector),
             Exists(beside) ? LoadLandmarks(beside.c_str(), KY_ERROR_LANDMARK_MODEL) : nullptr};

@@ -6,11 +6,16 @@
 #include <algorithm>
 #include <tuple>
 
+#include "failure.h"
+
 namespace kyengine {
 namespace {
 
 using Pyramid = dlib::pyramid_down<6>;
 using Weights = Filters::Detector::feature_vector_type;
+
+/// A model may have filters that find something everywhere.
+constexpr size_t kMostFound = size_t{1} << 20;
 
 }  // namespace
 
@@ -115,6 +120,7 @@ void Scanner::ScanLevel(const GrayImage& picture, unsigned int level, double lea
                 dlib::centered_rect(centre, static_cast<unsigned long>(f.taps_across) - 2 * f.padding,
                                     static_cast<unsigned long>(f.taps_down) - 2 * f.padding),
                 f.cell, f.taps_down, f.taps_across);
+            Require(found_.size() < kMostFound, KY_ERROR_MEMORY);
             dlib::rect_detection& detection = found_.emplace_back();
             detection.detection_confidence = scores[x] - f.biases[filter];
             detection.weight_index = filter;
@@ -139,7 +145,12 @@ std::vector<dlib::rect_detection> Scanner::Find(GrayImage& picture, double least
       break;
     }
     // A level is the one before in 5/6 of its size.
-    next_.set_size(picture.nr() * 5 / 6, picture.nc() * 5 / 6);
+    const long rows = picture.nr() * 5 / 6;
+    const long columns = picture.nc() * 5 / 6;
+    if (rows < 1 || columns < 1) {
+      break;
+    }
+    next_.set_size(rows, columns);
     resizer_.Resize(picture, next_);
     swap(picture, next_);
   }

@@ -6,6 +6,7 @@
 // The configuration of dlib comes first.
 #include <dlib/image_processing/frontal_face_detector.h>
 #include <dlib/serialize.h>
+#include <sys/resource.h>
 #include <unistd.h>
 
 #include <cmath>
@@ -163,6 +164,72 @@ TEST_F(ModelTest, DetectorsWhosePartsDoNotFitAreRefused) {
   EXPECT_EQ(KY_ERROR_MODEL, CreateDetector(write(2, {weights, none}, 2)));
 }
 
+TEST_F(ModelTest, DetectorsThatCannotScanAreRefused) {
+  static const dlib::frontal_face_detector kGood = dlib::get_frontal_face_detector();
+  static const auto& kScanner = kGood.get_scanner();
+  static const long kNumbers = kScanner.get_num_dimensions();
+  struct Scan {
+    unsigned long cell = kScanner.get_cell_size();
+    unsigned long padding = kScanner.get_padding();
+    unsigned long width = kScanner.get_detection_window_width();
+    unsigned long height = kScanner.get_detection_window_height();
+    unsigned long levels = kScanner.get_max_pyramid_levels();
+    unsigned long smallest = kScanner.get_min_pyramid_layer_width();
+    unsigned long features = 0;
+    double overlap = 0.5;
+    long numbers = kNumbers;
+    long length = kNumbers + 1;
+  };
+  const auto write = [&](const Scan& scan) {
+    std::ostringstream out;
+    const auto natural = [&](unsigned long number) { dlib::serialize(number, out); };
+    dlib::serialize(2, out);
+    dlib::serialize(1, out);
+    natural(scan.features);
+    natural(0);
+    for (const unsigned long number :
+         {scan.cell, scan.padding, scan.width, scan.height, scan.levels, scan.smallest, scan.smallest}) {
+      natural(number);
+    }
+    dlib::serialize(1.0, out);
+    dlib::serialize(scan.numbers, out);
+    dlib::serialize(scan.overlap, out);
+    dlib::serialize(1.0, out);
+    natural(1);
+    dlib::matrix<double, 0, 1> weights(scan.length);
+    weights = 0;
+    dlib::serialize(weights, out);
+    return Write("scan", out.str());
+  };
+  EXPECT_EQ(KY_SUCCESS, CreateDetector(write({})));
+  EXPECT_EQ(KY_ERROR_MODEL, CreateDetector(write({.cell = 0}))) << "a division by 0";
+  EXPECT_EQ(KY_ERROR_MODEL, CreateDetector(write({.cell = 65})));
+  EXPECT_EQ(KY_ERROR_MODEL, CreateDetector(write({.padding = 1UL << 40})));
+  EXPECT_EQ(KY_ERROR_MODEL, CreateDetector(write({.width = 7})));
+  EXPECT_EQ(KY_ERROR_MODEL, CreateDetector(write({.width = 1UL << 40})));
+  EXPECT_EQ(KY_ERROR_MODEL, CreateDetector(write({.levels = 0})));
+  EXPECT_EQ(KY_ERROR_MODEL, CreateDetector(write({.levels = 1UL << 63}))) << "a search without an end";
+  EXPECT_EQ(KY_ERROR_MODEL, CreateDetector(write({.smallest = 0}))) << "pictures without pixels";
+  EXPECT_EQ(KY_ERROR_MODEL, CreateDetector(write({.features = 1UL << 28}))) << "memory for features";
+  EXPECT_EQ(KY_ERROR_MODEL, CreateDetector(write({.overlap = NAN})));
+  EXPECT_EQ(KY_ERROR_MODEL, CreateDetector(write({.overlap = 1.5})));
+  EXPECT_EQ(KY_ERROR_MODEL, CreateDetector(write({.numbers = kNumbers + 1})));
+  EXPECT_EQ(KY_ERROR_MODEL, CreateDetector(write({.length = kNumbers})));
+}
+
+TEST_F(ModelTest, PyramidsEndWithTheirLastPixel) {
+  // Levels as small as a model may ask for, and no fewer than it may.
+  dlib::scan_fhog_pyramid<dlib::pyramid_down<6>> scanner;
+  const dlib::frontal_face_detector good = dlib::get_frontal_face_detector();
+  scanner.copy_configuration(good.get_scanner());
+  scanner.set_min_pyramid_layer_size(1, 1);
+  const dlib::frontal_face_detector deep(scanner, good.get_overlap_tester(), good.get_w(0));
+  const Detector detector(KY_CONFIG_LARGE_FACES, Write("deep", Bytes(deep)).c_str());
+  Detected faces;
+  ASSERT_EQ(KY_SUCCESS, Detect(detector, TestFrame(AboutFace()), faces));
+  EXPECT_EQ(1, faces.count);
+}
+
 // ---- landmarks
 // -----------------------------------------------------------------------------------------------
 
@@ -227,6 +294,63 @@ TEST_F(ModelTest, LandmarksMustFitTheRecord) {
   const std::vector<ky_pointf_t> more(KY_FACE_MAX_POINTS + 1, {0.5F, 0.5F});
   EXPECT_EQ(KY_ERROR_MODEL, CreateDetector(Write("more", Landmarks(more))));
   EXPECT_EQ(KY_ERROR_MODEL, CreateDetector(Write("no_points", Landmarks({}))));
+}
+
+TEST_F(ModelTest, LandmarksWhosePartsDoNotFitAreRefused) {
+  const ky_face_t face = FaceWith(Write("parts", LandmarkParts().Bytes()).c_str());
+  EXPECT_EQ(2, face.points_count);
+  const auto refused = [&](const LandmarkParts& parts) {
+    return CreateDetector(Write("parts", parts.Bytes())) == KY_ERROR_MODEL;
+  };
+  EXPECT_TRUE(refused({.shape = {0.3F, 0.3F, 0.7F}})) << "half a point";
+  EXPECT_TRUE(refused({.shape = {0.3F, 0.3F, 0.7F, NAN}}));
+  EXPECT_TRUE(refused({.shape = {0.3F, 0.3F, 0.7F, 1e30F}}));
+  EXPECT_TRUE(refused({.splits = {{0, 2}}})) << "a pixel that there is not";
+  EXPECT_TRUE(refused({.splits = {{1UL << 40, 0}}}));
+  EXPECT_TRUE(refused({.splits = {}})) << "more leaves than ways";
+  EXPECT_TRUE(refused({.splits = {}, .leaves = {}})) << "no leaf";
+  EXPECT_TRUE(refused({.splits = {{0, 1}, {0, 1}}, .leaves = {{0, 0, 0, 0}, {0, 0, 0, 0}, {0, 0, 0, 0}}}))
+      << "a tree with a gap";
+  EXPECT_TRUE(refused({.leaves = {{0, 0, 0, 0}, {0, 0}}})) << "a leaf of another shape";
+  EXPECT_TRUE(refused({.leaves = {{0, 0, 0, 0}, {0, 0, 0, 0, 0, 0}}}));
+  EXPECT_TRUE(refused({.anchors = {0, 2}})) << "a point that there is not";
+  EXPECT_TRUE(refused({.anchors = {0, 1, 1}})) << "more points than distances";
+  EXPECT_TRUE(refused({.anchors = {0}})) << "more distances than points";
+  EXPECT_TRUE(refused({.deltas = {{0, 0}, {0, INFINITY}}}));
+  EXPECT_TRUE(refused({.anchor_lists = 0}));
+}
+
+/// Bytes of memory that the process had at most.
+size_t MostMemory() {
+  rusage usage = {};
+  getrusage(RUSAGE_SELF, &usage);
+  return static_cast<size_t>(usage.ru_maxrss) * 1024;
+}
+
+TEST_F(ModelTest, SizesInFilesTakeNoMemory) {
+  constexpr long kMany = 1L << 27;
+  constexpr unsigned long kCount = kMany;
+  const auto bytes = [](auto... numbers) {
+    std::ostringstream out;
+    (dlib::serialize(numbers, out), ...);
+    return out.str();
+  };
+  ASSERT_EQ(KY_ERROR_MODEL, CreateDetector(Write("first", "This is no model.")));
+  const size_t before = MostMemory();
+  dlib::matrix<float, 0, 1> point(2);
+  point = 0;
+  for (const std::string& lie : {
+           bytes(1, -kMany, -1L),               // a shape of many points
+           bytes(1, -(1L << 33), -(1L << 33)),  // so many that their number wraps
+           bytes(1, point, kCount),             // many cascades
+           bytes(1, point, 1UL, kCount),        // many trees
+           bytes(1, point, 1UL, 1UL, kCount),   // many decisions
+           bytes(1, point, 0UL, kCount),        // many lists of pixels
+           bytes(2, 1, kCount, kCount),         // a detector with features of a picture
+       }) {
+    EXPECT_EQ(KY_ERROR_MODEL, CreateDetector(Write("lie", lie)));
+  }
+  EXPECT_LT(MostMemory() - before, size_t{1} << 26);
 }
 
 TEST_F(ModelTest, FileBesideTheModelMustHoldLandmarks) {
