@@ -57,17 +57,18 @@ extern "C" int LLVMFuzzerTestOneInput(const uint8_t* data, size_t size) {
 
   int want = 255;
   if (stride >= 1 && wrap(int64_t{w} * h) != 0) {
-    const int x0 = std::max(x, 0), x1 = std::min(wrap(int64_t{x} + w - 1), width - 1);
-    const int y0 = std::max(y, 0), y1 = std::min(wrap(int64_t{y} + h - 1), height - 1);
+    // Ends are those of whole numbers; counts and sums wrap.
+    const int64_t x0 = std::max(x, 0), x1 = std::min<int64_t>(int64_t{x} + w, width) - 1;
+    const int64_t y0 = std::max(y, 0), y1 = std::min<int64_t>(int64_t{y} + h, height) - 1;
     uint32_t sum = 0;
-    for (int r = y0; r <= y1; ++r) {
-      for (int c = x0; c <= x1; ++c) {
-        const unsigned char* p = image.row(r) + ptrdiff_t{c} * target.channels;
+    for (int64_t r = y0; r <= y1; ++r) {
+      for (int64_t c = x0; c <= x1; ++c) {
+        const unsigned char* p = image.row(static_cast<int>(r)) + c * target.channels;
         sum += target.value != nullptr ? target.value(p)
                                        : target.metric(p, 1, target.channels, 1, 1, 0, 0, 1, 1);
       }
     }
-    const int n = wrap(int64_t{wrap(int64_t{x1} - x0 + 1)} * wrap(int64_t{y1} - y0 + 1));
+    const int n = wrap(int64_t{wrap(x1 - x0 + 1)} * wrap(y1 - y0 + 1));
     want = n == 0 ? 0 : static_cast<unsigned char>(int64_t{wrap(int64_t{sum} + n / 2)} / n);
   }
   const unsigned char* pixels = input.seldom(30) ? nullptr : image.data();
