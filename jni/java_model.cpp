@@ -2,15 +2,13 @@
 // SPDX-License-Identifier: Apache-2.0
 
 #include "java_model.h"
-#include "java_declarations.h"
 
 #include <algorithm>
-#include <climits>
-#include <cstdint>
 #include <iterator>
 #include <utility>
 
 #include "base/log.h"
+#include "java_declarations.h"
 
 namespace {
 
@@ -153,9 +151,7 @@ jobject ky_pointf_t_to_java_pointf(JNIEnv* env, const ky_pointf_t* point) {
 }  // namespace
 
 int register_face_fields(JNIEnv* env) {
-  field table[std::size(fields)];
-  std::copy(std::begin(fields), std::end(fields), table);
-  if (find_fields(env, table, static_cast<int>(std::size(table))) < 0) {
+  if (find_fields(env, fields, static_cast<int>(std::size(fields))) < 0) {
     return -1;
   }
   if (!register_class(env, kPointFClass, &registry.mPointFClass, &registry.newPointF)) {
@@ -170,8 +166,7 @@ int register_face_fields(JNIEnv* env) {
     FACE_LOG_ALWAYS(ANDROID_LOG_ERROR, "Can't find com/vantrel/faceapi/model/FaceInfo");
     return -1;
   }
-  // The last constructor's ID stands for success; without its high bits it is never negative.
-  return static_cast<int>(reinterpret_cast<std::uintptr_t>(registry.newFaceInfo) & INT_MAX);
+  return 0;
 }
 
 jobjectArray ky_pointf_t_array_to_java_pointf(JNIEnv* env, const ky_pointf_t* points, int count) {

@@ -12,8 +12,8 @@
 
 #include "kyface_api/kyface_api.h"
 
-/// Looks up the Java classes, constructors and fields. Returns a non-negative value, or -1 after logging the
-/// first that is missing; what was found before it stays registered.
+/// Looks up the Java classes, constructors and fields. Returns 0, or -1 after logging the first that is
+/// missing; what was found before it stays registered.
 int register_face_fields(JNIEnv* env);
 
 /// Converts `count` points to a `PointF[]`, an empty one for a count of 0. The caller owns the local

@@ -45,13 +45,16 @@ final class Drawing {
         return image;
     }
 
-    /** Draws the rectangle and the landmarks of each face, and from the tip of its nose an arrow to where it looks. */
+    /**
+     * Draws the rectangle and the landmarks of each face in the colour of its identity, and from the tip of its nose an
+     * arrow to where it looks.
+     */
     static void faces(BufferedImage image, FaceInfo[] faces) {
         Graphics2D g = image.createGraphics();
         g.setRenderingHint(RenderingHints.KEY_ANTIALIASING, RenderingHints.VALUE_ANTIALIAS_ON);
         for (FaceInfo face : faces) {
             outline(g, face, new Color(0, 0, 0, 160), 5);
-            outline(g, face, new Color(80, 255, 120), 2.5f);
+            outline(g, face, colorOf(face.id), 2.5f);
             float size = Math.max(1.6f, face.faceRect.width() / 40f);
             for (PointF point : face.facePoints) {
                 g.fill(new Ellipse2D.Float(point.x - size / 2, point.y - size / 2, size, size));
@@ -61,6 +64,12 @@ final class Drawing {
             }
         }
         g.dispose();
+    }
+
+    /** Green for 0, which all faces of a picture have; neighbours differ most in hue when it moves by the golden section. */
+    private static Color colorOf(int id) {
+        float[] green = Color.RGBtoHSB(80, 255, 120, null);
+        return Color.getHSBColor(green[0] + 0.618f * id, green[1], green[2]);
     }
 
     /** The tip of the nose among 68 points. */
@@ -81,42 +90,6 @@ final class Drawing {
         g.setColor(color);
         g.setStroke(new BasicStroke(thickness, BasicStroke.CAP_ROUND, BasicStroke.JOIN_ROUND));
         g.drawRect(face.faceRect.left, face.faceRect.top, face.faceRect.width(), face.faceRect.height());
-    }
-
-    /** Lines of each digit, lowest bit first: top, upper left and right, middle, lower left and right, bottom. */
-    private static final int[] SEGMENTS = {0x77, 0x24, 0x5D, 0x6D, 0x2E, 0x6B, 0x7B, 0x25, 0x7F, 0x6F};
-
-    /** Writes a face's identity beside its rectangle. Drawn from strokes: a virtual machine need not have a font. */
-    static void identity(BufferedImage image, FaceInfo face) {
-        int size = Math.max(8, face.faceRect.width() / 4);
-        Graphics2D g = image.createGraphics();
-        g.setRenderingHint(RenderingHints.KEY_ANTIALIASING, RenderingHints.VALUE_ANTIALIAS_ON);
-        String digits = String.valueOf(Math.abs((long) face.id));
-        for (int layer = 0; layer < 2; layer++) { // a dark edge, and the digits on it
-            g.setColor(layer == 0 ? new Color(0, 0, 0, 160) : new Color(255, 220, 60));
-            g.setStroke(new BasicStroke(size / (layer == 0 ? 2f : 4f), BasicStroke.CAP_ROUND, BasicStroke.JOIN_ROUND));
-            for (int i = 0; i < digits.length(); i++) {
-                int left = face.faceRect.right + size / 2 + i * size * 3 / 2;
-                digit(g, digits.charAt(i) - '0', left, face.faceRect.top + size / 4, size);
-            }
-        }
-        g.dispose();
-    }
-
-    private static void digit(Graphics2D g, int digit, int left, int top, int size) {
-        int right = left + size;
-        int middle = top + size;
-        int bottom = middle + size;
-        int[][] lines = {
-            {left, top, right, top}, {left, top, left, middle}, {right, top, right, middle},
-            {left, middle, right, middle}, {left, middle, left, bottom}, {right, middle, right, bottom},
-            {left, bottom, right, bottom}
-        };
-        for (int i = 0; i < lines.length; i++) {
-            if ((SEGMENTS[digit] >> i & 1) != 0) {
-                g.drawLine(lines[i][0], lines[i][1], lines[i][2], lines[i][3]);
-            }
-        }
     }
 
     static void writePng(BufferedImage image, File file) throws IOException {

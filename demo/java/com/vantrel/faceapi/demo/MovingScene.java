@@ -147,9 +147,6 @@ final class MovingScene {
         BufferedImage image = Drawing.fromBitmap(shown);
         List<FaceInfo> shownFaces = transform.map(faces);
         Drawing.faces(image, shownFaces.toArray(new FaceInfo[0]));
-        for (FaceInfo face : shownFaces) {
-            Drawing.identity(image, face);
-        }
         sheet.add(image);
         time.stage("draw");
         remember(view, transform, shownFaces, number);
