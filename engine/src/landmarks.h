@@ -25,8 +25,8 @@ struct Pose {
   double pitch;
 };
 
-/// Finds the eyes among the `count` points of a model of 68 or of 5 points; false for any other count, and
-/// when both eyes are in one place.
+/// Finds the eyes among the points of a model of 68 or of 5; false for any other number of points, and when
+/// both eyes are in one place.
 bool FindEyes(const std::vector<dlib::dpoint>& points, Eyes* eyes);
 
 /// The roll of the line through the eyes, in degrees.
@@ -34,7 +34,7 @@ double RollOf(const Eyes& eyes);
 
 /// Estimates the pose from 68 points: the turn that brings a generic head's eye corners, mouth corners, nose
 /// tip and chin closest to where they are seen, at a distance that makes perspective negligible. False for
-/// any other count and for points that no head shows.
+/// any other number of points and for points that no head shows.
 bool EstimatePose(const std::vector<dlib::dpoint>& points, Pose* pose);
 
 /// A landmark model; immutable and shared by the handles that were created from one file.
@@ -51,8 +51,8 @@ class LandmarkModel {
   dlib::shape_predictor predictor_;
 };
 
-/// Fills the landmark points of `face` and its pose, both 0 as far as the model (which may be null) cannot
-/// tell.
+/// Fills the landmark points and the pose of `face`. What the model cannot tell is 0, as is all of it without
+/// a model.
 void Describe(const LandmarkModel* model, const GrayImage& upright, const dlib::drectangle& box,
               const Frame& frame, ky_face_t* face);
 

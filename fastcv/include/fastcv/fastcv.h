@@ -8,23 +8,25 @@
 /// destination as it was whenever it returns anything but `HPC_SUCCESS`. Threads may call it on distinct
 /// destinations.
 ///
-/// Source and destination must not overlap, unless a front-end's comment says that it works forwards. Then
-/// they may where no row of the destination begins behind the row of the source that it is made of: where
-/// both are the same buffer with the same step, or a smaller destination is packed at the source's start.
+/// Source and destination must not overlap, unless a front-end's comment says that it works forwards. Such a
+/// front-end takes images that overlap as long as no row of the destination begins behind the row of the
+/// source that it is made of: both are one buffer with one step, or a smaller destination is packed at the
+/// source's start.
 ///
-/// The checks are those of each front-end's comment and no more. Past all of them go, to every kernel,
-/// matrices
-/// - whose `data` is null (except to `rotate`) or has less room than the other fields say;
-/// - of negative sizes, of which nothing is read or written, and of sizes of 0, where it is the same but for
-///   conversions 17, 18 and 19 and `rotate`, which end the process by assertion;
-/// - whose `step` is no whole number of elements and is rounded down, or is beyond 2^31 elements, where its
-///   low 32 bits count.
+/// A front-end checks what its comment lists, and no more. These matrices pass every front-end's checks and
+/// reach its kernel:
+/// - A `data` that is null (`rotate` excepted), or has less room than the other fields say.
+/// - Negative sizes: nothing is read or written. Sizes of 0: the same, but conversions 17, 18 and 19 and
+///   `rotate` end the process by assertion.
+/// - A `step` that is no whole number of elements: it is rounded down. A `step` beyond 2^31 elements: its low
+///   32 bits count.
 ///
 /// Where a front-end does not look at a step, or lets a short one pass, its kernel takes the step as it is:
-/// row r begins r steps behind the first and is as long as the width says. Rows of a step that is too short
-/// overlap, and the last one ends behind `step * height`; with 0 all rows are one (17, 18, 19 and, in the
-/// source, `rotate` end the process); with a negative step they lie before `data`. Nothing outside these rows
-/// is touched (but see CVT_LAB2BGR). What else a front-end lets through, its comment says under "Malformed".
+/// row r begins r steps behind the first and is as long as the width says. With too short a step rows
+/// overlap, and the last one ends behind `step * height`. With a step of 0 all rows are one (17, 18, 19 and,
+/// in the source, `rotate` end the process). With a negative step rows lie before `data`. Nothing outside
+/// these rows is touched (but see CVT_LAB2BGR). Under "Malformed" a front-end's comment lists what else it
+/// lets through.
 #pragma once
 
 #include <malloc.h>
@@ -122,9 +124,9 @@ enum EcoEnv_t {
 /// for float).
 ///
 /// - CVT_BGR2RGB swaps red and blue, with or without alpha on either side; it is its own inverse.
-/// - CVT_BGR2LAB is to CIE L*a*b*, sRGB primaries, D65 white. 8-bit: L * 2.55, a + 128, b + 128. Float: L
-///   0..100 and a, b as they are, of colours 0..1.
-/// - CVT_LAB2BGR is the way back; colours are clamped to 0..255, or 0..1 for float. The 8-bit conversion
+/// - CVT_BGR2LAB converts to CIE L*a*b*, sRGB primaries, D65 white. 8-bit: L * 2.55, a + 128, b + 128. Float:
+///   L 0..100 and a, b as they are, of colours 0..1.
+/// - CVT_LAB2BGR converts back; colours are clamped to 0..255, or 0..1 for float. The 8-bit conversion
 ///   works on groups of 8 pixels that start before column `width` - 3, so it reads and writes up to 4 pixels
 ///   beyond the end of each row: 12 bytes of the source and 12 (BGR) or 16 (BGRA) of the destination. Between
 ///   rows that is padding, whose contents are lost, or the start of the next row, which is written later. The
@@ -231,31 +233,30 @@ inline constexpr bool kNever = false;
 /// CVT_YUV2GRAY and the packed conversions into no more channels than there were work forwards over images
 /// that overlap (8-bit CVT_LAB2BGR excepted, for what it writes beyond its rows); all others need them apart.
 ///
-/// Only the instances of FASTCV_CVT_COLOR_INSTANCES exist; any other does not compile. The checks, in this
-/// order, with S a matrix's step in elements, W and H its width and height, in signed 32-bit arithmetic, X /
-/// 3 truncating:
-/// - `dst` null: HPC_INVALID_ARGS; `src`, then `*dst` empty: HPC_MAT_EMPTY;
-/// - by family, the third column of FASTCV_CONVERSIONS, HPC_INVALID_ARGS unless
-///   - packed: where both S hold a row, W and H are equal; otherwise W and H of `src` are
-///   even, W is
-///     equal, and H(src) == H(dst) / 3 * 2;
-///   - to 4:2:0: W and H of `src` are even, W is equal, and H(src) == H(dst) / 3 * 2;
-///   - from 4:2:0: where both S hold a row, W and H of `*dst` are even, W is equal, and
-///     H(dst) == H(src) / 3 * 2; otherwise the rule "to 4:2:0".
+/// Only the instances of FASTCV_CVT_COLOR_INSTANCES exist; any other does not compile.
 ///
-/// The second rules of the packed and the "from 4:2:0" families can describe no valid image. They decide
-/// which malformed calls still reach a kernel, and are kept for callers that rely on it.
+/// Checks, in order: `dst` null: HPC_INVALID_ARGS; `src`, then `*dst` empty: HPC_MAT_EMPTY; the sizes, by the
+/// conversion's family in FASTCV_CONVERSIONS: HPC_INVALID_ARGS. With W and H a matrix's width and height, in
+/// signed 32-bit arithmetic whose division truncates, the sizes must be these:
+/// - Packed, where both steps hold a row: W and H are equal.
+/// - Packed otherwise, and to 4:2:0: W and H of `src` are even, W is equal, and H(src) == H(dst) / 3 * 2.
+/// - From 4:2:0, where both steps hold a row: W and H of `*dst` are even, W is equal, and
+///   H(dst) == H(src) / 3 * 2.
+/// - From 4:2:0 otherwise: as to 4:2:0.
+///
+/// What holds "otherwise" can describe no valid image. It decides which malformed calls still reach a kernel,
+/// and is kept for callers that rely on it.
 ///
 /// Malformed:
-/// - packed: a step that is shorter than a row, on either side or both, when the destination is 3/2 as high
+/// - Packed: a step that is shorter than a row, on either side or both, when the destination is 3/2 as high
 ///   as the source, or one or two rows more. H(src) rows are read, and as many written.
-/// - to 4:2:0: any steps. The destination may have one or two rows too many, which stay as they are.
-/// - from 4:2:0: a source with one or two rows too many, which are not read. And, with a step shorter than a
-///   row on either side, a destination 3/2 as high as the source, or one or two rows more: its height is then
-///   taken for the picture's, so that H(dst) * 3/2 rows are read of a source that says it has 2/3 H(dst),
-///   even when its own step is in order. Of an odd height the last row is neither read nor written, but
-///   CVT_YUV2GRAY copies it, and CVT_I4202BGR ends the process by assertion.
-/// - all but "to 4:2:0": a width that times the channels is beyond 2^31, where the product wraps and a step
+/// - To 4:2:0: any steps. The destination may have one or two rows too many, which stay as they are.
+/// - From 4:2:0: a source with one or two rows too many, which are not read.
+/// - From 4:2:0, with a step shorter than a row on either side: a destination 3/2 as high as the source, or
+///   one or two rows more. Its height is taken for the picture's: H(dst) * 3/2 rows are read of a source that
+///   says it has 2/3 H(dst), even when its own step is in order. Of an odd height the last row is neither
+///   read nor written, but CVT_YUV2GRAY copies it, and CVT_I4202BGR ends the process by assertion.
+/// - All but to 4:2:0: a width whose product with the channels is beyond 2^31. The product wraps, and a step
 ///   that is shorter than the row can count as holding it.
 template <ColorCvtType type, typename Tsrc, int ncSrc, typename Tdst, int ncDst, EcoEnv_t env>
 HPCStatus_t cvtColor(const Mat<Tsrc, ncSrc, env>& /*src*/, Mat<Tdst, ncDst, env>* /*dst*/) {

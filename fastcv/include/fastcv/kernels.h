@@ -20,20 +20,21 @@ namespace HPC::fastcv {
 /// - `inWidthStride`, `inData`: source row pitch in elements of `Tsrc` (bytes, or floats), and source pixels;
 /// - `outWidthStride`, `outData`: the same of the destination.
 ///
-/// An alpha channel that a kernel creates is 255, or 1.0f for `float`. What they work on differs:
+/// An alpha channel that a kernel creates is 255, or 1.0f for `float`. The kernels work on:
+///
 /// - Semi-planar 4:2:0, full range (NV_arm.cpp). NV21 has V,U pairs, NV12 U,V pairs; the chroma rows start at
 ///   height * stride and have the same stride. Only whole 2 x 2 blocks are converted: a last odd row or
 ///   column is left as it was, and a picture of one row writes nothing.
 /// - Planar 4:2:0, limited range (BGR_I420_arm.cpp), and the luma of any Y-first buffer (YUV_GRAY_arm.cpp).
 ///   These assert: non-null pointers, sizes and strides other than 0, and for the colour kernels even sizes.
 ///   Chroma rows are packed two to a stride row, U plane first.
-/// - Packed images of all sizes. Those whose destination has no more channels than the source also work
+/// - Packed images of all sizes. Kernels whose destination has no more channels than the source also work
 ///   forwards over images that overlap (no row of the destination begins behind that of the source).
-/// - `armLAB2BGRImage` of `unsigned char` works on groups of 8 pixels while a group's first pixel is below
-///   `width` - 3, and not over images that overlap. Where `width` % 8 is 4 or more, the last group so reads
-///   and writes 8 - `width` % 8 pixels, up to 4, beyond the row's end: at most 12 bytes of the source, and 12
-///   (3 channels) or 16 (4 channels) of the destination. Padding there loses its contents, the next row is
-///   written later; after the last row both buffers must have room.
+/// - Packed images in groups of 8 pixels, each begun below `width` - 3, that do not overlap:
+///   `armLAB2BGRImage` of `unsigned char`. Where `width` % 8 is 4 or more, the last group reaches up to 4
+///   pixels beyond the row's end: it reads at most 12 bytes of the source there, and writes 12 (3 channels)
+///   or 16 (4 channels) of the destination. Padding there loses its contents, the next row is written later;
+///   after the last row both buffers must have room.
 #define FASTCV_DECLARE_KERNEL(with, name, value, family, instances)                                       \
   template <typename Tsrc, int ncSrc, typename Tdst, int ncDst>                                           \
   void arm##name##Image(int height, int width, int inWidthStride, const Tsrc* inData, int outWidthStride, \
@@ -56,9 +57,9 @@ template <typename T, int ncSrc, int ncDst, int nc>
 void armRotateNx90degree(int inHeight, int inWidth, int inWidthStride, const T* inData, int outHeight,
                          int outWidth, int outWidthStride, T* outData, int degree);
 
-/// The workers of `armRotateNx90degree`: they fill `outHeight` by `outWidth` pixels, each written once; the
-/// source sizes enter only the mapping of indices. `blockHeight` and `blockWidth` are the cache blocks, 64
-/// by 64.
+/// The kernels behind `armRotateNx90degree`. They fill `outHeight` by `outWidth` pixels, each written once;
+/// the source sizes enter only the mapping of indices. `blockHeight` and `blockWidth` are the cache blocks,
+/// 64 by 64.
 template <typename T, int nc, int blockHeight, int blockWidth>
 void imgRotate90degree(int inHeight, int inWidth, int inWidthStride, const T* inData, int outHeight,
                        int outWidth, int outWidthStride, T* outData);
@@ -76,8 +77,8 @@ template <typename T>
 void armRotateNx90degree_YUV420(int inHeight, int inWidth, int inWidthStride, const T* inData, int outHeight,
                                 int outWidth, int outWidthStride, T* outData, int degree, int yuv420_type);
 
-/// The I420 worker of `armRotateNx90degree_YUV420`. Takes two scratch chroma planes from the heap; when there
-/// is no memory for them, nothing is written.
+/// The kernel for I420 behind `armRotateNx90degree_YUV420`. It takes two scratch chroma planes from the heap;
+/// when there is no memory for them, nothing is written.
 template <typename T>
 void imgRotate_I420(int inHeight, int inWidth, int inWidthStride, const T* inData, int outHeight,
                     int outWidth, int outWidthStride, T* outData, int degree);
