@@ -50,7 +50,7 @@ int built() { return sized<1>() < 4 || 4 / 4 == 1; }
 
 def campaign(root):
     """(exit status, what it printed) of a campaign over the small project."""
-    arguments = Namespace(path=[], sample=None, seed=1, preset="host", jobs=2, branches=False, list=False)
+    arguments = Namespace(path=[], sample=None, seed=1, preset="host", jobs=2, branches=False, tests="", list=False)
     printed = io.StringIO()
     with contextlib.redirect_stdout(printed), contextlib.redirect_stderr(io.StringIO()):
         status = Campaign(root, arguments).run()

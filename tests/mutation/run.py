@@ -48,8 +48,9 @@ class Test:
 class Tree:
     """The copy that is changed, its build, and its tests."""
 
-    def __init__(self, root, preset, jobs):
+    def __init__(self, root, preset, jobs, wanted):
         self.source = root
+        self.wanted = wanted  # a pattern of tests' names
         self.preset = preset
         self.jobs = str(jobs)
         self.root = root / "build" / "mutate" / "tree"
@@ -85,6 +86,20 @@ class Tree:
         command = ["cmake", "--build", "--preset", self.preset, "-j", self.jobs]
         return self._quiet(command + (["--target", *self._relative(targets)] if targets else []), seconds)[0] == 0
 
+    def build_unchanged(self):
+        """Builds what the tests need: all, unless only some tests are wanted."""
+        self.known = self._known()
+        if not self.wanted.pattern:
+            return self.build(3600)
+        # The libraries are few.
+        folders = [str(self.build_folder / folder) + "/" for folder in ("bin", "lib", "jar")]
+        targets = [
+            file
+            for file in self.known
+            if file.startswith((folders[1], folders[2])) or (file.startswith(folders[0]) and self.wanted.search(Path(file).name))
+        ]
+        return self.build(3600, sorted(targets))
+
     def _relative(self, files):
         return [str(Path(file).relative_to(self.build_folder)) for file in files]
 
@@ -102,11 +117,10 @@ class Tree:
             ).stdout
         )  # fmt: skip
         for test in listed["tests"]:
-            if not LEFT_OUT.search(test["name"]):
+            if self.wanted.search(test["name"]) and not LEFT_OUT.search(test["name"]):
                 properties = {entry["name"]: entry["value"] for entry in test.get("properties", [])}
                 folder = Path(properties.get("WORKING_DIRECTORY", ".")).name
                 self.tests[test["name"]] = Test(folder, test.get("command", []))
-        self.known = self._known()
         contents = self.contents()
         self.needed = {file: self._libraries(file) for file in contents if "/bin/" in file}
 
@@ -280,11 +294,11 @@ class Campaign:
             for mutant in candidates:
                 print(f"{mutant.path}:{mutant.line}: {mutant.kind}: {mutant.before} -> {mutant.after}")
             return 0
-        tree = Tree(self.root, self.arguments.preset, self.arguments.jobs)
+        tree = Tree(self.root, self.arguments.preset, self.arguments.jobs, re.compile(self.arguments.tests))
         tree.synchronise()
         tree.configure()
         self._say(f"building and testing the unchanged tree, {self.arguments.preset}")
-        if not tree.build(3600):
+        if not tree.build_unchanged():
             self._say("the unchanged tree does not build")
             return 2
         failed = tree.learn_tests()
