@@ -168,10 +168,16 @@ class Tree:
                 files.update(file for file in self.times if file not in self.needed)
         return sorted(files)
 
-    def nearest(self, area):
-        """Tests of a layer's own that take no long time."""
+    def nearest(self, path):
+        """Tests of a layer's own that take no long time, those first whose names are most like the file's."""
+        area = area_of(path)
         folders = NEAREST.get(area, (area,))
-        return [name for name, test in self.tests.items() if test.folder in folders and test.seconds < 10]
+        names = [name for name, test in self.tests.items() if test.folder in folders and test.seconds < 10]
+
+        def words(name):
+            return set(re.findall("[a-z0-9]+", Path(name).stem.lower()))
+
+        return sorted(names, key=lambda name: (-len(words(name) & words(path)), self.tests[name].seconds))
 
     def concerned(self, names, changed):
         """Those of the tests that use a changed file, short ones first."""
@@ -350,7 +356,8 @@ class Campaign:
         try:
             # What noticed another change to this file, then what is nearest, then everything: of most changes only the
             # first has to be built.
-            for stage in (self._recent(mutant.path), tree.nearest(area_of(mutant.path)), list(tree.tests)):
+            nearest = [[name] for name in tree.nearest(mutant.path)]
+            for stage in [*([name] for name in self._recent(mutant.path)), *nearest, list(tree.tests)]:
                 names = [name for name in stage if name in tree.tests and name not in tried]
                 if not names:
                     continue
