@@ -14,11 +14,11 @@ import weakref
 
 from .counting import NEWER_OPENCV, OPENCV, OWN, Key
 
-# A pass makes the buffers anew, so that no figure hangs on where they happened to lie. In a round of a pass everybody
-# has a turn of as many calls as take about this long, in random order.
-PASSES = 3
-ROUNDS = 5
-TURN_NANOSECONDS = 8_000_000
+# A pass makes the buffers anew, so that no figure hangs on where they happened to lie, which for a rotation is much of it.
+# In a round of a pass everybody has a turn of as many calls as take about this long, in random order.
+PASSES = 15
+ROUNDS = 2
+TURN_NANOSECONDS = 4_000_000
 
 
 @dataclasses.dataclass
@@ -95,7 +95,7 @@ def measured(contenders, sizes):
 def _take_turns(group, size, turns, order):
     """A pass of what does the same: adds milliseconds of a call to `turns`."""
     prepared = []
-    for contender in group:
+    for contender in order.sample(group, len(group)):
         run = contender.prepare(tuple(map(int, size.split("x"))))
         run(1)
         calls = max(1, TURN_NANOSECONDS // max(1, run(1)))
