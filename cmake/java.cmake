@@ -1,6 +1,6 @@
 # SPDX-FileCopyrightText: the libjni_kyface_api authors
 # SPDX-License-Identifier: Apache-2.0
-# Java: sources to jars, and the virtual machine that runs them.
+# Java: sources to jars, and the JVM that runs them.
 #
 # Class files are of Java 8, the level that every Android project takes; what a later JDK says about the age of that
 # level is no finding.
@@ -14,7 +14,7 @@ if(Java_VERSION VERSION_GREATER_EQUAL 21)
 endif()
 
 # ${KYFACE_JAVA} runs Java for the architecture of this build, with this build's libraries. A cross build runs the
-# virtual machine of the unpacked arm64 packages under emulation, where the simple compiler and collector pay, and
+# JVM of the unpacked arm64 packages under emulation, where the simple compiler and collector pay, and
 # where a program is started without the JDK's helper program, which this machine could not execute.
 set(KYFACE_JAVA ${CMAKE_BINARY_DIR}/bin/java)
 if(CMAKE_CROSSCOMPILING)

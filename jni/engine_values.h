@@ -19,7 +19,7 @@ inline ky_handle_t to_handle(long long handle) {
 inline jlong to_java(void* handle) { return reinterpret_cast<jlong>(handle); }
 
 /// Puts the engine's result code, whatever it is, into the first element of a status array. Returns false
-/// when the virtual machine refuses the array.
+/// when the JVM refuses the array.
 inline bool write_status(JNIEnv* env, jintArray status, int result) {
   PinnedArray pinned(env, status);
   if (!pinned) {

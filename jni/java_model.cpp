@@ -22,7 +22,7 @@ constexpr int kPromisedReferences = 16;
 constexpr int kPromisedPoints = kPromisedReferences - 3;
 
 /// Everything that is looked up at load. What a failed look-up leaves null is used as it is by later
-/// conversions (C12 in docs/compatibility.md): the virtual machine has its say.
+/// conversions (C12 in docs/compatibility.md): the JVM has its say.
 struct Registry {
   struct {
     jfieldID left, top, right, bottom;

@@ -4,8 +4,8 @@
 /// records and `FaceInfo` objects.
 ///
 /// The registry is written by `JNI_OnLoad` and only read afterwards, on any thread. A conversion uses the
-/// calling thread's environment only. When the virtual machine refuses an object or an array, a conversion
-/// deletes what it has made so far and returns null, and the machine's exception stays pending.
+/// calling thread's environment only. When the JVM refuses an object or an array, a conversion
+/// deletes what it has made so far and returns null, and the JVM's exception stays pending.
 #pragma once
 
 #include <jni.h>

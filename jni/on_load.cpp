@@ -1,10 +1,10 @@
 // SPDX-FileCopyrightText: the libjni_kyface_api authors
 // SPDX-License-Identifier: Apache-2.0
 
-// Where the virtual machine enters the library first. On x86-64 the rest is compiled for AVX2 and FMA, which
+// Where the JVM enters the library first. On x86-64 the rest is compiled for AVX2 and FMA, which
 // not every processor has, and would die of its first instruction: what is here is compiled for the ABI's own
 // instructions, looks, and refuses. So nothing inline may be used of what other sources use, or the linker
-// may keep their copy of it: the functions of the virtual machine are called through their tables.
+// may keep their copy of it: the functions of the JVM are called through their tables.
 #include "java_model.h"
 
 #if defined(__x86_64__)
@@ -56,7 +56,7 @@ extern "C" JNIEXPORT jint JNICALL JNI_OnLoad(JavaVM* vm, void* /*reserved*/) {
     return JNI_ERR;
   }
   if (register_face_fields(env) < 0) {
-    // A virtual machine that finds the look-up's exception pending after this call refuses to load the
+    // A JVM that finds the look-up's exception pending after this call refuses to load the
     // library; an incomplete registry must not prevent the use of everything that needs no Java class.
     env->functions->ExceptionClear(env);
   }

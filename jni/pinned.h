@@ -1,9 +1,9 @@
 // SPDX-FileCopyrightText: the libjni_kyface_api authors
 // SPDX-License-Identifier: Apache-2.0
-/// What the bridge borrows from the virtual machine for the length of a call: array elements and string
+/// What the bridge borrows from the JVM for the length of a call: array elements and string
 /// characters.
 ///
-/// A borrow that the machine refuses leaves the object false and the machine's exception pending: the caller
+/// A borrow that the JVM refuses leaves the object false and the JVM's exception pending: the caller
 /// then returns its failure value and makes no further call but the releases, which are allowed under an
 /// exception.
 #pragma once
@@ -74,9 +74,9 @@ class PinnedArray {
   Element* elements_;
 };
 
-/// The elements of a Java array, or of none, where they are if the machine can have it so: borrowed by the
+/// The elements of a Java array, or of none, where they are if the JVM can have it so: borrowed by the
 /// constructor and given back by the destructor. In between only such arrays may be borrowed and given back,
-/// no other function of the machine called, and nothing waited for.
+/// no other function of the JVM called, and nothing waited for.
 class CriticalArray {
  public:
   /// `mode` is what becomes of the elements: 0 to copy them back where they were copied, JNI_ABORT when they
@@ -94,7 +94,7 @@ class CriticalArray {
     }
   }
 
-  /// Whether the virtual machine refused the elements of an array.
+  /// Whether the JVM refused the elements of an array.
   bool refused() const { return array_ != nullptr && elements_ == nullptr; }
 
   /// The elements as raw bytes; null without an array.
@@ -108,7 +108,7 @@ class CriticalArray {
 };
 
 /// The modified UTF-8 characters of a Java string, or of none: a null string has null characters and is no
-/// failure. They are freed by `release` alone; without it they stay with the virtual machine.
+/// failure. They are freed by `release` alone; without it they stay with the JVM.
 class StringChars {
  public:
   StringChars(JNIEnv* env, jstring string)
@@ -118,7 +118,7 @@ class StringChars {
   StringChars(const StringChars&) = delete;
   StringChars& operator=(const StringChars&) = delete;
 
-  /// Whether the virtual machine refused the characters of a string.
+  /// Whether the JVM refused the characters of a string.
   bool refused() const { return string_ != nullptr && chars_ == nullptr; }
 
   /// The zero-terminated characters, null for a null string.

@@ -126,7 +126,7 @@ class JavaPlanes {
   }
 
   /// Calls `use` with the picture, for which it borrows the arrays that hold planes: until it is done no
-  /// other function of the machine may be called. Its result, or kNoElements.
+  /// other function of the JVM may be called. Its result, or kNoElements.
   template <typename Use>
   jint with_picture(JNIEnv* env, const Use& use) {
     CriticalArray y(env, arrays_[0], JNI_ABORT);

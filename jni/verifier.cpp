@@ -74,7 +74,7 @@ jbyteArray kyFaceVerify(JNIEnv* env, jclass /*type*/, long long handle, const un
 template <typename Array>
 jbyteArray get_feature(JNIEnv* env, jclass type, jlong handle, Array image, jint pixelFormat, jint width,
                        jint height, jint stride, jobject face, jintArray status) {
-  if (image == nullptr) {  // refused below, like a null face: a virtual machine need not survive pinning it
+  if (image == nullptr) {  // refused below, like a null face: a JVM need not survive pinning it
     return kyFaceVerify(env, type, handle, nullptr, pixelFormat, width, height, stride, face, status);
   }
   const kyface::PinnedArray pinned_image(env, image);

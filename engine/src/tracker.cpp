@@ -55,8 +55,8 @@ class Tracker {
     Resize(frame.upright_width(), frame.upright_height());
     const bool due = frames_to_detection_ == 0;
     frames_to_detection_ = due ? detect_interval_ - 1 : frames_to_detection_ - 1;
-    const bool looks = due && finder_.HasRoom(width_, height_);
-    if (!looks && std::none_of(faces_.begin(), faces_.end(), [](const TrackedFace& f) { return f.seen; })) {
+    const bool detects = due && finder_.HasRoom(width_, height_);
+    if (!detects && std::none_of(faces_.begin(), faces_.end(), [](const TrackedFace& f) { return f.seen; })) {
       return {};
     }
 
@@ -66,15 +66,15 @@ class Tracker {
         Follow(face);
       }
     }
-    if (looks) {
-      Look();
+    if (detects) {
+      Detect();
     }
     return Records(frame);
   }
 
   void Reset() {
     const std::lock_guard lock(mutex_);
-    Forget();
+    Clear();
   }
 
   /// The setters throw Failure when a value is out of its range, and return the one before.
@@ -82,7 +82,7 @@ class Tracker {
     Require(limit >= KY_MIN_FACE_LIMIT && limit <= KY_MAX_FACE_LIMIT, KY_ERROR_RANGE);
     const std::lock_guard lock(mutex_);
     while (faces_.size() > static_cast<size_t>(limit)) {
-      faces_.erase(Least());
+      faces_.erase(Weakest());
     }
     return std::exchange(face_limit_, limit);
   }
@@ -104,7 +104,7 @@ class Tracker {
  private:
   using Faces = std::vector<TrackedFace>;
 
-  void Forget() {
+  void Clear() {
     faces_.clear();
     frames_to_detection_ = 0;
   }
@@ -112,15 +112,15 @@ class Tracker {
   /// Where faces were means nothing in frames of another size.
   void Resize(int width, int height) {
     if (width != width_ || height != height_) {
-      Forget();
+      Clear();
       width_ = width;
       height_ = height;
     }
   }
 
-  /// The face to give up first: one that is out of sight before one that is not, then the one of the lowest
+  /// The face to evict first: one that is out of sight before one that is not, then the one of the lowest
   /// score.
-  Faces::iterator Least() {
+  Faces::iterator Weakest() {
     return std::min_element(faces_.begin(), faces_.end(), [](const TrackedFace& a, const TrackedFace& b) {
       return std::tuple(a.seen, a.face.score) < std::tuple(b.seen, b.face.score);
     });
@@ -147,8 +147,8 @@ class Tracker {
     face.misses = 0;
   }
 
-  /// Looks for faces, known and new.
-  void Look() {
+  /// Detects faces, known and new.
+  void Detect() {
     std::vector<FoundFace> found = finder_.Find(gray_, kConfirmingScore);
 
     // Each known face takes the detection that overlaps with it most, the closest pair first.
@@ -182,21 +182,22 @@ class Tracker {
     }
     std::erase_if(faces_, [](const TrackedFace& face) { return face.misses > KY_FORGIVEN_MISSES; });
     for (const FoundFace& face : found) {
-      Welcome(face);
+      Spawn(face);
     }
   }
 
-  /// Takes in a new face if it is certain enough and there is room, made at the cost of one out of sight.
-  void Welcome(const FoundFace& found) {
+  /// Spawns a track for a new face if it is certain enough and there is room, made at the cost of one out of
+  /// sight.
+  void Spawn(const FoundFace& found) {
     if (found.score < KY_DEFAULT_THRESHOLD) {
       return;
     }
     if (faces_.size() >= static_cast<size_t>(face_limit_)) {
-      const auto least = Least();
-      if (least->seen) {
+      const auto weakest = Weakest();
+      if (weakest->seen) {
         return;
       }
-      faces_.erase(least);
+      faces_.erase(weakest);
     }
     const int32_t id = identities_.Next([this](int32_t number) {
       return std::any_of(faces_.begin(), faces_.end(),

@@ -1,7 +1,7 @@
 // SPDX-FileCopyrightText: the libjni_kyface_api authors
 // SPDX-License-Identifier: Apache-2.0
 
-// Loads a library as a virtual machine does, and prints what it throws, on a processor that may have nothing
+// Loads a library as a JVM does, and prints what it throws, on a processor that may have nothing
 // beyond the ABI's own instructions: this program is compiled for no more.
 #include <dlfcn.h>
 #include <jni.h>

@@ -1,6 +1,6 @@
 // SPDX-FileCopyrightText: the libjni_kyface_api authors
 // SPDX-License-Identifier: Apache-2.0
-/// What the tests of the native methods share: a virtual machine that has loaded the library, a fresh engine,
+/// What the tests of the native methods share: a JVM that has loaded the library, a fresh engine,
 /// and an empty journal.
 #pragma once
 
@@ -17,7 +17,7 @@
 #include "jni/java_declarations.h"
 #include "journal.h"
 
-/// Calls a native method in the fixture's virtual machine.
+/// Calls a native method in the fixture's JVM.
 #define CALL(method, ...) \
   Java_com_vantrel_faceapi_FaceLibrary_##method(vm.env(), nullptr __VA_OPT__(, ) __VA_ARGS__)
 

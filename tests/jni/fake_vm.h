@@ -1,6 +1,6 @@
 // SPDX-FileCopyrightText: the libjni_kyface_api authors
 // SPDX-License-Identifier: Apache-2.0
-/// A virtual machine for tests, as one thread sees it: it records every call in the journal, models the few
+/// A JVM for tests, as one thread sees it: it records every call in the journal, models the few
 /// classes that the bridge uses, counts what is borrowed and not given back, and can refuse any call.
 #pragma once
 
@@ -37,7 +37,7 @@ class Vm {
   JNIEnv* env();
   JavaVM* java_vm();
 
-  // ---- what the test puts into the machine. Its references are not counted.
+  // ---- what the test puts into the JVM. Its references are not counted.
   jbyteArray byte_array(const std::string& name, const std::vector<unsigned char>& bytes);
   jintArray int_array(const std::string& name, const std::vector<jint>& words);
   jstring string(const std::string& name, const std::string& text);

@@ -1,6 +1,6 @@
 // SPDX-FileCopyrightText: the libjni_kyface_api authors
 // SPDX-License-Identifier: Apache-2.0
-/// The one record of everything that happens during a native call, in order: calls into the virtual machine,
+/// The one record of everything that happens during a native call, in order: calls into the JVM,
 /// calls into the engine and the bitmap interface, and log messages.
 #pragma once
 

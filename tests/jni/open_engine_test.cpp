@@ -22,7 +22,7 @@ class OpenEngineTest : public testing::Test {
 
   OpenEngineTest() { EXPECT_EQ(JNI_OnLoad(vm.java_vm(), nullptr), JNI_VERSION_1_6); }
 
-  /// The only face of an array, as the machine hands it out.
+  /// The only face of an array, as the JVM hands it out.
   jobject only_face(jobjectArray faces) {
     EXPECT_EQ(vm.at(faces).elements.size(), 1U);
     return vm.env()->GetObjectArrayElement(faces, 0);

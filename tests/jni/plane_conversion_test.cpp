@@ -1,6 +1,6 @@
 // SPDX-FileCopyrightText: the libjni_kyface_api authors
 // SPDX-License-Identifier: Apache-2.0
-// The native methods of PlaneConversion where the virtual machine refuses what they ask for. What they
+// The native methods of PlaneConversion where the JVM refuses what they ask for. What they
 // convert, and from and to what, is tested in a real one.
 #include "bridge_test.h"
 

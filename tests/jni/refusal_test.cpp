@@ -1,7 +1,7 @@
 // SPDX-FileCopyrightText: the libjni_kyface_api authors
 // SPDX-License-Identifier: Apache-2.0
 
-// The virtual machine saying no: every call that can be refused is refused, at its first, second and last
+// The JVM saying no: every call that can be refused is refused, at its first, second and last
 // time, in every native method. The method answers with its failure value, nothing stays borrowed, no further
 // call is made under the exception, and the exception stays.
 #include <functional>
@@ -77,7 +77,7 @@ class RefusalTest : public BridgeTest {
     stays_pinned = vm.pinned();
   }
 
-  /// Local references that are left to the virtual machine: those of a face that was read, and the text's
+  /// Local references that are left to the JVM: those of a face that was read, and the text's
   /// array.
   int left_locals(const std::string& function) const {
     const bool read_face = vm.calls("GetObjectField") > 0;

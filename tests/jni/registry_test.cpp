@@ -142,7 +142,7 @@ TEST_F(RegistryTest, LoadsWithoutAConstructor) {
   }
 }
 
-// The machine can find a class and not find it again: that shows as a missing constructor.
+// The JVM can find a class and not find it again: that shows as a missing constructor.
 TEST_F(RegistryTest, EveryClassLookUpMayFail) {
   const Lines lookups = load_lines();
   int nth = 0;

@@ -83,7 +83,7 @@ TEST_F(StrangeEngineTest, ACountWithoutFacesIsNoFace) {
   }
 }
 
-// No virtual machine has room for so many: none of them is read. A count that it has room for, of faces that
+// No JVM has room for so many: none of them is read. A count that it has room for, of faces that
 // are not there, is one that the bridge cannot tell from a true one.
 TEST_F(StrangeEngineTest, ACountThatTheMachineHasNoMemoryForIsNoFace) {
   engine.count = kMost;
@@ -131,7 +131,7 @@ TEST_F(StrangeEngineTest, APointsCountBeyondTheRecordIsCutOff) {
 }
 
 // A feature's text is as long as the length makes it, in unsigned 32-bit arithmetic. What becomes longer than
-// Java's arrays, or negative, is refused by the virtual machine.
+// Java's arrays, or negative, is refused by the JVM.
 TEST_F(StrangeEngineTest, AFeaturesLengthIsTakenAsUnsigned) {
   const struct {
     int length;

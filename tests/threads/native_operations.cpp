@@ -18,7 +18,7 @@ constexpr int kHeight = 6;
 constexpr size_t kPixels = static_cast<size_t>(kWidth) * kHeight;
 constexpr jlong kHandle = 0x77;
 
-/// A call's own virtual machine with an argument of every kind, and an engine that finds two faces and a
+/// A call's own JVM with an argument of every kind, and an engine that finds two faces and a
 /// feature.
 struct Machine {
   fake::Vm vm;

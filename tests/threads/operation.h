@@ -21,7 +21,7 @@ struct Operation {
 /// Every conversion, crop, rotation, metric and frame helper. The sources are filled when this returns.
 std::vector<Operation> imageOperations();
 
-/// Every native method, each call in a virtual machine of its own. The library must have been loaded.
+/// Every native method, each call in a JVM of its own. The library must have been loaded.
 std::vector<Operation> nativeOperations();
 
 }  // namespace threads

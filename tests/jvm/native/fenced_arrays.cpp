@@ -1,9 +1,9 @@
 // SPDX-FileCopyrightText: the libjni_kyface_api authors
 // SPDX-License-Identifier: Apache-2.0
-/// An agent of the virtual machine that puts fences around every array that native code borrows: memory of
+/// An agent of the JVM that puts fences around every array that native code borrows: memory of
 /// its own for each, which ends, or begins, at a page that may not be touched. What is read or written beyond
 /// that end is a fault on the spot, what is written beyond the other one is found when the array is given
-/// back. It stands in front of the machine's own functions, so that -Xcheck:jni checks on.
+/// back. It stands in front of the JVM's own functions, so that -Xcheck:jni checks on.
 ///
 /// Loaded by -agentpath; RandomCalls gets direct buffers with such fences from it, too.
 #include <jni.h>
@@ -119,7 +119,7 @@ class Field {
   size_t pages_ = 0;
 };
 
-/// What is borrowed: the fenced memory, and the machine's where that was borrowed too.
+/// What is borrowed: the fenced memory, and the JVM's where that was borrowed too.
 struct Loan {
   Field field;
   void* original = nullptr;
@@ -184,11 +184,11 @@ void JNICALL release_elements(JNIEnv* env, Array array, Element* elements, jint 
   loan.field.give_back();
 }
 
-// The machine's own borrowing of this kind would forbid the calls that copying takes.
+// The JVM's own borrowing of this kind would forbid the calls that copying takes.
 void* JNICALL get_critical(JNIEnv* env, jarray array, jboolean* is_copy) {
   const bool is_bytes = machine.IsInstanceOf(env, array, byte_array) != JNI_FALSE;
   if (!is_bytes && machine.IsInstanceOf(env, array, int_array) == JNI_FALSE) {
-    return machine.GetPrimitiveArrayCritical(env, array, is_copy);  // the machine's own libraries
+    return machine.GetPrimitiveArrayCritical(env, array, is_copy);  // the JVM's own libraries
   }
   const jsize length = machine.GetArrayLength(env, array);
   void* fenced = lend(static_cast<size_t>(length) * (is_bytes ? sizeof(jbyte) : sizeof(jint)), nullptr);
@@ -224,7 +224,7 @@ void JNICALL release_critical(JNIEnv* env, jarray array, void* elements, jint mo
 void JNICALL put_up_fences(jvmtiEnv* jvmti, JNIEnv* env, jthread /*thread*/) {
   jniNativeInterface* functions = nullptr;
   if (jvmti->GetJNIFunctionTable(&functions) != JVMTI_ERROR_NONE) {
-    fail("the machine's functions are not to be had");
+    fail("the JVM's functions are not to be had");
   }
   machine = *functions;
   byte_array = static_cast<jclass>(env->NewGlobalRef(env->FindClass("[B")));
@@ -239,7 +239,7 @@ void JNICALL put_up_fences(jvmtiEnv* jvmti, JNIEnv* env, jthread /*thread*/) {
   functions->GetPrimitiveArrayCritical = get_critical;
   functions->ReleasePrimitiveArrayCritical = release_critical;
   if (jvmti->SetJNIFunctionTable(functions) != JVMTI_ERROR_NONE) {
-    fail("the machine's functions cannot be replaced");
+    fail("the JVM's functions cannot be replaced");
   }
   jvmti->Deallocate(reinterpret_cast<unsigned char*>(functions));
 }

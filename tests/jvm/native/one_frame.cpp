@@ -1,7 +1,7 @@
 // SPDX-FileCopyrightText: the libjni_kyface_api authors
 // SPDX-License-Identifier: Apache-2.0
 /// Calls native methods again and again from one native frame. A method called from Java drops whatever
-/// references it leaves behind; called from here they would pile up, and the virtual machine's checks
+/// references it leaves behind; called from here they would pile up, and the JVM's checks
 /// complain.
 #include "jni/java_declarations.h"
 

@@ -14,7 +14,7 @@ import java.util.Arrays;
 import java.util.Collections;
 import java.util.List;
 
-/** A class's main method in a virtual machine of its own, whose output can be looked at, native output included. */
+/** A class's main method in a JVM of its own, whose output can be looked at, native output included. */
 final class Child {
     final int exitStatus;
     final String output;

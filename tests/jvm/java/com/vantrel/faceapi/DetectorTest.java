@@ -195,7 +195,7 @@ public class DetectorTest {
 
     @Test
     public void manyDetectionsLeaveNoReferences() {
-        // The virtual machine's checks complain when a native method leaves more local references than it announced.
+        // The JVM's checks complain when a native method leaves more local references than it announced.
         byte[] nv21 = portrait.nv21();
         FaceInfo first = Portrait.assertFound(detectNv21(nv21), Portrait.FACE);
         for (int i = 0; i < 3; i++) {

@@ -23,7 +23,7 @@ import org.junit.Test;
 import org.junit.rules.TemporaryFolder;
 
 /**
- * The library in a virtual machine where a class, or the name of a field, is gone, as after a shrinker that was not
+ * The library in a JVM where a class, or the name of a field, is gone, as after a shrinker that was not
  * told what to keep. It loads and says what is missing; whatever makes and reads no {@code FaceInfo} works as ever.
  */
 public class IncompleteClassesTest {

@@ -18,7 +18,7 @@ import org.junit.Test;
 
 /**
  * Many calls leave references and memory as they were. Runs over an engine that costs nothing and counts what it has
- * handed out, in a virtual machine whose heap neither grows nor shrinks.
+ * handed out, in a JVM whose heap neither grows nor shrinks.
  */
 public class LeakTest {
     private static final int CALLS = 100_000;

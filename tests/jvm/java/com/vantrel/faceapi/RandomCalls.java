@@ -240,7 +240,7 @@ public final class RandomCalls {
                 || e instanceof IllegalStateException || e instanceof FaceEngineException;
         check("an exception that no documentation knows: " + e, known);
         check("an exception without a message", e.getMessage() != null);
-        // The virtual machine's own messages begin so.
+        // The JVM's own messages begin so.
         check("a null that nobody checked: " + e, !e.getMessage().startsWith("Cannot "));
         StackTraceElement thrower = e.getStackTrace()[0];
         check("thrown by " + thrower, thrower.getClassName().startsWith("com.vantrel.faceapi."));

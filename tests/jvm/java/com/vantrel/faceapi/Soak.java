@@ -25,7 +25,7 @@ import javax.management.ObjectName;
  * convertColorSpace and faceBrightEvaluate, on small frames.
  *
  * <p>Every result must be that of the same thread's first calls. A first slice of the calls compiles what is to be
- * compiled; after it and each of ten more the process's resident memory, the virtual machine's count of JNI global
+ * compiled; after it and each of ten more the process's resident memory, the JVM's count of JNI global
  * references and, over the counting engine, what the engine has not got back are printed. Resident memory and global
  * references must end within {@link #ALLOWED_KIB} and {@link #ALLOWED_REFERENCES} of what they were, and the engine
  * have got back everything. Ends with status 0 when all that holds.
@@ -35,7 +35,7 @@ public final class Soak {
     private static final int SLICES = 10;
     /** What the calls may add for other reasons (compiled code, the collector's own tables, threads' arenas). */
     private static final long ALLOWED_KIB = 6 * 1024;
-    /** Global references that the virtual machine may hold for its own threads when they are counted. */
+    /** Global references that the JVM may hold for its own threads when they are counted. */
     private static final long ALLOWED_REFERENCES = 8;
 
     private static final int WIDTH = 32;

@@ -12,7 +12,7 @@ import com.vantrel.faceapi.model.FaceInfo;
 import org.junit.Before;
 import org.junit.Test;
 
-/** An engine that claims more than there can be: the virtual machine refuses the arrays, and all goes on. */
+/** An engine that claims more than there can be: the JVM refuses the arrays, and all goes on. */
 public class StrangeEngineTest {
     private static final byte THE_MOST = 1;
     private static final byte THE_LEAST = 2;

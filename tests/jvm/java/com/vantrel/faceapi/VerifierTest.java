@@ -87,7 +87,7 @@ public class VerifierTest {
         assertArrayEquals(kept, feature(portrait, portraitsFace()));
     }
 
-    /** The virtual machine's checks complain of references that were not announced. */
+    /** The JVM's checks complain of references that were not announced. */
     @Test
     public void facesOfManyPointsAreRead() {
         for (int count : new int[] {1, 13, 14, 16, 17, 28, 30, 31, 256, 300}) {
@@ -156,7 +156,7 @@ public class VerifierTest {
         assertEquals(UNTOUCHED, status[0]);
     }
 
-    /** In a virtual machine of its own: its checks complain of as many references as there are points. */
+    /** In a JVM of its own: its checks complain of as many references as there are points. */
     @Test
     public void pointsBeyond256AreNotRead() throws IOException, InterruptedException {
         Child child = Child.run(ManyPoints.class);
