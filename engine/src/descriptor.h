@@ -8,10 +8,9 @@
 
 #include <cstddef>
 #include <cstdint>
-#include <memory>
-#include <new>
 #include <span>
 
+#include "convolve.h"
 #include "engine/ky_engine.h"
 
 namespace kyengine {
@@ -38,38 +37,6 @@ struct DescriptorShape {
 /// dlib's network for faces (`dlib_face_recognition_resnet_model_v1`): 150 x 150 pixels, 128 numbers, 270.8
 /// million multiply-adds.
 const DescriptorShape& FaceDescriptorShape();
-
-/// Memory for `size` elements, or none.
-template <typename T>
-class Buffer {
- public:
-  Buffer() = default;
-  explicit Buffer(size_t size) : data_(new(std::nothrow) T[size]), size_(data_ == nullptr ? 0 : size) {}
-
-  bool ok() const { return data_ != nullptr; }
-  T* data() const { return data_.get(); }
-  size_t size() const { return size_; }
-  T* begin() const { return data(); }
-  T* end() const { return data() + size_; }
-
- private:
-  std::unique_ptr<T[]> data_;
-  size_t size_ = 0;
-};
-
-/// One convolution, or the matrix at the end (1 x 1): output = (weights * input) factor + offset for each
-/// output channel, the factor holding the scale of the weights and of the affine layer that follows.
-struct Convolution {
-  int side = 0;  ///< of the square kernel
-  int step = 0;
-  int inputs = 0;
-  int outputs = 0;
-  uint8_t zero = 0;       ///< the byte that stands for a weight of 0
-  Buffer<uint8_t> bytes;  ///< the weights as bytes, or
-  Buffer<float> floats;   ///< as they are: [outputs / 16][side][side * inputs][16]
-  Buffer<float> factors;
-  Buffer<float> offsets;
-};
 
 /// The first bytes of a model file. All numbers are little-endian.
 ///

@@ -57,6 +57,9 @@ inline Lanes EachOf(const Lanes& a, const Lanes& b, Operation operation) {
 inline Lanes Add(const Lanes& a, const Lanes& b) {
   return EachOf(a, b, [](float32x4_t x, float32x4_t y) { return vaddq_f32(x, y); });
 }
+inline Lanes Subtract(const Lanes& a, const Lanes& b) {
+  return EachOf(a, b, [](float32x4_t x, float32x4_t y) { return vsubq_f32(x, y); });
+}
 inline Lanes Multiply(const Lanes& a, const Lanes& b) {
   return EachOf(a, b, [](float32x4_t x, float32x4_t y) { return vmulq_f32(x, y); });
 }
@@ -68,6 +71,12 @@ inline Lanes Max(const Lanes& a, const Lanes& b) {
 inline Lanes MultiplyAdd(const Lanes& sum, const Lanes& a, const Lanes& b) {
   return {{vfmaq_f32(sum.v[0], a.v[0], b.v[0]), vfmaq_f32(sum.v[1], a.v[1], b.v[1]),
            vfmaq_f32(sum.v[2], a.v[2], b.v[2]), vfmaq_f32(sum.v[3], a.v[3], b.v[3])}};
+}
+
+/// sum - a b, rounded once.
+inline Lanes MultiplySubtract(const Lanes& sum, const Lanes& a, const Lanes& b) {
+  return {{vfmsq_f32(sum.v[0], a.v[0], b.v[0]), vfmsq_f32(sum.v[1], a.v[1], b.v[1]),
+           vfmsq_f32(sum.v[2], a.v[2], b.v[2]), vfmsq_f32(sum.v[3], a.v[3], b.v[3])}};
 }
 
 #else
@@ -100,6 +109,9 @@ inline Lanes LoadBytes(const uint8_t* p, uint8_t zero) {
 inline Lanes Add(const Lanes& a, const Lanes& b) {
   return {{_mm256_add_ps(a.v[0], b.v[0]), _mm256_add_ps(a.v[1], b.v[1])}};
 }
+inline Lanes Subtract(const Lanes& a, const Lanes& b) {
+  return {{_mm256_sub_ps(a.v[0], b.v[0]), _mm256_sub_ps(a.v[1], b.v[1])}};
+}
 inline Lanes Multiply(const Lanes& a, const Lanes& b) {
   return {{_mm256_mul_ps(a.v[0], b.v[0]), _mm256_mul_ps(a.v[1], b.v[1])}};
 }
@@ -109,6 +121,10 @@ inline Lanes Max(const Lanes& a, const Lanes& b) {
 
 inline Lanes MultiplyAdd(const Lanes& sum, const Lanes& a, const Lanes& b) {
   return {{_mm256_fmadd_ps(a.v[0], b.v[0], sum.v[0]), _mm256_fmadd_ps(a.v[1], b.v[1], sum.v[1])}};
+}
+
+inline Lanes MultiplySubtract(const Lanes& sum, const Lanes& a, const Lanes& b) {
+  return {{_mm256_fnmadd_ps(a.v[0], b.v[0], sum.v[0]), _mm256_fnmadd_ps(a.v[1], b.v[1], sum.v[1])}};
 }
 
 #endif
