@@ -3,6 +3,7 @@
 
 #include "convolve.h"
 
+#include <algorithm>
 #include <type_traits>
 
 #include "lanes.h"
@@ -14,34 +15,108 @@ namespace {
 /// and 10 of the 16 of AVX2, which leaves room for the weights and the numbers that they meet.
 constexpr int kPixels = 5;
 
-/// Adds the products of `rows` rows of `run` consecutive numbers, `row` apart, from each of the places `x`,
-/// with their weights.
-template <int count>
-inline void AddWindow(Lanes (&sums)[count], const float* weights, const float* const (&x)[count], int rows,
-                      int run, ptrdiff_t row) {
-  for (ptrdiff_t start = 0; rows > 0; --rows, start += row) {
-    const ptrdiff_t end = start + run;
-    const ptrdiff_t last_four = end - 4;
-    ptrdiff_t at = start;
-    for (; at <= last_four; at += 4) {
-      AddFourProducts(sums, weights, x, at);
-      weights += ptrdiff_t{4} * kLanes;
-    }
-    for (; at < end; ++at) {
-      AddProducts(sums, weights, x, at);
-      weights += kLanes;
-    }
+/// Calls `some` with five at a time, as a constant, and with what is left at last.
+template <typename Some>
+void InFives(ptrdiff_t all, Some some) {
+  static_assert(kPixels == 5);
+  for (; all >= kPixels; all -= kPixels) {
+    some(std::integral_constant<int, kPixels>());
+  }
+  switch (all) {
+    case 4:
+      some(std::integral_constant<int, 4>());
+      break;
+    case 3:
+      some(std::integral_constant<int, 3>());
+      break;
+    case 2:
+      some(std::integral_constant<int, 2>());
+      break;
+    case 1:
+      some(std::integral_constant<int, 1>());
+      break;
+    default:
+      break;
   }
 }
 
+/// The sums of the products of `rows` rows of `run` consecutive numbers, `row` apart, from each of `places`
+/// on, with their weights.
+template <int count>
+inline void SumWindow(Lanes (&sums)[count], const float* weights, const float* const (&places)[count],
+                      int rows, int run, ptrdiff_t row) {
+#pragma GCC unroll 8
+  for (Lanes& sum : sums) {
+    sum = Broadcast(0);
+  }
+  const float* at[count];
+  std::copy_n(places, count, at);
+  const auto advance = [&at](ptrdiff_t by) {
+    for (const float*& place : at) {
+      place += by;
+    }
+  };
+  for (; rows > 0; --rows) {
+    for (int fours = run / 4; fours > 0; --fours) {
+      AddFourProducts(sums, weights, at);
+      weights += ptrdiff_t{4} * kLanes;
+      advance(4);
+    }
+    for (int left = run % 4; left > 0; --left) {
+      AddProducts(sums, weights, at, 0);
+      weights += kLanes;
+      advance(1);
+    }
+    advance(row - run);
+  }
+}
+
+/// Makes results of sums, for 16 channels from `channel` on.
+class Finisher {
+ public:
+  /// The sums are so many times too large as `scale` is less than 1.
+  Finisher(const Convolution& c, const Finish& finish, const Map& to, int channel, float scale)
+      : factor_(Multiply(Load(c.factors.data() + channel), Broadcast(scale))),
+        offset_(Load(c.offsets.data() + channel)),
+        rectify_(finish.rectify),
+        skip_(finish.skip == nullptr ? nullptr : finish.skip->data),
+        to_(to.data) {}
+
+  /// Stores the result of a sum; `at` is where, in the map and in the skip.
+  void Store(const Lanes& sum, ptrdiff_t at) const {
+    Lanes result = MultiplyAdd(offset_, sum, factor_);
+    if (skip_ != nullptr) {
+      result = Add(result, Load(skip_ + at));
+    }
+    kyengine::Store(rectify_ ? Max(result, Broadcast(0)) : result, to_ + at);
+  }
+
+ private:
+  Lanes factor_;
+  Lanes offset_;
+  bool rectify_;
+  const float* skip_;
+  float* to_;
+};
+
+/// The weights that lead to 16 output channels.
+size_t GroupWeights(const Convolution& c) {
+  return static_cast<size_t>(c.side) * static_cast<size_t>(c.side) * static_cast<size_t>(c.inputs) * kLanes;
+}
+
+/// Sixteen weights as floats.
+Lanes LoadWeights(const Convolution& c, size_t at) {
+  return c.floats.ok() ? Load(c.floats.data() + at) : LoadBytes(c.bytes.data() + at, c.zero);
+}
+
+// ---- by definition
+
 /// The 16 weights of each product of a group of output channels, as floats: the model's own, or in `memory`.
-const float* WeightsOf(const Convolution& c, int group, float* memory) {
-  const size_t count =
-      static_cast<size_t>(c.side) * static_cast<size_t>(c.side) * static_cast<size_t>(c.inputs) * kLanes;
-  const size_t first = static_cast<size_t>(group) * count;
+const float* WeightsOf(const Convolution& c, size_t first, float* memory) {
   if (c.floats.ok()) {
     return c.floats.data() + first;
   }
+  const size_t count = GroupWeights(c);
 #pragma GCC unroll 4
   for (size_t i = 0; i < count; i += kLanes) {
     Store(LoadBytes(c.bytes.data() + first + i, c.zero), memory + i);
@@ -49,69 +124,250 @@ const float* WeightsOf(const Convolution& c, int group, float* memory) {
   return memory;
 }
 
-}  // namespace
-
-void Convolve(const Convolution& c, const Map& from, const float* start, int side, const Finish& finish,
-              const Map& to, float* memory) {
-  const int run = c.side * c.inputs;
-  const ptrdiff_t row = from.row();
+void ConvolveDirectly(const Convolution& c, const Map& from, const Finish& finish, const Map& to,
+                      float* memory) {
+  const int side = ResultSide(from.side, c.side, c.step);
+  const int border = c.step == 1 ? c.side / 2 : 0;
+  const float* const start = from.at(-border, -border);
   const ptrdiff_t step = static_cast<ptrdiff_t>(c.step) * c.inputs;
-  const Lanes zero = Broadcast(0);
-  for (int group = 0; group < c.outputs / kLanes; ++group) {
-    const float* const weights = WeightsOf(c, group, memory);
-    const ptrdiff_t first_channel = static_cast<ptrdiff_t>(group) * kLanes;
-    const Lanes factor = Load(c.factors.data() + first_channel);
-    const Lanes offset = Load(c.offsets.data() + first_channel);
-
+  size_t first = 0;
+  for (int channel = 0; channel < c.outputs; channel += kLanes) {
+    const float* const weights = WeightsOf(c, first, memory);
+    first += GroupWeights(c);
+    const Finisher finisher(c, finish, to, channel, 1);
     int y = 0;
     int x = 0;
-    const auto some = [&]<int count>(std::integral_constant<int, count>) {
+    InFives(ptrdiff_t{side} * side, [&]<int count>(std::integral_constant<int, count>) {
       const float* places[count];
       ptrdiff_t at[count];
       for (int i = 0; i < count; ++i) {
-        places[i] = start + y * c.step * row + x * step;
-        at[i] = to.at(y, x) - to.data + first_channel;
+        places[i] = start + y * c.step * from.row() + x * step;
+        at[i] = to.at(y, x) - to.data + channel;
         if (++x == side) {
           x = 0;
           ++y;
         }
       }
       Lanes sums[count];
+      SumWindow(sums, weights, places, c.side, c.side * c.inputs, from.row());
 #pragma GCC unroll 8
       for (int i = 0; i < count; ++i) {
-        sums[i] = zero;
+        finisher.Store(sums[i], at[i]);
       }
-      AddWindow(sums, weights, places, c.side, run, row);
-#pragma GCC unroll 8
-      for (int i = 0; i < count; ++i) {
-        Lanes result = MultiplyAdd(offset, sums[i], factor);
-        if (finish.skip != nullptr) {
-          result = Add(result, Load(finish.skip->data + at[i]));
-        }
-        Store(finish.rectify ? Max(result, zero) : result, to.data + at[i]);
-      }
-    };
-    int left = side * side;
-    for (; left >= kPixels; left -= kPixels) {
-      some(std::integral_constant<int, kPixels>());
+    });
+  }
+}
+
+// ---- in tiles
+
+// 3 x 3 in steps of one by Winograd's F(4 x 4, 3 x 3): where the polynomials of the pixels and of the weights
+// are known at 0, 1, -1, 2, -2 and infinity, those of the results are their products there. Along both axes
+// that is 36 products for 16 results, where the definition takes 144. The weights take their values as they
+// are, which for bytes is exact; what they would be divided by is in the results' coefficients, as far as it
+// differs, and in kTileScale.
+constexpr int kKernel = 3;
+constexpr int kTile = 4;
+constexpr int kWindow = kTile + kKernel - 1;
+constexpr int kPoints = kWindow * kWindow;
+constexpr float kTileScale = 1.0F / (24 * 24);
+
+/// On fewer pixels transforming the weights takes what the products save.
+constexpr int kLeastTiledSide = 2 * kTile;
+
+void TransformWeights(const Lanes (&w)[kKernel], Lanes (&transformed)[kWindow]) {
+  const Lanes two = Broadcast(2);
+  const Lanes near = Add(w[0], w[2]);
+  const Lanes far = MultiplyAdd(w[0], Broadcast(4), w[2]);
+  transformed[0] = w[0];
+  transformed[1] = Add(near, w[1]);
+  transformed[2] = Subtract(near, w[1]);
+  transformed[3] = MultiplyAdd(far, two, w[1]);
+  transformed[4] = MultiplySubtract(far, two, w[1]);
+  transformed[5] = w[2];
+}
+
+void TransformPixels(const Lanes (&p)[kWindow], Lanes (&transformed)[kWindow]) {
+  const Lanes two = Broadcast(2);
+  const Lanes four = Broadcast(4);
+  const Lanes five = Broadcast(5);
+  const Lanes near_even = MultiplySubtract(p[4], four, p[2]);
+  const Lanes near_odd = MultiplySubtract(p[3], four, p[1]);
+  const Lanes far_even = Subtract(p[4], p[2]);
+  const Lanes far_odd = Subtract(p[3], p[1]);
+  transformed[0] = MultiplyAdd(MultiplySubtract(p[4], five, p[2]), four, p[0]);
+  transformed[1] = Add(near_even, near_odd);
+  transformed[2] = Subtract(near_even, near_odd);
+  transformed[3] = MultiplyAdd(far_even, two, far_odd);
+  transformed[4] = MultiplySubtract(far_even, two, far_odd);
+  transformed[5] = MultiplyAdd(MultiplySubtract(p[5], five, p[3]), four, p[1]);
+}
+
+/// The results, 24 times.
+void TransformSums(const Lanes (&s)[kWindow], Lanes (&results)[kTile]) {
+  const Lanes four = Broadcast(4);
+  const Lanes near_even = Multiply(Add(s[1], s[2]), four);
+  const Lanes near_odd = Multiply(Subtract(s[2], s[1]), four);
+  const Lanes far_even = Add(s[3], s[4]);
+  const Lanes far_odd = Subtract(s[3], s[4]);
+  results[0] = MultiplyAdd(Subtract(far_even, near_even), Broadcast(6), s[0]);
+  results[1] = MultiplyAdd(near_odd, Broadcast(2), far_odd);
+  results[2] = Subtract(Multiply(far_even, four), near_even);
+  results[3] = MultiplyAdd(MultiplyAdd(near_odd, Broadcast(8), far_odd), Broadcast(24), s[5]);
+}
+
+/// Transforms each column and then each row of what `load(y, x)` gives, and has `store(y, x, lanes)` take it.
+template <int from, int to, typename Load, typename Store>
+void TransformBothWays(void (*transform)(const Lanes (&)[from], Lanes (&)[to]), Load load, Store store) {
+  Lanes rows[to][from];
+  for (int x = 0; x < from; ++x) {
+    Lanes column[from];
+    for (int y = 0; y < from; ++y) {
+      column[y] = load(y, x);
     }
-    switch (left) {
-      case 4:
-        some(std::integral_constant<int, 4>());
-        break;
-      case 3:
-        some(std::integral_constant<int, 3>());
-        break;
-      case 2:
-        some(std::integral_constant<int, 2>());
-        break;
-      case 1:
-        some(std::integral_constant<int, 1>());
-        break;
-      default:
-        break;
+    Lanes transformed[to];
+    transform(column, transformed);
+    for (int y = 0; y < to; ++y) {
+      rows[y][x] = transformed[y];
     }
   }
+  for (int y = 0; y < to; ++y) {
+    Lanes transformed[to];
+    transform(rows[y], transformed);
+    for (int x = 0; x < to; ++x) {
+      store(y, x, transformed[x]);
+    }
+  }
+}
+
+constexpr int TilesAlong(int side) { return (side + kTile - 1) / kTile; }
+
+/// The tiles of a map, and the memory in which their numbers at each of the points lie.
+struct Tiles {
+  int along;
+  ptrdiff_t count;
+  float* pixels;   ///< [kPoints][count][inputs]
+  float* sums;     ///< [kPoints][count][16]
+  float* weights;  ///< [kPoints][inputs][16]
+
+  Tiles(int side, ptrdiff_t inputs, float* memory)
+      : along(TilesAlong(side)),
+        count(ptrdiff_t{along} * along),
+        pixels(memory),
+        sums(pixels + kPoints * count * inputs),
+        weights(sums + kPoints * count * kLanes) {}
+
+  static size_t Size(int side, int inputs) {
+    const int count = TilesAlong(side) * TilesAlong(side);
+    return static_cast<size_t>(kPoints) * static_cast<size_t>(count * (inputs + kLanes) + inputs * kLanes);
+  }
+
+  /// Calls `visit` with each tile's number and its first pixel.
+  template <typename Visit>
+  void ForEach(Visit visit) const {
+    ptrdiff_t tile = 0;
+    for (int y = 0; y < along; ++y) {
+      for (int x = 0; x < along; ++x) {
+        visit(tile++, y * kTile, x * kTile);
+      }
+    }
+  }
+};
+
+void TransformPixelsOf(const Map& map, const Tiles& tiles) {
+  tiles.ForEach([&](ptrdiff_t tile, int top, int left) {
+    for (int channel = 0; channel < map.channels; channel += kLanes) {
+      TransformBothWays(
+          TransformPixels,
+          [&](int dy, int dx) {
+            const int y = top + dy - 1;
+            const int x = left + dx - 1;
+            // The last tiles reach beyond the border.
+            return y > map.side || x > map.side ? Broadcast(0) : Load(map.at(y, x) + channel);
+          },
+          [&](int y, int x, const Lanes& transformed) {
+            Store(transformed,
+                  tiles.pixels + ((y * kWindow + x) * tiles.count + tile) * map.channels + channel);
+          });
+    }
+  });
+}
+
+void TransformWeightsOf(const Convolution& c, size_t first, const Tiles& tiles) {
+  const ptrdiff_t inputs = c.inputs;
+  for (ptrdiff_t input = 0; input < inputs; ++input) {
+    TransformBothWays(
+        TransformWeights,
+        [&](int y, int x) {
+          return LoadWeights(c, first + static_cast<size_t>(((y * kKernel + x) * inputs + input) * kLanes));
+        },
+        [&](int y, int x, const Lanes& transformed) {
+          Store(transformed, tiles.weights + ((y * kWindow + x) * inputs + input) * kLanes);
+        });
+  }
+}
+
+void SumProducts(int inputs, const Tiles& tiles) {
+  const float* pixels = tiles.pixels;
+  const float* weights = tiles.weights;
+  float* sum = tiles.sums;
+  for (int point = 0; point < kPoints; ++point) {
+    InFives(tiles.count, [&]<int count>(std::integral_constant<int, count>) {
+      const float* places[count];
+      for (const float*& place : places) {
+        place = pixels;
+        pixels += inputs;
+      }
+      Lanes sums[count];
+      SumWindow(sums, weights, places, 1, inputs, 0);
+#pragma GCC unroll 8
+      for (int i = 0; i < count; ++i) {
+        Store(sums[i], sum);
+        sum += kLanes;
+      }
+    });
+    weights += ptrdiff_t{inputs} * kLanes;
+  }
+}
+
+void ConvolveInTiles(const Convolution& c, const Map& from, const Finish& finish, const Map& to,
+                     float* memory) {
+  const Tiles tiles(from.side, c.inputs, memory);
+  TransformPixelsOf(from, tiles);
+  size_t first = 0;
+  for (int channel = 0; channel < c.outputs; channel += kLanes) {
+    TransformWeightsOf(c, first, tiles);
+    first += GroupWeights(c);
+    SumProducts(c.inputs, tiles);
+    const Finisher finisher(c, finish, to, channel, kTileScale);
+    tiles.ForEach([&](ptrdiff_t tile, int top, int left) {
+      TransformBothWays(
+          TransformSums,
+          [&](int y, int x) { return Load(tiles.sums + ((y * kWindow + x) * tiles.count + tile) * kLanes); },
+          [&](int dy, int dx, const Lanes& result) {
+            const int y = top + dy;
+            const int x = left + dx;
+            if (y < from.side && x < from.side) {
+              finisher.Store(result, to.at(y, x) - to.data + channel);
+            }
+          });
+    });
+  }
+}
+
+constexpr bool InTiles(int kernel, int step, int side) {
+  return kernel == kKernel && step == 1 && side >= kLeastTiledSide;
+}
+
+}  // namespace
+
+size_t ConvolveMemory(int kernel, int step, int inputs, int side) {
+  return InTiles(kernel, step, side) ? Tiles::Size(side, inputs)
+                                     : static_cast<size_t>(kernel * kernel * inputs) * kLanes;
+}
+
+void Convolve(const Convolution& c, const Map& from, const Finish& finish, const Map& to, float* memory) {
+  const auto convolve = InTiles(c.side, c.step, from.side) ? ConvolveInTiles : ConvolveDirectly;
+  convolve(c, from, finish, to, memory);
 }
 
 }  // namespace kyengine

@@ -62,9 +62,16 @@ struct Finish {
   const Map* skip = nullptr;  ///< added before that, at the same pixel
 };
 
-/// Convolves from `start` of `from` on, to `side` x `side` pixels of `to`. The map's border is the
-/// convolution's where `start` is the border's first pixel.
-void Convolve(const Convolution& c, const Map& from, const float* start, int side, const Finish& finish,
-              const Map& to, float* memory);
+/// The side of the result where a kernel walks over a map of `side`. In steps of one the map's border takes
+/// part, and the result is as large as the map; in others it takes none.
+constexpr int ResultSide(int side, int kernel, int step) {
+  return step == 1 ? side : (side - kernel) / step + 1;
+}
+
+/// The floats that Convolve takes for itself, for a kernel, its inputs and the side of the map.
+size_t ConvolveMemory(int kernel, int step, int inputs, int side);
+
+/// Convolves all of `from`. `to` is as large as the result, or larger.
+void Convolve(const Convolution& c, const Map& from, const Finish& finish, const Map& to, float* memory);
 
 }  // namespace kyengine

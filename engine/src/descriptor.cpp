@@ -29,9 +29,6 @@ constexpr ResidualBlock kBlocks[] = {{32, false}, {32, false},  {32, false},  {6
                                      {64, false}, {64, false},  {128, true},  {128, false}, {128, false},
                                      {256, true}, {256, false}, {256, false}, {256, true}};
 
-/// Outputs along a side of `side` inputs without a border.
-constexpr int Outputs(int side, int kernel, int step) { return (side - kernel) / step + 1; }
-
 /// What one convolution of a network must be.
 struct Expected {
   int side;
@@ -61,16 +58,6 @@ ky_result_t ForEachExpected(const DescriptorShape& shape, Visit visit) {
     channels = block.channels;
   }
   return result == KY_SUCCESS ? visit(Expected{1, 1, channels, shape.outputs}) : result;
-}
-
-/// The most weights of one group of 16 output channels.
-size_t MostWeights(const DescriptorShape& shape) {
-  size_t most = 0;
-  ForEachExpected(shape, [&most](const Expected& e) {
-    most = std::max(most, e.weights() / static_cast<size_t>(e.outputs) * kLanes);
-    return KY_SUCCESS;
-  });
-  return most;
 }
 
 constexpr size_t kConvolutionHeader = 6 * sizeof(uint32_t);
@@ -190,26 +177,33 @@ void AddMeansAndRectify(const Map& from, const Map& to) {
 }
 
 /// The memory that a walk through the network takes: the picture, what the first convolution makes of it,
-/// three maps that take turns, and the weights in use.
+/// three maps that take turns, and what a convolution takes for itself.
 struct Needs {
   size_t picture = 0;
   size_t first = 0;
   size_t map = 0;
-  size_t weights = 0;
+  size_t convolve = 0;
 
-  explicit Needs(const DescriptorShape& shape) : weights(MostWeights(shape)) {
+  explicit Needs(const DescriptorShape& shape) {
     picture = Map::Size(shape.side, kColours);
-    int side = Outputs(shape.side, kFirstSide, 2);
-    first = Map::Size(side, shape.first_channels);
-    side = Outputs(side, 3, 2);
-    map = std::max(Map::Size(side, shape.first_channels), Map::Size(1, shape.outputs));
+    int side = ResultSide(shape.side, kFirstSide, 2);
+    int channels = shape.first_channels;
+    first = Map::Size(side, channels);
+    convolve = ConvolveMemory(kFirstSide, 2, kColours, shape.side);
+    side = ResultSide(side, kSide, 2);
+    map = std::max(Map::Size(side, channels), Map::Size(1, shape.outputs));
     for (const ResidualBlock& block : shape.blocks) {
+      const int step = block.halves ? 2 : 1;
+      convolve = std::max({convolve, ConvolveMemory(kSide, step, channels, side),
+                           ConvolveMemory(kSide, 1, block.channels, ResultSide(side, kSide, step))});
       side = block.halves ? side / 2 : side;
-      map = std::max(map, Map::Size(side, block.channels));
+      channels = block.channels;
+      map = std::max(map, Map::Size(side, channels));
     }
+    convolve = std::max(convolve, ConvolveMemory(1, 1, channels, 1));
   }
 
-  size_t sum() const { return picture + first + 3 * map + weights; }
+  size_t sum() const { return picture + first + 3 * map + convolve; }
 };
 
 }  // namespace
@@ -283,7 +277,7 @@ ky_result_t Descriptor::Describe(const uint8_t* rgb, float* numbers) const {
   float* const picture_memory = memory.data();
   float* const first_memory = picture_memory + needs.picture;
   float* const maps = first_memory + needs.first;
-  float* const weights = maps + 3 * needs.map;
+  float* const scratch = maps + 3 * needs.map;
   std::array<float*, 3> free = {maps, maps + needs.map, maps + 2 * needs.map};
 
   const Map picture = Cleared(picture_memory, shape_.side, kColours);
@@ -295,29 +289,23 @@ ky_result_t Descriptor::Describe(const uint8_t* rgb, float* numbers) const {
   }
 
   const Convolution* convolution = convolutions_.begin();
-  const Map first = Cleared(first_memory, Outputs(shape_.side, kFirstSide, 2), shape_.first_channels);
-  Convolve(*convolution++, picture, picture.at(0, 0), first.side, {.rectify = true}, first, weights);
-  Map now = Cleared(free[0], Outputs(first.side, 3, 2), shape_.first_channels);
+  const Map first = Cleared(first_memory, ResultSide(shape_.side, kFirstSide, 2), shape_.first_channels);
+  Convolve(*convolution++, picture, {.rectify = true}, first, scratch);
+  Map now = Cleared(free[0], ResultSide(first.side, kSide, 2), shape_.first_channels);
   MaxPool(first, now);
 
   for (const ResidualBlock& block : shape_.blocks) {
-    // The picture's border takes part in convolutions in steps of one alone.
-    const int side = block.halves ? Outputs(now.side, kSide, 2) : now.side;
-    const float* const start = block.halves ? now.at(0, 0) : now.at(-1, -1);
-    const Map middle = Cleared(free[1], side, block.channels);
-    Convolve(*convolution++, now, start, side, {.rectify = true}, middle, weights);
+    const Map middle = Cleared(free[1], ResultSide(now.side, kSide, block.halves ? 2 : 1), block.channels);
+    Convolve(*convolution++, now, {.rectify = true}, middle, scratch);
+    // The mean may have a row and a column more than the convolutions, which have zeros there.
+    const Map after = Cleared(free[2], block.halves ? now.side / 2 : now.side, block.channels);
     if (block.halves) {
-      // The mean may have a row and a column more than the convolution, which has zeros there.
-      const Map after = Cleared(free[2], now.side / 2, block.channels);
-      Convolve(*convolution++, middle, middle.at(-1, -1), side, {}, after, weights);
+      Convolve(*convolution++, middle, {}, after, scratch);
       AddMeansAndRectify(now, after);
-      now = after;
     } else {
-      const Map after = Cleared(free[2], side, block.channels);
-      Convolve(*convolution++, middle, middle.at(-1, -1), side, {.rectify = true, .skip = &now}, after,
-               weights);
-      now = after;
+      Convolve(*convolution++, middle, {.rectify = true, .skip = &now}, after, scratch);
     }
+    now = after;
     std::swap(free[0], free[2]);
   }
 
@@ -328,7 +316,7 @@ ky_result_t Descriptor::Describe(const uint8_t* rgb, float* numbers) const {
     Store(MultiplyAdd(Load(sum), Load(now.at(y, x) + channel), share), sum);
   });
   const Map result = Cleared(free[2], 1, shape_.outputs);
-  Convolve(*convolution, mean, mean.at(0, 0), 1, {}, result, weights);
+  Convolve(*convolution, mean, {}, result, scratch);
   std::copy_n(result.at(0, 0), shape_.outputs, numbers);
   return std::all_of(numbers, numbers + shape_.outputs, [](float x) { return std::isfinite(x); })
              ? KY_SUCCESS

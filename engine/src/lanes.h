@@ -142,14 +142,13 @@ inline void AddProducts(Lanes (&sums)[count], const float* weights, const float*
 
 /// The same of four consecutive `at`, each with its sixteen weights, one after the other.
 template <int count>
-inline void AddFourProducts(Lanes (&sums)[count], const float* weights, const float* const (&x)[count],
-                            ptrdiff_t at) {
+inline void AddFourProducts(Lanes (&sums)[count], const float* weights, const float* const (&x)[count]) {
 #if defined(__ARM_NEON)
   // The four numbers of a pixel come with one load and are multiplied from their lanes.
   float32x4_t four[count];
 #pragma GCC unroll 8
   for (int i = 0; i < count; ++i) {
-    four[i] = vld1q_f32(x[i] + at);
+    four[i] = vld1q_f32(x[i]);
   }
   const auto add = [&]<int lane>(std::integral_constant<int, lane>) {
     const Lanes w = Load(weights + static_cast<ptrdiff_t>(kLanes) * lane);
@@ -168,7 +167,7 @@ inline void AddFourProducts(Lanes (&sums)[count], const float* weights, const fl
 #else
 #pragma GCC unroll 4
   for (int k = 0; k < 4; ++k) {
-    AddProducts(sums, weights + static_cast<ptrdiff_t>(kLanes) * k, x, at + k);
+    AddProducts(sums, weights + static_cast<ptrdiff_t>(kLanes) * k, x, k);
   }
 #endif
 }
