@@ -16,10 +16,10 @@
 namespace kyface::brightness {
 
 /// Pixels of a block.
-inline constexpr int kBlock = HPC::fastcv::arm::kBlockPixels<unsigned char>;
+inline constexpr int kBlock = HPC::fastcv::arm::kLanes<uint8x16_t>;
 
 template <int nc>
-using Block = HPC::fastcv::arm::Pixels<unsigned char, nc>;
+using Block = HPC::fastcv::arm::Pixels<uint8x16_t, nc>;
 
 /// The arguments of a metric.
 struct Region {
@@ -61,7 +61,7 @@ inline void addRow(Sum& sum, const unsigned char* row, ptrdiff_t length) {
       [&](ptrdiff_t x, auto blocks) {
         Block<nc> pixels[blocks];
         for (int i = 0; i < blocks; ++i) {
-          pixels[i] = loadPixels<nc>(row + (x + ptrdiff_t{i} * kBlock) * nc);
+          pixels[i] = loadPixels<uint8x16_t, nc>(row + (x + ptrdiff_t{i} * kBlock) * nc);
         }
         sum.add(pixels);
       },
@@ -72,15 +72,16 @@ inline void addRow(Sum& sum, const unsigned char* row, ptrdiff_t length) {
   Block<nc> last[1];
   if (length > kBlock) {
     static constexpr unsigned char kColumns[kBlock] = {0, 1, 2, 3, 4, 5, 6, 7, 8, 9, 10, 11, 12, 13, 14, 15};
-    last[0] = loadPixels<nc>(row + (length - kBlock) * nc);
-    const uint8x16_t counts = vcgeq_u8(vld1q_u8(kColumns), splat(static_cast<unsigned char>(kBlock - rest)));
+    last[0] = loadPixels<uint8x16_t, nc>(row + (length - kBlock) * nc);
+    const uint8x16_t counts =
+        vcgeq_u8(vld1q_u8(kColumns), splat<uint8x16_t>(static_cast<unsigned char>(kBlock - rest)));
     for (uint8x16_t& channel : last[0].c) {
       channel = vandq_u8(channel, counts);
     }
   } else {
     unsigned char padded[kBlock * nc] = {};
     memcpy(padded, row, static_cast<size_t>(rest * nc));
-    last[0] = loadPixels<nc>(padded);
+    last[0] = loadPixels<uint8x16_t, nc>(padded);
   }
   sum.add(last);
 }

@@ -100,7 +100,7 @@ void expectEveryColour() {
           bytes[4 * i + 3] = static_cast<unsigned char>(b + i);
           expected += static_cast<uint32_t>(reference(b, g, r + i));
         }
-        const Block<4> blocks[1] = {HPC::fastcv::arm::loadPixels<4>(bytes)};
+        const Block<4> blocks[1] = {HPC::fastcv::arm::loadPixels<uint8x16_t, 4>(bytes)};
         sum.add(blocks);
         ASSERT_EQ(sum.total() - before, expected) << b << ", " << g << ", " << r;
         before = sum.total();

@@ -28,11 +28,13 @@ struct ToGray<unsigned char, ncSrc> {
   static constexpr int kInFlight = 4;
   static constexpr bool kUniform = true;
 
+  static constexpr bool kWeighs = true;
+
   static constexpr int kB = 29, kG = 150, kR = 77;
   static constexpr int kShift = 8;
 
-  Pixels<unsigned char, 1> vector(const Pixels<unsigned char, ncSrc>& p) const {
-    return {{weightedBytes<kShift>(p.c[0], kB, p.c[1], kG, p.c[2], kR)}};
+  Pixels<Bytes, 1> vector(const Colours& p) const {
+    return {{narrowRounded<kShift>(weighed<Weights{kB, kG, kR}>(p))}};
   }
 
   void scalar(const unsigned char* in, unsigned char* out) const {
@@ -51,9 +53,9 @@ struct ToGray<float, ncSrc> {
 
   static constexpr float kB = 0.114f, kG = 0.587f, kR = 0.299f;
 
-  Pixels<float, 1> vector(const Pixels<float, ncSrc>& p) const {
-    const float32x4_t red = vfmaq_f32(vmulq_f32(p.c[0], vdupq_n_f32(kB)), p.c[2], vdupq_n_f32(kR));
-    return {{vfmaq_f32(red, p.c[1], vdupq_n_f32(kG))}};
+  Pixels<Floats, 1> vector(const Pixels<Floats, ncSrc>& p) const {
+    const Floats red = multiplyAdd(p.c[0] * splat<Floats>(kB), p.c[2], splat<Floats>(kR));
+    return {{multiplyAdd(red, p.c[1], splat<Floats>(kG))}};
   }
 
   void scalar(const float* in, float* out) const {
@@ -70,7 +72,7 @@ struct FromGray {
   static constexpr int kInFlight = ncDst == 3 ? 8 : 4;
   static constexpr bool kUniform = true;
 
-  Pixels<T, 3> vector(const Pixels<T, 1>& p) const { return {{p.c[0], p.c[0], p.c[0]}}; }
+  Pixels<BlockOf<T>, 3> vector(const Pixels<BlockOf<T>, 1>& p) const { return {{p.c[0], p.c[0], p.c[0]}}; }
 
   void scalar(const T* in, T* out) const { storePixel<ncDst, T>(out, *in, *in, *in); }
 };

@@ -75,6 +75,7 @@ inline unsigned char byteOf(float value) {
 
 template <int ncSrc>
 struct BgrToHsv8 {
+  using Vector = uint8x16_t;
   using Src = unsigned char;
   using Dst = unsigned char;
   static constexpr int kSrcChannels = ncSrc;
@@ -83,7 +84,7 @@ struct BgrToHsv8 {
   static constexpr bool kUniform = false;
 
   // The compiler finds it too long to inline; called, it would keep nothing in registers from block to block.
-  [[gnu::always_inline]] Pixels<unsigned char, 3> vector(const Pixels<unsigned char, ncSrc>& p) const {
+  [[gnu::always_inline]] Pixels<uint8x16_t, 3> vector(const Pixels<uint8x16_t, ncSrc>& p) const {
     // Scaling keeps order and equality: which channel is what is settled among the bytes.
     const uint8x16_t b = p.c[0], g = p.c[1], r = p.c[2];
     const uint8x16_t max = vmaxq_u8(vmaxq_u8(b, g), r);
@@ -130,6 +131,7 @@ struct BgrToHsv8 {
 
 template <int ncSrc>
 struct BgrToHsvFloat {
+  using Vector = float32x4_t;
   using Src = float;
   using Dst = float;
   static constexpr int kSrcChannels = ncSrc;
@@ -142,7 +144,7 @@ struct BgrToHsvFloat {
   // With lo the lesser of B and G, the hue of a blue pixel, (R - G) k + 240, is |(lo - R) k - 240|, and that
   // of a green one, (B - R) k + 120, is |(lo - R) k + 120|; red ones are |(G - B) k + 360| or |(G - B) k|.
   // The sums are rounded alike, and one subtraction to an absolute value serves all.
-  Pixels<float, 3> vector(const Pixels<float, ncSrc>& p) const {
+  Pixels<float32x4_t, 3> vector(const Pixels<float32x4_t, ncSrc>& p) const {
     const float32x4_t b = p.c[0], g = p.c[1], r = p.c[2];
     const float32x4_t lo = vminq_f32(b, g);
     const float32x4_t vmax = vmaxq_f32(vmaxq_f32(b, g), r);
@@ -208,6 +210,7 @@ inline Bgr bgrOf(float h, float v, float c) {
 
 template <int ncDst>
 struct HsvToBgr8 {
+  using Vector = uint8x16_t;
   using Src = unsigned char;
   using Dst = unsigned char;
   static constexpr int kSrcChannels = 3;
@@ -215,7 +218,7 @@ struct HsvToBgr8 {
   static constexpr int kInFlight = 1;
   static constexpr bool kUniform = false;
 
-  Pixels<unsigned char, 3> vector(const Pixels<unsigned char, 3>& p) const {
+  Pixels<uint8x16_t, 3> vector(const Pixels<uint8x16_t, 3>& p) const {
     Quarters least, between;
     for (unsigned i = 0; i < 4; ++i) {
       const unsigned first = 4 * i;
@@ -250,6 +253,7 @@ struct HsvToBgr8 {
 
 template <int ncDst>
 struct HsvToBgrFloat {
+  using Vector = float32x4_t;
   using Src = float;
   using Dst = float;
   static constexpr int kSrcChannels = 3;
@@ -257,7 +261,7 @@ struct HsvToBgrFloat {
   static constexpr int kInFlight = ncDst == 3 ? 2 : 1;  // two blocks and their alphas exceed the registers
   static constexpr bool kUniform = true;
 
-  Pixels<float, 3> vector(const Pixels<float, 3>& p) const {
+  Pixels<float32x4_t, 3> vector(const Pixels<float32x4_t, 3>& p) const {
     const float32x4_t h = vdivq_f32(p.c[0], vdupq_n_f32(60.0f));
     const float32x4_t v = p.c[2];
     const float32x4_t c = vmulq_f32(v, p.c[1]);

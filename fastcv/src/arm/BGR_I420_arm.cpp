@@ -178,8 +178,7 @@ struct DecodePair {
     const uint8x16_t blue = joined(sum(even, b), sum(odd, b));
     const uint8x16_t green = joined(difference(even, minusG), difference(odd, minusG));
     const uint8x16_t red = joined(sum(even, r), sum(odd, r));
-    storePixels(out, bIdx == 0 ? pixelsOf<dcn, unsigned char>(blue, green, red)
-                               : pixelsOf<dcn, unsigned char>(red, green, blue));
+    storePixels(out, bIdx == 0 ? pixelsOf<dcn>(blue, green, red) : pixelsOf<dcn>(red, green, blue));
   }
 
   template <int lanes>
@@ -307,8 +306,8 @@ struct EncodePair {
   unsigned char* v;
 
   void block(ptrdiff_t x, Blocks<1>) const {
-    const Pixels<unsigned char, scn> top = loadPixels<scn>(in0 + x * scn);
-    const Pixels<unsigned char, scn> bottom = loadPixels<scn>(in1 + x * scn);
+    const Pixels<uint8x16_t, scn> top = loadPixels<uint8x16_t, scn>(in0 + x * scn);
+    const Pixels<uint8x16_t, scn> bottom = loadPixels<uint8x16_t, scn>(in1 + x * scn);
     vst1q_u8(luma0 + x, lumaOf(top));
     vst1q_u8(luma1 + x, lumaOf(bottom));
     const uint8x8_t b = evenColumns(top.c[bIdx]);
@@ -334,7 +333,7 @@ struct EncodePair {
  private:
   static constexpr int kRed = 2 - bIdx;
 
-  uint8x16_t lumaOf(const Pixels<unsigned char, scn>& p) const {
+  uint8x16_t lumaOf(const Pixels<uint8x16_t, scn>& p) const {
     const uint8x16_t b = p.c[bIdx];
     const uint8x16_t g = p.c[1];
     const uint8x16_t r = p.c[kRed];

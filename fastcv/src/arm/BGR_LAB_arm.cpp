@@ -76,6 +76,7 @@ inline uint16x8_t gather(const CubeRootTable& table, uint32x4_t low, uint32x4_t 
 
 template <int nc>
 struct BgrToLab8 {
+  using Vector = uint8x16_t;
   using Src = unsigned char;
   using Dst = unsigned char;
   static constexpr int kSrcChannels = nc;
@@ -83,7 +84,7 @@ struct BgrToLab8 {
   static constexpr int kInFlight = 1;
   static constexpr bool kUniform = true;
 
-  Pixels<unsigned char, 3> vector(const Pixels<unsigned char, nc>& p) const {
+  Pixels<uint8x16_t, 3> vector(const Pixels<uint8x16_t, nc>& p) const {
     const uint8x16_t bytes[3] = {p.c[0], p.c[1], p.c[2]};
     Light light[3];
     lookUp(kGammaPlanes, bytes, light);
@@ -202,13 +203,13 @@ inline float32x4_t weighted(float32x4_t v0, float32x4_t v1, float32x4_t v2, cons
 // One pixel through the vector form of `op`.
 template <typename Op>
 inline void pixelByVector(const Op& op, const typename Op::Src* in, typename Op::Dst* out) {
-  constexpr int kBlock = kBlockPixels<typename Op::Src>;
+  constexpr int kBlock = kLanes<typename Op::Vector>;
   typename Op::Src src[kBlock * Op::kSrcChannels] = {};
   typename Op::Dst dst[kBlock * Op::kDstChannels];
   for (int i = 0; i < Op::kSrcChannels; ++i) {
     src[i] = in[i];
   }
-  storePixels(dst, op.vector(loadPixels<Op::kSrcChannels>(src)));
+  storePixels(dst, op.vector(loadPixels<typename Op::Vector, Op::kSrcChannels>(src)));
   for (int i = 0; i < Op::kDstChannels; ++i) {
     out[i] = dst[i];
   }
@@ -224,13 +225,14 @@ constexpr float kToeOffset = 0.13793103f;
 
 // The roots with powf where it is needed. What has been computed of them is computed again: it would cost
 // more to keep it ready, every time, for the few calls.
-[[gnu::noinline, gnu::cold]] Pixels<float, 3> settledRoots(float32x4_t x, float32x4_t y, float32x4_t z,
-                                                           const RootFactors& factors) {
+[[gnu::noinline, gnu::cold]] Pixels<float32x4_t, 3> settledRoots(float32x4_t x, float32x4_t y, float32x4_t z,
+                                                                 const RootFactors& factors) {
   return {{Roots(x, factors).settled(), Roots(y, factors).settled(), Roots(z, factors).settled()}};
 }
 
 template <int nc>
 struct BgrToLabF32 {
+  using Vector = float32x4_t;
   using Src = float;
   using Dst = float;
   static constexpr int kSrcChannels = nc;
@@ -238,7 +240,7 @@ struct BgrToLabF32 {
   static constexpr int kInFlight = 1;
   static constexpr bool kUniform = true;
 
-  Pixels<float, 3> vector(const Pixels<float, nc>& p) const {
+  Pixels<float32x4_t, 3> vector(const Pixels<float32x4_t, nc>& p) const {
     const float32x4_t b = linear(p.c[0]);
     const float32x4_t g = linear(p.c[1]);
     const float32x4_t r = linear(p.c[2]);
@@ -247,7 +249,7 @@ struct BgrToLabF32 {
     const float32x4_t z = weighted(g, b, r, z_);
     const uint32x4_t aboveX = aboveToe(x), aboveY = aboveToe(y), aboveZ = aboveToe(z);
     const Roots rootX(x, root_), rootY(y, root_), rootZ(z, root_);
-    Pixels<float, 3> roots = {{rootX.rounded(), rootY.rounded(), rootZ.rounded()}};
+    Pixels<float32x4_t, 3> roots = {{rootX.rounded(), rootY.rounded(), rootZ.rounded()}};
     const uint32x4_t unclear =
         vorrq_u32(vorrq_u32(vbicq_u32(aboveX, rootX.clear()), vbicq_u32(aboveY, rootY.clear())),
                   vbicq_u32(aboveZ, rootZ.clear()));
@@ -257,8 +259,8 @@ struct BgrToLabF32 {
     const float32x4_t fx = rootOrToe(aboveX, x, roots.c[0]);
     const float32x4_t fy = rootOrToe(aboveY, y, roots.c[1]);
     const float32x4_t fz = rootOrToe(aboveZ, z, roots.c[2]);
-    const float32x4_t l =
-        vbslq_f32(aboveY, vfmaq_f32(splat(-16.0f), fy, lab_.at<0>()), vmulq_f32(y, lab_.at<1>()));
+    const float32x4_t l = vbslq_f32(aboveY, vfmaq_f32(splat<float32x4_t>(-16.0f), fy, lab_.at<0>()),
+                                    vmulq_f32(y, lab_.at<1>()));
     return {{l, vmulq_f32(vsubq_f32(fx, fy), lab_.at<2>()), vmulq_f32(vsubq_f32(fy, fz), lab_.at<3>())}};
   }
 
@@ -267,16 +269,16 @@ struct BgrToLabF32 {
  private:
   // Beyond 0..1 the end pieces go on; a NaN stays one.
   static float32x4_t linear(float32x4_t v) {
-    const float32x4_t t = vmulq_f32(v, splat(static_cast<float>(kSplineIntervals)));
-    const float32x4_t piece =
-        vminnmq_f32(vmaxnmq_f32(t, splat(0.0f)), splat(static_cast<float>(kSplineIntervals - 1)));
+    const float32x4_t t = vmulq_f32(v, splat<float32x4_t>(static_cast<float>(kSplineIntervals)));
+    const float32x4_t piece = vminnmq_f32(vmaxnmq_f32(t, splat<float32x4_t>(0.0f)),
+                                          splat<float32x4_t>(static_cast<float>(kSplineIntervals - 1)));
     return valueIn(kExpansionSpline, t, vcvtq_u32_f32(piece));
   }
 
-  static uint32x4_t aboveToe(float32x4_t t) { return vcgtq_f32(t, splat(kToe)); }
+  static uint32x4_t aboveToe(float32x4_t t) { return vcgtq_f32(t, splat<float32x4_t>(kToe)); }
 
   float32x4_t rootOrToe(uint32x4_t above, float32x4_t t, float32x4_t root) const {
-    return vbslq_f32(above, root, vfmaq_f32(splat(kToeOffset), t, x_.at<3>()));
+    return vbslq_f32(above, root, vfmaq_f32(splat<float32x4_t>(kToeOffset), t, x_.at<3>()));
   }
 
   // Weights of G, B, R in X, Y and Z, and the slope of the toe.
@@ -299,8 +301,8 @@ class LabToLinear {
   };
 
   Linear operator()(float32x4_t l, float32x4_t a, float32x4_t b) const {
-    const float32x4_t toeOffset = splat(kToeOffset);
-    const uint32x4_t dark = vcleq_f32(l, splat(7.999625f));
+    const float32x4_t toeOffset = splat<float32x4_t>(kToeOffset);
+    const uint32x4_t dark = vcleq_f32(l, splat<float32x4_t>(7.999625f));
     const float32x4_t darkY = vmulq_f32(l, blue_.at<3>());
     const float32x4_t darkRoot = vfmaq_f32(toeOffset, darkY, green_.at<3>());
     const float32x4_t brightRoot = vfmaq_f32(toeOffset, l, red_.at<3>());
@@ -316,8 +318,8 @@ class LabToLinear {
 
   // The inverse of f.
   float32x4_t unrooted(float32x4_t f) const {
-    return vbslq_f32(vcgtq_f32(f, splat(kToeRoot)), cubed(f),
-                     vmulq_f32(vsubq_f32(f, splat(kToeOffset)), others_.at<2>()));
+    return vbslq_f32(vcgtq_f32(f, splat<float32x4_t>(kToeRoot)), cubed(f),
+                     vmulq_f32(vsubq_f32(f, splat<float32x4_t>(kToeOffset)), others_.at<2>()));
   }
 
   // Weights of X, Y, Z in a colour, and one of: Y of a dark L, its root, a bright L's root.
@@ -330,6 +332,7 @@ class LabToLinear {
 
 template <int nc>
 struct LabToBgrF32 {
+  using Vector = float32x4_t;
   using Src = float;
   using Dst = float;
   static constexpr int kSrcChannels = 3;
@@ -337,9 +340,9 @@ struct LabToBgrF32 {
   static constexpr int kInFlight = 2;
   static constexpr bool kUniform = true;
 
-  Pixels<float, nc> vector(const Pixels<float, 3>& p) const {
+  Pixels<float32x4_t, nc> vector(const Pixels<float32x4_t, 3>& p) const {
     const LabToLinear::Linear linear = linear_(p.c[0], p.c[1], p.c[2]);
-    return pixelsOf<nc, float>(compressed(linear.c[0]), compressed(linear.c[1]), compressed(linear.c[2]));
+    return pixelsOf<nc>(compressed(linear.c[0]), compressed(linear.c[1]), compressed(linear.c[2]));
   }
 
   void scalar(const float* in, float* out) const { pixelByVector(*this, in, out); }
@@ -347,8 +350,8 @@ struct LabToBgrF32 {
  private:
   // At 0 and below the curve is 0, at 1 and above the end of its last piece; a NaN stays one.
   static float32x4_t compressed(float32x4_t v) {
-    const float32x4_t limited = vminq_f32(vmaxq_f32(v, splat(0.0f)), splat(1.0f));
-    const float32x4_t t = vmulq_f32(limited, splat(static_cast<float>(kSplineIntervals)));
+    const float32x4_t limited = vminq_f32(vmaxq_f32(v, splat<float32x4_t>(0.0f)), splat<float32x4_t>(1.0f));
+    const float32x4_t t = vmulq_f32(limited, splat<float32x4_t>(static_cast<float>(kSplineIntervals)));
     return valueIn(kCompressionSpline, t, vminq_u32(vcvtq_u32_f32(t), vdupq_n_u32(kSplineIntervals - 1)));
   }
 
@@ -403,13 +406,14 @@ struct LabToBgr8Row {
   }
 
   static float32x4_t scaled(uint16x4_t l) {
-    return vmulq_f32(vcvtq_f32_u32(vmovl_u16(l)), splat(0.39215687f));
+    return vmulq_f32(vcvtq_f32_u32(vmovl_u16(l)), splat<float32x4_t>(0.39215687f));
   }
   static float32x4_t whole(int16x4_t v) { return vcvtq_f32_s32(vmovl_s16(v)); }
 
   // The nearest byte to 255 times the curve: see ByteTable.
   static uint16x4_t compressed(float32x4_t v) {
-    const float32x4_t limited = vminq_f32(vmaxq_f32(v, splat(ByteTable::kFloor)), splat(0x1.fffffep-1f));
+    const float32x4_t limited =
+        vminq_f32(vmaxq_f32(v, splat<float32x4_t>(ByteTable::kFloor)), splat<float32x4_t>(0x1.fffffep-1f));
     const uint32x4_t bits = vreinterpretq_u32_f32(limited);
     const uint32x4_t index = vshrq_n_u32(bits, ByteTable::kShift);
     // Where entry 0 would be, outside the table: an address that is only ever added to.

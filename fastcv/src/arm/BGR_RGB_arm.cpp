@@ -3,6 +3,8 @@
 
 // Channel reorderings: alpha added or dropped, red and blue swapped. Values are moved bit for bit.
 
+#include <bit>
+
 #include "entry.h"
 #include "simd/loop.h"
 
@@ -28,7 +30,9 @@ struct Reorder {
   static constexpr int kFirst = order == Order::kSwapped ? 2 : 0;
   static constexpr int kThird = 2 - kFirst;
 
-  Pixels<T, 3> vector(const Pixels<T, ncSrc>& p) const { return {{p.c[kFirst], p.c[1], p.c[kThird]}}; }
+  Pixels<BlockOf<T>, 3> vector(const Pixels<BlockOf<T>, ncSrc>& p) const {
+    return {{p.c[kFirst], p.c[1], p.c[kThird]}};
+  }
 
   void scalar(const T* in, T* out) const { storePixel<ncDst, T>(out, in[kFirst], in[1], in[kThird]); }
 };
@@ -46,7 +50,7 @@ struct SwapKeepingAlpha {
   static constexpr bool kUniform = true;
   static constexpr bool kPacked = true;
 
-  Pixels<T, 4> vector(const Pixels<T, 4>& p) const {
+  Pixels<BlockOf<T>, 4> vector(const Pixels<BlockOf<T>, 4>& p) const {
     return {{swapped(p.c[0]), swapped(p.c[1]), swapped(p.c[2]), swapped(p.c[3])}};
   }
 
@@ -57,13 +61,13 @@ struct SwapKeepingAlpha {
   }
 
  private:
-  static uint8x16_t swapped(uint8x16_t pixels) {
+  static Bytes swapped(Bytes pixels) {
     static constexpr unsigned char kOrder[] = {2, 1, 0, 3, 6, 5, 4, 7, 10, 9, 8, 11, 14, 13, 12, 15};
-    return vqtbl1q_u8(pixels, vld1q_u8(kOrder));
+    return shuffled(pixels, kOrder);
   }
-  static float32x4_t swapped(float32x4_t pixel) {
+  static Floats swapped(Floats pixels) {
     static constexpr unsigned char kOrder[] = {8, 9, 10, 11, 4, 5, 6, 7, 0, 1, 2, 3, 12, 13, 14, 15};
-    return vreinterpretq_f32_u8(vqtbl1q_u8(vreinterpretq_u8_f32(pixel), vld1q_u8(kOrder)));
+    return std::bit_cast<Floats>(shuffled(std::bit_cast<Bytes>(pixels), kOrder));
   }
 };
 

@@ -39,7 +39,9 @@ constexpr int kBCb = 29049;
 // such products and a shift by 8 + n, floor((256 S_high + S_low) / 2^(8 + n)) is
 // floor((S_high + floor(S_low / 256)) / 2^n), as a floor of a floor is the floor.
 constexpr signed char lowByte(int weight) { return static_cast<signed char>(weight & 0xff); }
-constexpr int16_t highByte(int weight) { return static_cast<int16_t>((weight - lowByte(weight)) / 256); }
+constexpr signed char highByte(int weight) {
+  return static_cast<signed char>((weight - lowByte(weight)) / 256);
+}
 
 template <int ncSrc>
 struct BgrToYCrCb8 {
@@ -50,11 +52,9 @@ struct BgrToYCrCb8 {
   static constexpr int kInFlight = 2;
   static constexpr bool kUniform = true;
 
-  Pixels<unsigned char, 3> vector(const Pixels<unsigned char, ncSrc>& p) const {
+  Pixels<Bytes, 3> vector(const Pixels<Bytes, ncSrc>& p) const {
     // The rounding half, 8192, is a multiple of 256: it is the rounding half of what remains to be shifted.
-    uint8x16_t y = roundingShiftToBytes<kShift - 8>(
-        lumaSum(vget_low_u8(p.c[0]), vget_low_u8(p.c[1]), vget_low_u8(p.c[2])),
-        lumaSum(vget_high_u8(p.c[0]), vget_high_u8(p.c[1]), vget_high_u8(p.c[2])));
+    Bytes y = narrowRounded<kShift - 8>(lumaSum(p.c[0], p.c[1], p.c[2]));
     forget(y);  // made of two halves, it would be taken apart again below
     return {{y, chromaOf(p.c[2], y, kCrR), chromaOf(p.c[0], y, kCbB)}};
   }
@@ -71,25 +71,21 @@ struct BgrToYCrCb8 {
  private:
   // floor(sum / 256). With unsigned parts the low sum is at most 256 * 255, the high one with the carried 255
   // at most 16320.
-  static uint16x8_t lumaSum(uint8x8_t b, uint8x8_t g, uint8x8_t r) {
-    uint16x8_t low = vmull_u8(b, vdup_n_u8(kYB % 256));
-    low = vmlal_u8(low, g, vdup_n_u8(kYG % 256));
-    low = vmlal_u8(low, r, vdup_n_u8(kYR % 256));
-    uint16x8_t high = vmull_u8(b, vdup_n_u8(kYB / 256));
-    high = vmlal_u8(high, g, vdup_n_u8(kYG / 256));
-    high = vmlal_u8(high, r, vdup_n_u8(kYR / 256));
-    return vsraq_n_u16(high, low, 8);
+  static Two<Halves> lumaSum(Bytes b, Bytes g, Bytes r) {
+    Two<Halves> low = multiply(b, kYB % 256);
+    low = multiplyAdd(low, g, kYG % 256);
+    low = multiplyAdd(low, r, kYR % 256);
+    Two<Halves> high = multiply(b, kYB / 256);
+    high = multiplyAdd(high, g, kYG / 256);
+    high = multiplyAdd(high, r, kYR / 256);
+    return addShifted<8>(high, low);
   }
 
-  // vqrdmulh gives (2 a b + 2^15) >> 16: with b = 2 weight that is (a weight + 2^13) >> 14. The result, -211
-  // to 211, saturates to a signed byte; 128 more is the clamped sum.
-  static uint8x16_t chromaOf(uint8x16_t colour, uint8x16_t y, int weight) {
-    const int8x8_t low = chromaOf(vsubl_u8(vget_low_u8(colour), vget_low_u8(y)), weight);
-    const int8x8_t high = chromaOf(vsubl_u8(vget_high_u8(colour), vget_high_u8(y)), weight);
-    return veorq_u8(vreinterpretq_u8_s8(vcombine_s8(low, high)), vdupq_n_u8(0x80));
-  }
-  static int8x8_t chromaOf(uint16x8_t difference, int weight) {
-    return vqmovn_s16(vqrdmulhq_n_s16(vreinterpretq_s16_u16(difference), static_cast<int16_t>(2 * weight)));
+  // The rounded product is (2 a b + 2^15) >> 16: with b = 2 weight that is (a weight + 2^13) >> 14. It is
+  // -211 to 211, which saturates to a signed byte; 128 more is the clamped sum.
+  static Bytes chromaOf(Bytes colour, Bytes y, int weight) {
+    const Two<SignedHalves> terms = multiplyRounded(difference(colour, y), static_cast<int16_t>(2 * weight));
+    return (Bytes)narrowSigned(terms) ^ splat<Bytes>(0x80);
   }
 };
 
@@ -103,13 +99,11 @@ struct YCrCbToBgr8 {
   static constexpr int kInFlight = 1;
   static constexpr bool kUniform = true;
 
-  Pixels<unsigned char, 3> vector(const Pixels<unsigned char, 3>& p) const {
-    const int8x16_t cr = centred(p.c[1]);
-    const int8x16_t cb = centred(p.c[2]);
-    const Half low = half(vget_low_u8(p.c[0]), vget_low_s8(cr), vget_low_s8(cb));
-    const Half high = half(vget_high_u8(p.c[0]), vget_high_s8(cr), vget_high_s8(cb));
-    return {{vcombine_u8(low.b, high.b), roundingShiftToBytes<kShift - 8>(low.greenSum, high.greenSum),
-             vcombine_u8(low.r, high.r)}};
+  Pixels<Bytes, 3> vector(const Pixels<Bytes, 3>& p) const {
+    const Bytes y = p.c[0];
+    const SignedBytes cr = centred(p.c[1]);
+    const SignedBytes cb = centred(p.c[2]);
+    return {{blueOrRed(y, cb, kBCb), narrowRounded<kShift - 8>(greenSum(y, cr, cb)), blueOrRed(y, cr, kRCr)}};
   }
 
   void scalar(const unsigned char* in, unsigned char* out) const {
@@ -122,33 +116,20 @@ struct YCrCbToBgr8 {
   }
 
  private:
-  struct Half {
-    uint8x8_t b, r;
-    int16x8_t greenSum;
-  };
+  static SignedBytes centred(Bytes stored) { return (SignedBytes)(stored ^ splat<Bytes>(0x80)); }
 
-  static int8x16_t centred(uint8x16_t stored) {
-    return vreinterpretq_s8_u8(veorq_u8(stored, vdupq_n_u8(0x80)));
-  }
-
-  static Half half(uint8x8_t y, int8x8_t cr, int8x8_t cb) {
-    return {blueOrRed(y, cb, kBCb), blueOrRed(y, cr, kRCr), greenSum(y, cr, cb)};
-  }
-
-  // vqrdmulh gives (2 a b + 2^15) >> 16: with a = 2 chroma that is (chroma b + 2^13) >> 14.
-  static uint8x8_t blueOrRed(uint8x8_t y, int8x8_t chroma, int weight) {
-    const int16x8_t term = vqrdmulhq_n_s16(vshll_n_s8(chroma, 1), static_cast<int16_t>(weight));
-    return vqmovun_s16(vreinterpretq_s16_u16(vaddw_u8(vreinterpretq_u16_s16(term), y)));
+  // The rounded product is (2 a b + 2^15) >> 16: with a = 2 chroma that is (chroma b + 2^13) >> 14.
+  static Bytes blueOrRed(Bytes y, SignedBytes chroma, int weight) {
+    return narrow(add(multiplyRounded(widenShifted<1>(chroma), static_cast<int16_t>(weight)), y));
   }
 
   // Green's two terms are rounded together, so their weights are split. Y joins as 64 Y, which leaves the
   // shift by 14 - 8 to round and clamp the whole: 64 * 255 + 68 * 128 + 41 is still a 16-bit number.
-  static int16x8_t greenSum(uint8x8_t y, int8x8_t cr, int8x8_t cb) {
-    const int16x8_t low = vmlal_s8(vmull_s8(cr, vdup_n_s8(lowByte(kGCr))), cb, vdup_n_s8(lowByte(kGCb)));
-    const int16x8_t luma = vreinterpretq_s16_u16(vshll_n_u8(y, kShift - 8));
-    const int16x8_t high =
-        vmlal_s8(vmlal_s8(luma, cr, vdup_n_s8(highByte(kGCr))), cb, vdup_n_s8(highByte(kGCb)));
-    return vsraq_n_s16(high, low, 8);
+  static Two<SignedHalves> greenSum(Bytes y, SignedBytes cr, SignedBytes cb) {
+    const Two<SignedHalves> low = multiplyAdd(multiply(cr, lowByte(kGCr)), cb, lowByte(kGCb));
+    Two<SignedHalves> high = asSigned(widenShifted<kShift - 8>(y));
+    high = multiplyAdd(multiplyAdd(high, cr, highByte(kGCr)), cb, highByte(kGCb));
+    return addShifted<8>(high, low);
   }
 };
 
@@ -165,12 +146,12 @@ struct BgrToYCrCbFloat {
   static constexpr float kCr = 0.713f, kCb = 0.564f;
   static constexpr float kOffset = 0.5f;
 
-  Pixels<float, 3> vector(const Pixels<float, ncSrc>& p) const {
-    const float32x4_t blueGreen = vfmaq_f32(vmulq_f32(p.c[1], vdupq_n_f32(kYG)), p.c[0], vdupq_n_f32(kYB));
-    const float32x4_t y = vfmaq_f32(blueGreen, p.c[2], vdupq_n_f32(kYR));
-    const float32x4_t offset = vdupq_n_f32(kOffset);
-    return {{y, vfmaq_f32(offset, vsubq_f32(p.c[2], y), vdupq_n_f32(kCr)),
-             vfmaq_f32(offset, vsubq_f32(p.c[0], y), vdupq_n_f32(kCb))}};
+  Pixels<Floats, 3> vector(const Pixels<Floats, ncSrc>& p) const {
+    const Floats blueGreen = multiplyAdd(p.c[1] * splat<Floats>(kYG), p.c[0], splat<Floats>(kYB));
+    const Floats y = multiplyAdd(blueGreen, p.c[2], splat<Floats>(kYR));
+    const Floats offset = splat<Floats>(kOffset);
+    return {{y, multiplyAdd(offset, p.c[2] - y, splat<Floats>(kCr)),
+             multiplyAdd(offset, p.c[0] - y, splat<Floats>(kCb))}};
   }
 
   void scalar(const float* in, float* out) const {
@@ -193,12 +174,12 @@ struct YCrCbToBgrFloat {
   static constexpr float kR = 1.403f, kGCr = -0.714f, kGCb = -0.344f, kB = 1.773f;
   static constexpr float kOffset = 0.5f;
 
-  Pixels<float, 3> vector(const Pixels<float, 3>& p) const {
-    const float32x4_t cr = vsubq_f32(p.c[1], vdupq_n_f32(kOffset));
-    const float32x4_t cb = vsubq_f32(p.c[2], vdupq_n_f32(kOffset));
-    return {{vfmaq_f32(p.c[0], cb, vdupq_n_f32(kB)),
-             vfmaq_f32(vfmaq_f32(p.c[0], cr, vdupq_n_f32(kGCr)), cb, vdupq_n_f32(kGCb)),
-             vfmaq_f32(p.c[0], cr, vdupq_n_f32(kR))}};
+  Pixels<Floats, 3> vector(const Pixels<Floats, 3>& p) const {
+    const Floats cr = p.c[1] - splat<Floats>(kOffset);
+    const Floats cb = p.c[2] - splat<Floats>(kOffset);
+    return {{multiplyAdd(p.c[0], cb, splat<Floats>(kB)),
+             multiplyAdd(multiplyAdd(p.c[0], cr, splat<Floats>(kGCr)), cb, splat<Floats>(kGCb)),
+             multiplyAdd(p.c[0], cr, splat<Floats>(kR))}};
   }
 
   void scalar(const float* in, float* out) const {

@@ -30,10 +30,10 @@ constexpr int kEncodeShift = 7;
 enum class Order { kBGR, kRGB };
 enum class Chroma { kVU, kUV };
 
-// One row pair of an encoding: 16 columns a block.
+// One row pair of an encoding.
 template <int nc, Order order, Chroma chroma>
 struct EncodePair {
-  static constexpr int kBlock = 16;
+  static constexpr int kBlock = kBlockPixels<unsigned char>;
 
   const unsigned char* in0;
   const unsigned char* in1;
@@ -41,20 +41,21 @@ struct EncodePair {
   unsigned char* luma1;
   unsigned char* pairs;
 
-  template <int n>
-  void block(ptrdiff_t x, Blocks<n>) const {
-    inFlight<n>(
-        [&](int i) {
-          const ptrdiff_t at = (x + i * kBlock) * nc;
-          return Rows{loadPixels<nc>(in0 + at), loadPixels<nc>(in1 + at)};
-        },
-        [&](const Rows& rows) { return Planes{lumaOf(rows.top), lumaOf(rows.bottom), chromaOf(rows.top)}; },
-        [&](int i, const Planes& planes) {
-          const ptrdiff_t at = x + i * kBlock;
-          vst1q_u8(luma0 + at, planes.top);
-          vst1q_u8(luma1 + at, planes.bottom);
-          vst2_u8(pairs + at, planes.chromaPairs);
-        });
+  void block(ptrdiff_t x, Blocks<1>) const {
+    const Colours top = loadColours<nc>(in0 + x * nc);
+    const Colours bottom = loadColours<nc>(in1 + x * nc);
+    // The weights sum to 128, so the sum is at most 32640 and the rounded luma needs no clamp.
+    const Bytes luma[] = {narrowRounded<kEncodeShift>(weighed<weightsOf(kYB, kYG, kYR)>(top)),
+                          narrowRounded<kEncodeShift>(weighed<weightsOf(kYB, kYG, kYR)>(bottom))};
+    // The weighted sum is at most 67 * 255 = 17085 in magnitude.
+    const EvenColours even = evenColumns(top);
+    const Halves u = weighed<weightsOf(kUB, kUG, kUR)>(even);
+    const Halves v = weighed<weightsOf(kVB, kVG, kVR)>(even);
+    const BytePairs both =
+        chroma == Chroma::kVU ? centredPairs<kEncodeShift>(v, u) : centredPairs<kEncodeShift>(u, v);
+    store(luma0 + x, luma[0]);
+    store(luma1 + x, luma[1]);
+    storePairs(pairs + x, both);
   }
 
   void step(ptrdiff_t x) const {
@@ -73,57 +74,13 @@ struct EncodePair {
   static constexpr int kBlue = order == Order::kBGR ? 0 : 2;
   static constexpr int kRed = 2 - kBlue;
 
-  struct Rows {
-    Pixels<unsigned char, nc> top;
-    Pixels<unsigned char, nc> bottom;
-  };
-  struct Planes {
-    uint8x16_t top;
-    uint8x16_t bottom;
-    uint8x8x2_t chromaPairs;
-  };
-
-  // The weights sum to 128, so the sum is at most 32640 and the rounded luma needs no clamp.
-  static uint8x16_t lumaOf(const Pixels<unsigned char, nc>& p) {
-    const uint8x16_t wb = vdupq_n_u8(kYB);
-    const uint8x16_t wg = vdupq_n_u8(kYG);
-    const uint8x16_t wr = vdupq_n_u8(kYR);
-    uint16x8_t low = vmull_u8(vget_low_u8(p.c[kBlue]), vget_low_u8(wb));
-    low = vmlal_u8(low, vget_low_u8(p.c[1]), vget_low_u8(wg));
-    low = vmlal_u8(low, vget_low_u8(p.c[kRed]), vget_low_u8(wr));
-    uint16x8_t high = vmull_high_u8(p.c[kBlue], wb);
-    high = vmlal_high_u8(high, p.c[1], wg);
-    high = vmlal_high_u8(high, p.c[kRed], wr);
-    return roundingShiftToBytes<kEncodeShift>(low, high);
+  static constexpr Weights weightsOf(int blue, int green, int red) {
+    return order == Order::kBGR ? Weights{blue, green, red} : Weights{red, green, blue};
   }
 
   static unsigned char lumaOf(const unsigned char* p) {
     constexpr int kHalf = 1 << (kEncodeShift - 1);
     return static_cast<unsigned char>((kYB * p[kBlue] + kYG * p[1] + kYR * p[kRed] + kHalf) >> kEncodeShift);
-  }
-
-  // The bytes of the even columns.
-  static uint8x8_t evenColumns(uint8x16_t v) { return vmovn_u16(vreinterpretq_u16_u8(v)); }
-
-  // The weighted sum, at most 67 * 255 = 17085 in magnitude, is rounded, shifted and saturated to a signed
-  // byte; 128 more, that is the stored byte, clamped on both sides.
-  static uint8x8_t chromaOf(int16x8_t sum) {
-    return veor_u8(vreinterpret_u8_s8(vqrshrn_n_s16(sum, kEncodeShift)), vdup_n_u8(0x80));
-  }
-
-  static uint8x8x2_t chromaOf(const Pixels<unsigned char, nc>& top) {
-    const uint8x8_t b = evenColumns(top.c[kBlue]);
-    const uint8x8_t g = evenColumns(top.c[1]);
-    const uint8x8_t r = evenColumns(top.c[kRed]);
-    uint16x8_t u = vmull_u8(b, vdup_n_u8(kUB));
-    u = vmlsl_u8(u, g, vdup_n_u8(-kUG));
-    u = vmlsl_u8(u, r, vdup_n_u8(-kUR));
-    uint16x8_t v = vmull_u8(r, vdup_n_u8(kVR));
-    v = vmlsl_u8(v, g, vdup_n_u8(-kVG));
-    v = vmlsl_u8(v, b, vdup_n_u8(-kVB));
-    const uint8x8_t u8 = chromaOf(vreinterpretq_s16_u16(u));
-    const uint8x8_t v8 = chromaOf(vreinterpretq_s16_u16(v));
-    return chroma == Chroma::kVU ? uint8x8x2_t{{v8, u8}} : uint8x8x2_t{{u8, v8}};
   }
 
   static unsigned char chromaOf(const unsigned char* p, int wb, int wg, int wr) {

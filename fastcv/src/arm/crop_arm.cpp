@@ -115,6 +115,7 @@ void scaleImage(float ratio, ptrdiff_t height, ptrdiff_t width, ptrdiff_t inStri
 // ---- float samples
 
 struct ScaleFloats {
+  using Vector = float32x4_t;
   using Src = float;
   using Dst = float;
   static constexpr int kSrcChannels = 1;
@@ -124,7 +125,9 @@ struct ScaleFloats {
 
   float ratio;
 
-  Pixels<float, 1> vector(const Pixels<float, 1>& v) const { return {{vmulq_n_f32(v.c[0], ratio)}}; }
+  Pixels<float32x4_t, 1> vector(const Pixels<float32x4_t, 1>& v) const {
+    return {{vmulq_n_f32(v.c[0], ratio)}};
+  }
   void scalar(const float* in, float* out) const { *out = *in * ratio; }
 };
 

@@ -8,9 +8,11 @@
 
 #include <algorithm>
 #include <cstddef>
+#include <cstring>
 #include <type_traits>
 #include <utility>
 
+#include "simd/neon.h"
 #include "simd/overlap.h"
 #include "simd/pixel.h"
 
@@ -89,11 +91,43 @@ inline void forget(V& value) {
 #else
 #define KERNEL_VECTOR_REGISTER "+x"
 #endif
+inline void forget(Bytes& value) { asm("" : KERNEL_VECTOR_REGISTER(value)); }
+inline void forget(Floats& value) { asm("" : KERNEL_VECTOR_REGISTER(value)); }
+#if !defined(__ARM_NEON)
 inline void forget(uint8x16_t& value) { asm("" : KERNEL_VECTOR_REGISTER(value)); }
 inline void forget(float32x4_t& value) { asm("" : KERNEL_VECTOR_REGISTER(value)); }
+#endif
 #undef KERNEL_VECTOR_REGISTER
 
 namespace detail {
+
+/// Loads 8 pixels into both halves of a block.
+template <int nc>
+inline Pixels<uint8x16_t, nc> loadHalf(const unsigned char* p) {
+  static_assert(nc == 3 || nc == 4);
+  const auto twice = [](uint8x8_t v) { return vcombine_u8(v, v); };
+  if constexpr (nc == 3) {
+    const uint8x8x3_t v = vld3_u8(p);
+    return {{twice(v.val[0]), twice(v.val[1]), twice(v.val[2])}};
+  } else {
+    const uint8x8x4_t v = vld4_u8(p);
+    return {{twice(v.val[0]), twice(v.val[1]), twice(v.val[2]), twice(v.val[3])}};
+  }
+}
+
+/// Stores the first 8 pixels of a block.
+template <int nc>
+inline void storeHalf(unsigned char* p, const Pixels<uint8x16_t, nc>& v) {
+  static_assert(nc == 3 || nc == 4);
+  if constexpr (nc == 3) {
+    const uint8x8x3_t all = {{vget_low_u8(v.c[0]), vget_low_u8(v.c[1]), vget_low_u8(v.c[2])}};
+    vst3_u8(p, all);
+  } else {
+    const uint8x8x4_t all = {
+        {vget_low_u8(v.c[0]), vget_low_u8(v.c[1]), vget_low_u8(v.c[2]), vget_low_u8(v.c[3])}};
+    vst4_u8(p, all);
+  }
+}
 
 /// Where `n` neighbouring blocks of `nc`-channel pixels are, moved on together with every turn of a loop.
 ///
@@ -103,7 +137,7 @@ namespace detail {
 /// on Cortex-A55; a store 5 for 4) than the addition, which goes beside another instruction. Float blocks are
 /// short, there the additions would weigh more. Blocks of one channel share a pointer, as single registers
 /// are loaded and stored with offsets.
-template <typename T, int nc, int n>
+template <typename T, int nc, int n, int block>
 class Cursor {
  public:
   explicit Cursor(T* start) {
@@ -130,13 +164,24 @@ class Cursor {
   }
 
  private:
-  static constexpr int kElements = kBlockPixels<std::remove_const_t<T>> * nc;
+  static constexpr int kElements = block * nc;
   static constexpr int kPointers = nc > 1 ? n : 1;
   // The block that a shared pointer points to: that of the last pair, whose access can then advance it.
   static constexpr int kShared = nc == 1 && n > 1 ? n - 2 : 0;
 
   T* at_[kPointers];
   ptrdiff_t step_ = n * kElements;
+};
+
+/// The register that a kernel works with.
+template <typename Op, typename T>
+struct BlockIn {
+  using Type = BlockOf<T>;
+};
+template <typename Op, typename T>
+  requires requires { typename Op::Vector; }
+struct BlockIn<Op, T> {
+  using Type = typename Op::Vector;
 };
 
 /// One row of a per-pixel kernel.
@@ -151,31 +196,39 @@ class PixelRow {
   [[gnu::noinline]] static void convert(const Op& op, ptrdiff_t length, Tail tail, const Src* src, Dst* dst) {
     const ptrdiff_t turns = length / kTurn;
     convertTurns(op, turns, src, dst);
-    walk<kGroup, 1, 1>(
-        length, tail, [&](ptrdiff_t x, Blocks<1>) { convertGroup(op, src + x * kSrc, dst + x * kDst); },
-        [&](ptrdiff_t x) { op.scalar(src + x * kSrc, dst + x * kDst); }, turns * kTurn);
+    if constexpr (kWide) {
+      convertTail(op, length, turns * kTurn, tail, src, dst);
+    } else {
+      walk<kGroup, 1, 1>(
+          length, tail, [&](ptrdiff_t x, Blocks<1>) { convertGroup(op, src + x * kSrc, dst + x * kDst); },
+          [&](ptrdiff_t x) { op.scalar(src + x * kSrc, dst + x * kDst); }, turns * kTurn);
+    }
   }
 
  private:
   static constexpr int kSrc = Op::kSrcChannels;
   static constexpr int kDst = Op::kDstChannels;
-  static constexpr int kBlock = kBlockPixels<Src>;
+  using SrcBlock = typename BlockIn<Op, Src>::Type;
+  using DstBlock = typename BlockIn<Op, Dst>::Type;
+  static constexpr int kBlock = kLanes<SrcBlock>;
+  // Registers of 32 bytes.
+  static constexpr bool kWide = sizeof(SrcBlock) > 16;
   static constexpr int kGroup = Op::kUniform ? kBlock : 8;
   static constexpr int kInFlight = kBlocksInFlightPay ? Op::kInFlight : std::max(kGroup / kBlock, 1);
   static constexpr int kTurn = kBlock * kInFlight;
-  static_assert(kBlock == kBlockPixels<Dst>);
+  static_assert(kBlock == kLanes<DstBlock>);
   static_assert(kTurn % kGroup == 0);
 
   static void convertTurns(const Op& op, ptrdiff_t turns, const Src* src, Dst* dst) {
     if (turns == 0) {
       return;
     }
-    Cursor<const Src, kSrc, kInFlight> from(src);
-    Cursor<Dst, kDst, kInFlight> to(dst);
+    Cursor<const Src, kSrc, kInFlight, kBlock> from(src);
+    Cursor<Dst, kDst, kInFlight, kBlock> to(dst);
     // An alpha for each block in flight: one register cannot stand behind several blocks' colour registers.
-    VectorOf<Dst> alpha[kInFlight];
-    VectorOf<Dst> opaque = splat(kOpaque<Dst>);
-    for (VectorOf<Dst>& a : alpha) {
+    DstBlock alpha[kInFlight];
+    DstBlock opaque = splat<DstBlock>(kOpaque<Dst>);
+    for (DstBlock& a : alpha) {
       forget(opaque);
       a = opaque;
     }
@@ -187,13 +240,39 @@ class PixelRow {
   }
 
   static void convertGroup(const Op& op, const Src* src, Dst* dst) {
-    if constexpr (kGroup >= kBlock) {
-      const VectorOf<Dst> alpha = splat(kOpaque<Dst>);
+    if constexpr (kWide) {
+      convertBlocks<1>(
+          op, [=](int) { return src; }, [=](int) { return dst; },
+          [](int) { return splat<DstBlock>(kOpaque<Dst>); });
+    } else if constexpr (kGroup >= kBlock) {
+      const DstBlock alpha = splat<DstBlock>(kOpaque<Dst>);
       convertBlocks<kGroup / kBlock>(
           op, [=](int i) { return src + i * (kBlock * kSrc); },
           [=](int i) { return dst + i * (kBlock * kDst); }, [=](int) { return alpha; });
     } else {
-      storeHalf(dst, withAlpha<kDst>(op.vector(loadHalf<kSrc>(src)), splat(kOpaque<Dst>)));
+      storeHalf(dst, withAlpha<kDst>(op.vector(loadHalf<kSrc>(src)), splat<DstBlock>(kOpaque<Dst>)));
+    }
+  }
+
+  // What is less than a block goes through memory of a block's size, as a block.
+  static void convertTail(const Op& op, ptrdiff_t length, ptrdiff_t x, Tail tail, const Src* src, Dst* dst) {
+    if (Op::kUniform && tail == Tail::kOverlap && length >= kBlock) {
+      if (x < length) {
+        convertGroup(op, src + (length - kBlock) * kSrc, dst + (length - kBlock) * kDst);
+      }
+      return;
+    }
+    const ptrdiff_t grouped = Op::kUniform ? length : length / kGroup * kGroup;
+    if (x < grouped) {
+      const auto pixels = static_cast<size_t>(grouped - x);
+      Src in[kBlock * kSrc] = {};
+      Dst out[kBlock * kDst];
+      memcpy(in, src + x * kSrc, pixels * kSrc * sizeof(Src));
+      convertGroup(op, in, out);
+      memcpy(dst + x * kDst, out, pixels * kDst * sizeof(Dst));
+    }
+    for (x = grouped; x < length; ++x) {
+      op.scalar(src + x * kSrc, dst + x * kDst);
     }
   }
 
@@ -201,10 +280,13 @@ class PixelRow {
   static void convertBlocks(const Op& op, const From& from, const To& to, const Alpha& alpha) {
     const auto compute = [&](const auto& block) { return op.vector(block); };
     if constexpr (requires { Op::kPacked; }) {
-      inFlight<n>([&](int i) { return loadPacked(from(i)); }, compute,
+      inFlight<n>([&](int i) { return loadPacked<SrcBlock>(from(i)); }, compute,
                   [&](int i, const auto& block) { storePacked(to(i), block); });
+    } else if constexpr (requires { Op::kWeighs; }) {
+      inFlight<n>([&](int i) { return loadColours<kSrc>(from(i)); }, compute,
+                  [&](int i, const auto& block) { storePixels(to(i), block); });
     } else {
-      inFlight<n>([&](int i) { return loadPixels<kSrc>(from(i)); }, compute,
+      inFlight<n>([&](int i) { return loadPixels<SrcBlock, kSrc>(from(i)); }, compute,
                   [&](int i, const auto& block) { storePixels(to(i), withAlpha<kDst>(block, alpha(i))); });
     }
   }
@@ -218,9 +300,11 @@ class PixelRow {
 /// - `kUniform`: whether `vector` and `scalar` give identical results, so that rows may be joined and the
 ///   last block of a row may overlap its neighbour. Otherwise `vector` does a row's whole groups of 8 pixels
 ///   and `scalar` the rest;
-/// - `vector(Pixels<Src, kSrcChannels>)` giving `Pixels<Dst, kDstChannels>`, for a block; of a destination
+/// - `vector(Pixels<BlockOf<Src>, kSrcChannels>)` giving `Pixels<BlockOf<Dst>, kDstChannels>`, for a block;
+/// of a destination
 ///   with four channels it may give three, then alpha is opaque;
 /// - `scalar(const Src*, Dst*)`, for one pixel;
+/// - `kWeighs`, if `vector` takes Colours;
 /// - `kPacked`, if `vector` takes and gives blocks of 4-channel pixels as they lie in memory, not a channel a
 ///   register.
 /// Strides count elements. Rows are worked on from their starts, each block read before it is written, so

@@ -20,6 +20,46 @@ inline float32x4_t vfmsq_f32(float32x4_t a, float32x4_t b, float32x4_t c) { retu
 
 namespace HPC::fastcv::arm {
 
+#if !defined(__ARM_NEON)
+// Blocks of 16 bytes, for the kernels that are still written in intrinsics.
+inline void load(const unsigned char* p, uint8x16_t& v) { v = vld1q_u8(p); }
+inline void load(const float* p, float32x4_t& v) { v = vld1q_f32(p); }
+inline void store(unsigned char* p, uint8x16_t v) { vst1q_u8(p, v); }
+inline void store(float* p, float32x4_t v) { vst1q_f32(p, v); }
+inline void loadChannels(const unsigned char* p, uint8x16_t (&c)[3]) {
+  const uint8x16x3_t v = vld3q_u8(p);
+  c[0] = v.val[0], c[1] = v.val[1], c[2] = v.val[2];
+}
+inline void loadChannels(const unsigned char* p, uint8x16_t (&c)[4]) {
+  const uint8x16x4_t v = vld4q_u8(p);
+  c[0] = v.val[0], c[1] = v.val[1], c[2] = v.val[2], c[3] = v.val[3];
+}
+inline void loadChannels(const float* p, float32x4_t (&c)[3]) {
+  const float32x4x3_t v = vld3q_f32(p);
+  c[0] = v.val[0], c[1] = v.val[1], c[2] = v.val[2];
+}
+inline void loadChannels(const float* p, float32x4_t (&c)[4]) {
+  const float32x4x4_t v = vld4q_f32(p);
+  c[0] = v.val[0], c[1] = v.val[1], c[2] = v.val[2], c[3] = v.val[3];
+}
+inline void storeChannels(unsigned char* p, const uint8x16_t (&c)[3]) {
+  const uint8x16x3_t v = {{c[0], c[1], c[2]}};
+  vst3q_u8(p, v);
+}
+inline void storeChannels(unsigned char* p, const uint8x16_t (&c)[4]) {
+  const uint8x16x4_t v = {{c[0], c[1], c[2], c[3]}};
+  vst4q_u8(p, v);
+}
+inline void storeChannels(float* p, const float32x4_t (&c)[3]) {
+  const float32x4x3_t v = {{c[0], c[1], c[2]}};
+  vst3q_f32(p, v);
+}
+inline void storeChannels(float* p, const float32x4_t (&c)[4]) {
+  const float32x4x4_t v = {{c[0], c[1], c[2], c[3]}};
+  vst4q_f32(p, v);
+}
+#endif
+
 /// Two vectors narrowed into one: (x + 2^(n-1)) >> n of each lane, limited to a byte.
 template <int n>
 inline uint8x16_t roundingShiftToBytes(int16x8_t low, int16x8_t high) {

@@ -108,12 +108,12 @@ inline uint8x16_t addTerm(uint8x16_t luma, const ChromaTerm& term) {
 /// 16 pixels of their luma and their terms. The first channel is the first sample's colour; with `swapped`
 /// the second's.
 template <bool swapped>
-inline Pixels<unsigned char, 3> decodedPixels(uint8x16_t luma, const ChromaTerms& terms) {
+inline Pixels<uint8x16_t, 3> decodedPixels(uint8x16_t luma, const ChromaTerms& terms) {
   const uint8x16_t first = addTerm(luma, terms.first);
   const uint8x16_t green = addTerm(luma, terms.green);
   const uint8x16_t second = addTerm(luma, terms.second);
-  return swapped ? Pixels<unsigned char, 3>{{second, green, first}}
-                 : Pixels<unsigned char, 3>{{first, green, second}};
+  return swapped ? Pixels<uint8x16_t, 3>{{second, green, first}}
+                 : Pixels<uint8x16_t, 3>{{first, green, second}};
 }
 
 /// The column pairs of a chroma sample in up to two rows, pixel by pixel. `u` and `v` are the stored bytes.
@@ -162,7 +162,7 @@ class ColourDecoder {
   /// The first samples are V, or U.
   explicit ColourDecoder(bool firstIsV)
       : first_(firstIsV ? kWeightsV : kWeightsU), second_(firstIsV ? kWeightsU : kWeightsV) {
-    uint8x16_t alpha = splat(kOpaque<unsigned char>);
+    uint8x16_t alpha = splat<uint8x16_t>(kOpaque<unsigned char>);
     for (uint8x16_t& ofRow : alpha_) {
       forget(alpha);
       ofRow = alpha;
@@ -189,7 +189,7 @@ class ColourDecoder {
 
   /// An alpha for each row: one register cannot stand behind several colour registers.
   template <int row>
-  TILE_INLINE void store(const Pixels<unsigned char, 3>& pixels, unsigned char*& out, ptrdiff_t step) const {
+  TILE_INLINE void store(const Pixels<uint8x16_t, 3>& pixels, unsigned char*& out, ptrdiff_t step) const {
     storePixels(out, withAlpha<nc>(pixels, alpha_[row]));
     out += step;
     keepInRegister(out);

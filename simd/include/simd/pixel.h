@@ -1,40 +1,43 @@
 // SPDX-FileCopyrightText: the libjni_kyface_api authors
 // SPDX-License-Identifier: Apache-2.0
 /// The pixel vocabulary of the kernels: a block of interleaved pixels in registers, one vector a channel, and
-/// how it is loaded and stored. 8-bit blocks hold 16 pixels, float blocks 4.
+/// how it is loaded and stored.
 #pragma once
 
-#include <type_traits>
-
 #include "simd/neon.h"
+#include "simd/vector.h"
 
 namespace HPC::fastcv::arm {
 
 namespace detail {
 template <typename T>
-struct Vector;
+struct Block;
 template <>
-struct Vector<unsigned char> {
-  using Type = uint8x16_t;
+struct Block<unsigned char> {
+  using Type = Bytes;
 };
 template <>
-struct Vector<float> {
-  using Type = float32x4_t;
+struct Block<float> {
+  using Type = Floats;
 };
 }  // namespace detail
 
-/// One register of `T`: uint8x16_t or float32x4_t.
+/// One register of `T`: Bytes or Floats.
 template <typename T>
-using VectorOf = typename detail::Vector<T>::Type;
+using BlockOf = typename detail::Block<T>::Type;
+
+/// Lanes of a vector.
+template <typename V>
+inline constexpr int kLanes = static_cast<int>(sizeof(V) / sizeof(ElementOf<V>));
 
 /// Pixels in a block of `T`.
 template <typename T>
-inline constexpr int kBlockPixels = 16 / static_cast<int>(sizeof(T));
+inline constexpr int kBlockPixels = kLanes<BlockOf<T>>;
 
 /// A block of pixels: channel `i` of all of them in `c[i]`.
-template <typename T, int nc>
+template <typename V, int nc>
 struct Pixels {
-  VectorOf<T> c[nc];
+  V c[nc];
 };
 
 /// The opaque alpha of an element type.
@@ -43,98 +46,45 @@ inline constexpr T kOpaque = 1;
 template <>
 inline constexpr unsigned char kOpaque<unsigned char> = 255;
 
-inline uint8x16_t splat(unsigned char value) { return vdupq_n_u8(value); }
-inline float32x4_t splat(float value) { return vdupq_n_f32(value); }
-
 /// Loads a block of `nc`-channel pixels.
-template <int nc>
-inline Pixels<unsigned char, nc> loadPixels(const unsigned char* p) {
+template <typename V, int nc>
+inline Pixels<V, nc> loadPixels(const ElementOf<V>* p) {
   static_assert(nc == 1 || nc == 3 || nc == 4);
+  Pixels<V, nc> v;
   if constexpr (nc == 1) {
-    return {{vld1q_u8(p)}};
-  } else if constexpr (nc == 3) {
-    const uint8x16x3_t v = vld3q_u8(p);
-    return {{v.val[0], v.val[1], v.val[2]}};
+    load(p, v.c[0]);
   } else {
-    const uint8x16x4_t v = vld4q_u8(p);
-    return {{v.val[0], v.val[1], v.val[2], v.val[3]}};
+    loadChannels(p, v.c);
   }
-}
-
-template <int nc>
-inline Pixels<float, nc> loadPixels(const float* p) {
-  static_assert(nc == 1 || nc == 3 || nc == 4);
-  if constexpr (nc == 1) {
-    return {{vld1q_f32(p)}};
-  } else if constexpr (nc == 3) {
-    const float32x4x3_t v = vld3q_f32(p);
-    return {{v.val[0], v.val[1], v.val[2]}};
-  } else {
-    const float32x4x4_t v = vld4q_f32(p);
-    return {{v.val[0], v.val[1], v.val[2], v.val[3]}};
-  }
+  return v;
 }
 
 /// Stores a block of pixels, channels interleaved.
-template <int nc>
-inline void storePixels(unsigned char* p, const Pixels<unsigned char, nc>& v) {
+template <typename V, int nc>
+inline void storePixels(ElementOf<V>* p, const Pixels<V, nc>& v) {
   static_assert(nc == 1 || nc == 3 || nc == 4);
   if constexpr (nc == 1) {
-    vst1q_u8(p, v.c[0]);
-  } else if constexpr (nc == 3) {
-    const uint8x16x3_t all = {{v.c[0], v.c[1], v.c[2]}};
-    vst3q_u8(p, all);
+    store(p, v.c[0]);
   } else {
-    const uint8x16x4_t all = {{v.c[0], v.c[1], v.c[2], v.c[3]}};
-    vst4q_u8(p, all);
+    storeChannels(p, v.c);
   }
 }
 
-template <int nc>
-inline void storePixels(float* p, const Pixels<float, nc>& v) {
-  static_assert(nc == 1 || nc == 3 || nc == 4);
-  if constexpr (nc == 1) {
-    vst1q_f32(p, v.c[0]);
-  } else if constexpr (nc == 3) {
-    const float32x4x3_t all = {{v.c[0], v.c[1], v.c[2]}};
-    vst3q_f32(p, all);
-  } else {
-    const float32x4x4_t all = {{v.c[0], v.c[1], v.c[2], v.c[3]}};
-    vst4q_f32(p, all);
-  }
+/// Four registers of 4-channel pixels as they lie in memory.
+template <typename V>
+inline Pixels<V, 4> loadPacked(const ElementOf<V>* p) {
+  Pixels<V, 4> v;
+  loadRow(p, v.c);
+  return v;
 }
-
-/// Loads 8 pixels into both halves of a block.
-template <int nc>
-inline Pixels<unsigned char, nc> loadHalf(const unsigned char* p) {
-  static_assert(nc == 3 || nc == 4);
-  const auto twice = [](uint8x8_t v) { return vcombine_u8(v, v); };
-  if constexpr (nc == 3) {
-    const uint8x8x3_t v = vld3_u8(p);
-    return {{twice(v.val[0]), twice(v.val[1]), twice(v.val[2])}};
-  } else {
-    const uint8x8x4_t v = vld4_u8(p);
-    return {{twice(v.val[0]), twice(v.val[1]), twice(v.val[2]), twice(v.val[3])}};
-  }
-}
-
-/// Stores the first 8 pixels of a block.
-template <int nc>
-inline void storeHalf(unsigned char* p, const Pixels<unsigned char, nc>& v) {
-  static_assert(nc == 3 || nc == 4);
-  if constexpr (nc == 3) {
-    const uint8x8x3_t all = {{vget_low_u8(v.c[0]), vget_low_u8(v.c[1]), vget_low_u8(v.c[2])}};
-    vst3_u8(p, all);
-  } else {
-    const uint8x8x4_t all = {
-        {vget_low_u8(v.c[0]), vget_low_u8(v.c[1]), vget_low_u8(v.c[2]), vget_low_u8(v.c[3])}};
-    vst4_u8(p, all);
-  }
+template <typename V>
+inline void storePacked(ElementOf<V>* p, const Pixels<V, 4>& v) {
+  storeRow(p, v.c);
 }
 
 /// A block with `nc` channels: `v` itself, or its three channels and `alpha`.
-template <int nc, typename T, int channels>
-inline Pixels<T, nc> withAlpha(const Pixels<T, channels>& v, VectorOf<T> alpha) {
+template <int nc, typename V, int channels>
+inline Pixels<V, nc> withAlpha(const Pixels<V, channels>& v, V alpha) {
   if constexpr (nc == channels) {
     return v;
   } else {
@@ -144,34 +94,14 @@ inline Pixels<T, nc> withAlpha(const Pixels<T, channels>& v, VectorOf<T> alpha) 
 }
 
 /// A block of three channels, with an opaque fourth where `nc` is 4.
-template <int nc, typename T>
-inline Pixels<T, nc> pixelsOf(VectorOf<T> c0, VectorOf<T> c1, VectorOf<T> c2) {
+template <int nc, typename V>
+inline Pixels<V, nc> pixelsOf(V c0, V c1, V c2) {
   static_assert(nc == 3 || nc == 4);
   if constexpr (nc == 4) {
-    return {{c0, c1, c2, splat(kOpaque<T>)}};
+    return {{c0, c1, c2, splat<V>(kOpaque<ElementOf<V>>)}};
   } else {
     return {{c0, c1, c2}};
   }
-}
-
-/// Loads a block of 4-channel pixels as it lies in memory, 16 bytes a register.
-inline Pixels<unsigned char, 4> loadPacked(const unsigned char* p) {
-  const uint8x16x4_t v = vld1q_u8_x4(p);
-  return {{v.val[0], v.val[1], v.val[2], v.val[3]}};
-}
-inline Pixels<float, 4> loadPacked(const float* p) {
-  const float32x4x4_t v = vld1q_f32_x4(p);
-  return {{v.val[0], v.val[1], v.val[2], v.val[3]}};
-}
-
-/// Stores what `loadPacked` loads.
-inline void storePacked(unsigned char* p, const Pixels<unsigned char, 4>& v) {
-  const uint8x16x4_t all = {{v.c[0], v.c[1], v.c[2], v.c[3]}};
-  vst1q_u8_x4(p, all);
-}
-inline void storePacked(float* p, const Pixels<float, 4>& v) {
-  const float32x4x4_t all = {{v.c[0], v.c[1], v.c[2], v.c[3]}};
-  vst1q_f32_x4(p, all);
 }
 
 /// Writes one pixel from three channels, with an opaque fourth where `nc` is 4.

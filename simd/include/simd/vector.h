@@ -1,0 +1,42 @@
+// SPDX-FileCopyrightText: the libjni_kyface_api authors
+// SPDX-License-Identifier: Apache-2.0
+/// The words that kernels are written in. A block is what one register of bytes, or of floats, holds of each
+/// channel: 16 pixels of bytes on Arm, 32 on x86-64, a quarter of that of floats.
+///
+/// Bytes that are widened come as `Two` registers, and are narrowed from two. Which pixels are in the lower
+/// and which in the higher one is not said, but the same for all words: on Arm it is the first and the second
+/// half of the block, on x86-64 that of each half of the register, where AVX2 neither widens nor narrows
+/// across. A kernel that does not ask for places needs none.
+///
+/// Besides the words here, the operators of the language work on vectors lane by lane: + - * & | ^ ~, shifts
+/// by a constant, and comparisons, whose result is a mask for `select`.
+#pragma once
+
+#include <type_traits>
+#include <utility>
+
+namespace HPC::fastcv::arm {
+
+/// What a vector's lanes are.
+template <typename V>
+using ElementOf = std::remove_cvref_t<decltype(std::declval<V&>()[0])>;
+
+/// Two registers: what a block of bytes is widened to.
+template <typename V>
+struct Two {
+  V low;
+  V high;
+};
+
+/// Factors of the first three channels of a pixel.
+struct Weights {
+  int c0, c1, c2;
+};
+
+}  // namespace HPC::fastcv::arm
+
+#if defined(__ARM_NEON)
+#include "simd/vector_arm.h"
+#else
+#include "simd/vector_x86.h"
+#endif

@@ -1,0 +1,274 @@
+// SPDX-FileCopyrightText: the libjni_kyface_api authors
+// SPDX-License-Identifier: Apache-2.0
+/// The words of vector.h on Arm: one instruction each, or one for each of two registers.
+#pragma once
+
+#include <arm_neon.h>
+
+#include <cstddef>
+#include <cstdint>
+
+namespace HPC::fastcv::arm {
+
+using Bytes = uint8x16_t;
+using SignedBytes = int8x16_t;
+using Halves = uint16x8_t;
+using SignedHalves = int16x8_t;
+using Words = uint32x4_t;
+using SignedWords = int32x4_t;
+using Floats = float32x4_t;
+
+// ---- made, loaded and stored
+
+template <typename V>
+inline V splat(ElementOf<V> value) {
+  if constexpr (std::is_same_v<V, Bytes>) {
+    return vdupq_n_u8(value);
+  } else if constexpr (std::is_same_v<V, SignedBytes>) {
+    return vdupq_n_s8(value);
+  } else if constexpr (std::is_same_v<V, Halves>) {
+    return vdupq_n_u16(value);
+  } else if constexpr (std::is_same_v<V, SignedHalves>) {
+    return vdupq_n_s16(value);
+  } else if constexpr (std::is_same_v<V, Words>) {
+    return vdupq_n_u32(value);
+  } else if constexpr (std::is_same_v<V, SignedWords>) {
+    return vdupq_n_s32(value);
+  } else {
+    return vdupq_n_f32(value);
+  }
+}
+
+inline Bytes load(const unsigned char* p) { return vld1q_u8(p); }
+inline Floats load(const float* p) { return vld1q_f32(p); }
+inline void load(const unsigned char* p, Bytes& v) { v = vld1q_u8(p); }
+inline void load(const float* p, Floats& v) { v = vld1q_f32(p); }
+inline void store(unsigned char* p, Bytes v) { vst1q_u8(p, v); }
+inline void store(float* p, Floats v) { vst1q_f32(p, v); }
+
+inline void loadChannels(const unsigned char* p, Bytes (&c)[3]) {
+  const uint8x16x3_t v = vld3q_u8(p);
+  c[0] = v.val[0], c[1] = v.val[1], c[2] = v.val[2];
+}
+inline void loadChannels(const unsigned char* p, Bytes (&c)[4]) {
+  const uint8x16x4_t v = vld4q_u8(p);
+  c[0] = v.val[0], c[1] = v.val[1], c[2] = v.val[2], c[3] = v.val[3];
+}
+inline void loadChannels(const float* p, Floats (&c)[3]) {
+  const float32x4x3_t v = vld3q_f32(p);
+  c[0] = v.val[0], c[1] = v.val[1], c[2] = v.val[2];
+}
+inline void loadChannels(const float* p, Floats (&c)[4]) {
+  const float32x4x4_t v = vld4q_f32(p);
+  c[0] = v.val[0], c[1] = v.val[1], c[2] = v.val[2], c[3] = v.val[3];
+}
+inline void storeChannels(unsigned char* p, const Bytes (&c)[3]) {
+  const uint8x16x3_t all = {{c[0], c[1], c[2]}};
+  vst3q_u8(p, all);
+}
+inline void storeChannels(unsigned char* p, const Bytes (&c)[4]) {
+  const uint8x16x4_t all = {{c[0], c[1], c[2], c[3]}};
+  vst4q_u8(p, all);
+}
+inline void storeChannels(float* p, const Floats (&c)[3]) {
+  const float32x4x3_t all = {{c[0], c[1], c[2]}};
+  vst3q_f32(p, all);
+}
+inline void storeChannels(float* p, const Floats (&c)[4]) {
+  const float32x4x4_t all = {{c[0], c[1], c[2], c[3]}};
+  vst4q_f32(p, all);
+}
+
+/// Four registers as they lie in memory.
+inline void loadRow(const unsigned char* p, Bytes (&v)[4]) {
+  const uint8x16x4_t all = vld1q_u8_x4(p);
+  v[0] = all.val[0], v[1] = all.val[1], v[2] = all.val[2], v[3] = all.val[3];
+}
+inline void loadRow(const float* p, Floats (&v)[4]) {
+  const float32x4x4_t all = vld1q_f32_x4(p);
+  v[0] = all.val[0], v[1] = all.val[1], v[2] = all.val[2], v[3] = all.val[3];
+}
+inline void storeRow(unsigned char* p, const Bytes (&v)[4]) {
+  const uint8x16x4_t all = {{v[0], v[1], v[2], v[3]}};
+  vst1q_u8_x4(p, all);
+}
+inline void storeRow(float* p, const Floats (&v)[4]) {
+  const float32x4x4_t all = {{v[0], v[1], v[2], v[3]}};
+  vst1q_f32_x4(p, all);
+}
+
+// ---- lanes
+
+inline Bytes min(Bytes a, Bytes b) { return vminq_u8(a, b); }
+inline Bytes max(Bytes a, Bytes b) { return vmaxq_u8(a, b); }
+inline Floats min(Floats a, Floats b) { return vminq_f32(a, b); }
+inline Floats max(Floats a, Floats b) { return vmaxq_f32(a, b); }
+
+/// `a` where the mask is set, `b` elsewhere.
+template <typename Mask>
+inline Bytes select(Mask mask, Bytes a, Bytes b) {
+  return vbslq_u8((Bytes)mask, a, b);
+}
+template <typename Mask>
+inline Floats select(Mask mask, Floats a, Floats b) {
+  return vbslq_f32((Words)mask, a, b);
+}
+/// `a` where the mask is set, 0 elsewhere.
+template <typename Mask>
+inline Floats masked(Mask mask, Floats a) {
+  return (Floats)((Words)mask & (Words)a);
+}
+
+inline Bytes addSaturated(Bytes a, Bytes b) { return vqaddq_u8(a, b); }
+inline Bytes subtractSaturated(Bytes a, Bytes b) { return vqsubq_u8(a, b); }
+
+/// c + a b, rounded once.
+inline Floats multiplyAdd(Floats c, Floats a, Floats b) { return vfmaq_f32(c, a, b); }
+/// |a - b|
+inline Floats distance(Floats a, Floats b) { return vabdq_f32(a, b); }
+
+/// Bytes of each 16 of a block, by the 16 places in `order`.
+inline Bytes shuffled(Bytes v, const unsigned char (&order)[16]) { return vqtbl1q_u8(v, vld1q_u8(order)); }
+
+// ---- widening
+
+inline Two<Halves> widen(Bytes a) { return {vmovl_u8(vget_low_u8(a)), vmovl_high_u8(a)}; }
+template <int n>
+inline Two<Halves> widenShifted(Bytes a) {
+  return {vshll_n_u8(vget_low_u8(a), n), vshll_high_n_u8(a, n)};
+}
+template <int n>
+inline Two<SignedHalves> widenShifted(SignedBytes a) {
+  return {vshll_n_s8(vget_low_s8(a), n), vshll_high_n_s8(a, n)};
+}
+inline Two<SignedHalves> difference(Bytes a, Bytes b) {
+  return {vreinterpretq_s16_u16(vsubl_u8(vget_low_u8(a), vget_low_u8(b))),
+          vreinterpretq_s16_u16(vsubl_high_u8(a, b))};
+}
+inline Two<Halves> add(const Two<Halves>& a, Bytes b) {
+  return {vaddw_u8(a.low, vget_low_u8(b)), vaddw_high_u8(a.high, b)};
+}
+inline Two<SignedHalves> add(const Two<SignedHalves>& a, Bytes b) {
+  return {vreinterpretq_s16_u16(vaddw_u8(vreinterpretq_u16_s16(a.low), vget_low_u8(b))),
+          vreinterpretq_s16_u16(vaddw_high_u8(vreinterpretq_u16_s16(a.high), b))};
+}
+
+inline Two<Halves> multiply(Bytes a, unsigned char weight) {
+  return {vmull_u8(vget_low_u8(a), vdup_n_u8(weight)), vmull_high_u8(a, vdupq_n_u8(weight))};
+}
+inline Two<Halves> multiplyAdd(const Two<Halves>& sum, Bytes a, unsigned char weight) {
+  return {vmlal_u8(sum.low, vget_low_u8(a), vdup_n_u8(weight)),
+          vmlal_high_u8(sum.high, a, vdupq_n_u8(weight))};
+}
+inline Two<SignedHalves> multiply(SignedBytes a, signed char weight) {
+  return {vmull_s8(vget_low_s8(a), vdup_n_s8(weight)), vmull_high_s8(a, vdupq_n_s8(weight))};
+}
+inline Two<SignedHalves> multiplyAdd(const Two<SignedHalves>& sum, SignedBytes a, signed char weight) {
+  return {vmlal_s8(sum.low, vget_low_s8(a), vdup_n_s8(weight)),
+          vmlal_high_s8(sum.high, a, vdupq_n_s8(weight))};
+}
+
+// ---- in 16 bits
+
+inline Two<SignedHalves> asSigned(const Two<Halves>& a) {
+  return {vreinterpretq_s16_u16(a.low), vreinterpretq_s16_u16(a.high)};
+}
+/// a + (b >> n)
+template <int n>
+inline Two<Halves> addShifted(const Two<Halves>& a, const Two<Halves>& b) {
+  return {vsraq_n_u16(a.low, b.low, n), vsraq_n_u16(a.high, b.high, n)};
+}
+template <int n>
+inline Two<SignedHalves> addShifted(const Two<SignedHalves>& a, const Two<SignedHalves>& b) {
+  return {vsraq_n_s16(a.low, b.low, n), vsraq_n_s16(a.high, b.high, n)};
+}
+/// (2 a weight + 2^15) >> 16
+inline Two<SignedHalves> multiplyRounded(const Two<SignedHalves>& a, int16_t weight) {
+  return {vqrdmulhq_n_s16(a.low, weight), vqrdmulhq_n_s16(a.high, weight)};
+}
+
+// ---- narrowing
+
+/// (a + 2^(n-1)) >> n, limited to a byte.
+template <int n>
+inline Bytes narrowRounded(const Two<SignedHalves>& a) {
+  return vqrshrun_high_n_s16(vqrshrun_n_s16(a.low, n), a.high, n);
+}
+/// The same of unsigned lanes that need no limit: a + 2^(n-1) is less than 2^16, and the result a byte.
+template <int n>
+inline Bytes narrowRounded(const Two<Halves>& a) {
+  return vrshrn_high_n_u16(vrshrn_n_u16(a.low, n), a.high, n);
+}
+/// Limited to a byte, and to a signed one.
+inline Bytes narrow(const Two<SignedHalves>& a) { return vqmovun_high_s16(vqmovun_s16(a.low), a.high); }
+inline SignedBytes narrowSigned(const Two<SignedHalves>& a) {
+  return vqmovn_high_s16(vqmovn_s16(a.low), a.high);
+}
+
+// ---- weighed pixels
+
+/// The first three channels of a block of pixels, in the form in which they are best weighed: here a register
+/// each.
+struct Colours {
+  Bytes c[3];
+};
+/// Those of every second pixel, from the first on.
+struct EvenColours {
+  uint8x8_t c[3];
+};
+
+template <int nc>
+inline Colours loadColours(const unsigned char* p) {
+  Bytes v[nc];
+  loadChannels(p, v);
+  return {{v[0], v[1], v[2]}};
+}
+inline EvenColours evenColumns(const Colours& v) {
+  const auto even = [](Bytes channel) { return vmovn_u16(vreinterpretq_u16_u8(channel)); };
+  return {{even(v.c[0]), even(v.c[1]), even(v.c[2])}};
+}
+
+namespace detail {
+template <int weight>
+inline Halves addWeighed(Halves sum, uint8x8_t v) {
+  return weight < 0 ? vmlsl_u8(sum, v, vdup_n_u8(-weight)) : vmlal_u8(sum, v, vdup_n_u8(weight));
+}
+template <int weight>
+inline Halves addWeighedHigh(Halves sum, Bytes v) {
+  return weight < 0 ? vmlsl_high_u8(sum, v, vdupq_n_u8(-weight)) : vmlal_high_u8(sum, v, vdupq_n_u8(weight));
+}
+// The channel to begin with, whose weight is not negative.
+constexpr int firstOf(Weights w) { return w.c0 >= 0 ? 0 : w.c1 >= 0 ? 1 : 2; }
+constexpr int weightOf(Weights w, int channel) { return channel == 0 ? w.c0 : channel == 1 ? w.c1 : w.c2; }
+}  // namespace detail
+
+/// w.c0 c0 + w.c1 c1 + w.c2 c2 in 16 bits, signed or unsigned; at least one weight is not negative.
+template <Weights w>
+inline Halves weighed(const EvenColours& v) {
+  constexpr int kFirst = detail::firstOf(w), kSecond = (kFirst + 1) % 3, kThird = (kFirst + 2) % 3;
+  const Halves sum = vmull_u8(v.c[kFirst], vdup_n_u8(detail::weightOf(w, kFirst)));
+  return detail::addWeighed<detail::weightOf(w, kThird)>(
+      detail::addWeighed<detail::weightOf(w, kSecond)>(sum, v.c[kSecond]), v.c[kThird]);
+}
+template <Weights w>
+inline Two<Halves> weighed(const Colours& v) {
+  constexpr int kFirst = detail::firstOf(w), kSecond = (kFirst + 1) % 3, kThird = (kFirst + 2) % 3;
+  const EvenColours low = {{vget_low_u8(v.c[0]), vget_low_u8(v.c[1]), vget_low_u8(v.c[2])}};
+  const Halves high = vmull_high_u8(v.c[kFirst], vdupq_n_u8(detail::weightOf(w, kFirst)));
+  return {weighed<w>(low),
+          detail::addWeighedHigh<detail::weightOf(w, kThird)>(
+              detail::addWeighedHigh<detail::weightOf(w, kSecond)>(high, v.c[kSecond]), v.c[kThird])};
+}
+
+/// 128 + ((a + 2^(n-1)) >> n), limited to a byte, of each signed lane of two registers, in turn.
+using BytePairs = uint8x8x2_t;
+template <int n>
+inline BytePairs centredPairs(Halves first, Halves second) {
+  const auto centred = [](Halves v) {
+    return veor_u8(vreinterpret_u8_s8(vqrshrn_n_s16(vreinterpretq_s16_u16(v), n)), vdup_n_u8(0x80));
+  };
+  return {{centred(first), centred(second)}};
+}
+inline void storePairs(unsigned char* p, const BytePairs& v) { vst2_u8(p, v); }
+
+}  // namespace HPC::fastcv::arm

@@ -1,0 +1,454 @@
+// SPDX-FileCopyrightText: the libjni_kyface_api authors
+// SPDX-License-Identifier: Apache-2.0
+/// The words of vector.h on x86-64, in registers of 32 bytes. What widens, narrows or shuffles does so in
+/// each half of a register. Pixels are loaded half a block to each half of a register, so that their lanes
+/// are in the order of memory and nothing has to cross.
+#pragma once
+
+#include <immintrin.h>
+
+#include <array>
+#include <bit>
+#include <cstddef>
+#include <cstdint>
+#include <cstring>
+
+namespace HPC::fastcv::arm {
+
+typedef uint8_t Bytes __attribute__((vector_size(32)));
+typedef int8_t SignedBytes __attribute__((vector_size(32)));
+typedef uint16_t Halves __attribute__((vector_size(32)));
+typedef int16_t SignedHalves __attribute__((vector_size(32)));
+typedef uint32_t Words __attribute__((vector_size(32)));
+typedef int32_t SignedWords __attribute__((vector_size(32)));
+typedef float Floats __attribute__((vector_size(32)));
+
+namespace x86 {
+
+// A vector as a register, and back.
+template <typename V>
+inline __m256i m(V v) {
+  return std::bit_cast<__m256i>(v);
+}
+template <typename V>
+inline V as(__m256i v) {
+  return std::bit_cast<V>(v);
+}
+inline __m256 m(Floats v) { return std::bit_cast<__m256>(v); }
+
+// A constant in a register. GCC would make shifts and additions of a product with what it knows.
+inline __m256i kept(__m256i v) {
+#if !defined(__clang__)
+  asm("" : "+x"(v));
+#endif
+  return v;
+}
+
+inline __m128i loadHalf(const void* p) { return _mm_loadu_si128(static_cast<const __m128i*>(p)); }
+// 16 bytes at `low` and 16 at `high`, in the halves of a register.
+inline __m256i loadHalves(const void* low, const void* high) {
+  return _mm256_inserti128_si256(_mm256_castsi128_si256(loadHalf(low)), loadHalf(high), 1);
+}
+inline void storeHalves(void* low, void* high, __m256i v) {
+  _mm_storeu_si128(static_cast<__m128i*>(low), _mm256_castsi256_si128(v));
+  _mm_storeu_si128(static_cast<__m128i*>(high), _mm256_extracti128_si256(v, 1));
+}
+inline void storeWhole(void* p, __m256i v) { _mm256_storeu_si256(static_cast<__m256i*>(p), v); }
+
+// Byte i of a table is f(i); -1 makes a 0 where it is a shuffle.
+struct alignas(16) Table {
+  std::array<int8_t, 16> bytes;
+  __m256i twice() const { return _mm256_broadcastsi128_si256(loadHalf(bytes.data())); }
+};
+template <typename F>
+constexpr Table tableOf(F f) {
+  Table table{};
+  for (int i = 0; i < 16; ++i) {
+    table.bytes[static_cast<size_t>(i)] = static_cast<int8_t>(f(i));
+  }
+  return table;
+}
+
+// Lane i, of `size` bytes, from lane i of v[(start + step * i) % 3].
+template <int size, int start, int step>
+inline __m256i mixed(__m256i v0, __m256i v1, __m256i v2) {
+  static constexpr auto kFrom = [](int i) { return (start + step * (i / size)) % 3; };
+  if constexpr (size == 1) {
+    static constexpr Table kSecond = tableOf([](int i) { return kFrom(i) == 1 ? -1 : 0; });
+    static constexpr Table kThird = tableOf([](int i) { return kFrom(i) == 2 ? -1 : 0; });
+    return _mm256_blendv_epi8(_mm256_blendv_epi8(v0, v1, kSecond.twice()), v2, kThird.twice());
+  } else {
+    static constexpr auto kLanes = [](int from) {
+      int lanes = 0;
+      for (int i = 0; i < 8; ++i) {
+        lanes |= kFrom(i % 4 * size) == from ? 1 << i : 0;
+      }
+      return lanes;
+    };
+    constexpr int kSecond = kLanes(1), kThird = kLanes(2);
+    return _mm256_blend_epi32(_mm256_blend_epi32(v0, v1, kSecond), v2, kThird);
+  }
+}
+
+// Of three registers with pixels of three lanes, channel c: lane (3 p + c) of all is pixel p's. No two pixels
+// have theirs at the same place of their registers, so it is mixed together first, then put in order.
+template <int size, int c>
+inline __m256i channelOfThree(__m256i v0, __m256i v1, __m256i v2) {
+  static constexpr Table kOrder =
+      tableOf([](int i) { return (3 * (i / size) + c) % (16 / size) * size + i % size; });
+  return _mm256_shuffle_epi8(mixed<size, c, 2>(v0, v1, v2), kOrder.twice());
+}
+// The way back: a channel's lanes are put where they belong in their registers, to be mixed. 3 * 11 is 1
+// modulo 4 and modulo 16.
+template <int size, int c>
+inline __m256i placedOfThree(__m256i v) {
+  constexpr int kLanes = 16 / size;
+  static constexpr Table kOrder =
+      tableOf([](int i) { return (i / size + kLanes - c) * 11 % kLanes * size + i % size; });
+  return _mm256_shuffle_epi8(v, kOrder.twice());
+}
+
+template <int size, typename V>
+inline void loadThree(const void* p, V (&c)[3]) {
+  const auto* bytes = static_cast<const uint8_t*>(p);
+  const __m256i v0 = loadHalves(bytes, bytes + 48);
+  const __m256i v1 = loadHalves(bytes + 16, bytes + 64);
+  const __m256i v2 = loadHalves(bytes + 32, bytes + 80);
+  c[0] = as<V>(channelOfThree<size, 0>(v0, v1, v2));
+  c[1] = as<V>(channelOfThree<size, 1>(v0, v1, v2));
+  c[2] = as<V>(channelOfThree<size, 2>(v0, v1, v2));
+}
+template <int size, typename V>
+inline void storeThree(void* p, const V (&c)[3]) {
+  auto* bytes = static_cast<uint8_t*>(p);
+  const __m256i v0 = placedOfThree<size, 0>(std::bit_cast<__m256i>(c[0]));
+  const __m256i v1 = placedOfThree<size, 1>(std::bit_cast<__m256i>(c[1]));
+  const __m256i v2 = placedOfThree<size, 2>(std::bit_cast<__m256i>(c[2]));
+  storeHalves(bytes, bytes + 48, mixed<size, 0, 1>(v0, v1, v2));
+  storeHalves(bytes + 16, bytes + 64, mixed<size, 1, 1>(v0, v1, v2));
+  storeHalves(bytes + 32, bytes + 80, mixed<size, 2, 1>(v0, v1, v2));
+}
+
+// 4 by 4 lanes of 4 bytes, transposed in each half.
+inline void transpose(__m256i (&v)[4]) {
+  const __m256i low01 = _mm256_unpacklo_epi32(v[0], v[1]);
+  const __m256i low23 = _mm256_unpacklo_epi32(v[2], v[3]);
+  const __m256i high01 = _mm256_unpackhi_epi32(v[0], v[1]);
+  const __m256i high23 = _mm256_unpackhi_epi32(v[2], v[3]);
+  v[0] = _mm256_unpacklo_epi64(low01, low23);
+  v[1] = _mm256_unpackhi_epi64(low01, low23);
+  v[2] = _mm256_unpacklo_epi64(high01, high23);
+  v[3] = _mm256_unpackhi_epi64(high01, high23);
+}
+
+// Four registers of which one half block lies behind the other.
+inline void loadFour(const void* p, __m256i (&v)[4]) {
+  const auto* bytes = static_cast<const uint8_t*>(p);
+  for (int i = 0; i < 4; ++i) {
+    v[i] = loadHalves(bytes + 16 * i, bytes + 64 + 16 * i);
+  }
+}
+inline void storeFour(void* p, const __m256i (&v)[4]) {
+  auto* bytes = static_cast<uint8_t*>(p);
+  storeWhole(bytes, _mm256_permute2x128_si256(v[0], v[1], 0x20));
+  storeWhole(bytes + 32, _mm256_permute2x128_si256(v[2], v[3], 0x20));
+  storeWhole(bytes + 64, _mm256_permute2x128_si256(v[0], v[1], 0x31));
+  storeWhole(bytes + 96, _mm256_permute2x128_si256(v[2], v[3], 0x31));
+}
+
+// Products of 16-bit lanes, their lower halves.
+inline __m256i product(__m256i a, int weight) {
+  return _mm256_mullo_epi16(a, kept(_mm256_set1_epi16(static_cast<int16_t>(weight))));
+}
+inline __m256i zero() { return _mm256_setzero_si256(); }
+
+}  // namespace x86
+
+// ---- made, loaded and stored
+
+template <typename V>
+inline V splat(ElementOf<V> value) {
+  return V{} + value;
+}
+
+inline Bytes load(const unsigned char* p) {
+  return x86::as<Bytes>(_mm256_loadu_si256(reinterpret_cast<const __m256i*>(p)));
+}
+inline Floats load(const float* p) { return std::bit_cast<Floats>(_mm256_loadu_ps(p)); }
+inline void load(const unsigned char* p, Bytes& v) { v = load(p); }
+inline void load(const float* p, Floats& v) { v = load(p); }
+inline void store(unsigned char* p, Bytes v) { x86::storeWhole(p, x86::m(v)); }
+inline void store(float* p, Floats v) { _mm256_storeu_ps(p, x86::m(v)); }
+
+inline void loadChannels(const unsigned char* p, Bytes (&c)[3]) { x86::loadThree<1>(p, c); }
+inline void loadChannels(const float* p, Floats (&c)[3]) { x86::loadThree<4>(p, c); }
+inline void loadChannels(const unsigned char* p, Bytes (&c)[4]) {
+  static constexpr x86::Table kSorted = x86::tableOf([](int i) { return i % 4 * 4 + i / 4; });
+  __m256i v[4];
+  x86::loadFour(p, v);
+  for (__m256i& each : v) {
+    each = _mm256_shuffle_epi8(each, kSorted.twice());
+  }
+  x86::transpose(v);
+  for (int i = 0; i < 4; ++i) {
+    c[i] = x86::as<Bytes>(v[i]);
+  }
+}
+inline void loadChannels(const float* p, Floats (&c)[4]) {
+  __m256i v[4];
+  x86::loadFour(p, v);
+  x86::transpose(v);
+  for (int i = 0; i < 4; ++i) {
+    c[i] = x86::as<Floats>(v[i]);
+  }
+}
+inline void storeChannels(unsigned char* p, const Bytes (&c)[3]) { x86::storeThree<1>(p, c); }
+inline void storeChannels(float* p, const Floats (&c)[3]) { x86::storeThree<4>(p, c); }
+inline void storeChannels(unsigned char* p, const Bytes (&c)[4]) {
+  using x86::m;
+  const __m256i low01 = _mm256_unpacklo_epi8(m(c[0]), m(c[1]));
+  const __m256i low23 = _mm256_unpacklo_epi8(m(c[2]), m(c[3]));
+  const __m256i high01 = _mm256_unpackhi_epi8(m(c[0]), m(c[1]));
+  const __m256i high23 = _mm256_unpackhi_epi8(m(c[2]), m(c[3]));
+  x86::storeFour(p, {_mm256_unpacklo_epi16(low01, low23), _mm256_unpackhi_epi16(low01, low23),
+                     _mm256_unpacklo_epi16(high01, high23), _mm256_unpackhi_epi16(high01, high23)});
+}
+inline void storeChannels(float* p, const Floats (&c)[4]) {
+  __m256i v[4];
+  for (int i = 0; i < 4; ++i) {
+    v[i] = std::bit_cast<__m256i>(c[i]);
+  }
+  x86::transpose(v);
+  x86::storeFour(p, v);
+}
+
+/// Four registers as they lie in memory.
+template <typename T, typename V>
+inline void loadRow(const T* p, V (&v)[4]) {
+  for (int i = 0; i < 4; ++i) {
+    v[i] = load(p + i * (32 / static_cast<int>(sizeof(T))));
+  }
+}
+template <typename T, typename V>
+inline void storeRow(T* p, const V (&v)[4]) {
+  for (int i = 0; i < 4; ++i) {
+    store(p + i * (32 / static_cast<int>(sizeof(T))), v[i]);
+  }
+}
+
+// ---- lanes
+
+inline Bytes min(Bytes a, Bytes b) { return x86::as<Bytes>(_mm256_min_epu8(x86::m(a), x86::m(b))); }
+inline Bytes max(Bytes a, Bytes b) { return x86::as<Bytes>(_mm256_max_epu8(x86::m(a), x86::m(b))); }
+
+/// `a` where the mask is set, `b` elsewhere.
+template <typename Mask, typename V>
+inline V select(Mask mask, V a, V b) {
+  return std::bit_cast<V>(
+      _mm256_blendv_epi8(std::bit_cast<__m256i>(b), std::bit_cast<__m256i>(a), std::bit_cast<__m256i>(mask)));
+}
+/// `a` where the mask is set, 0 elsewhere.
+template <typename Mask>
+inline Floats masked(Mask mask, Floats a) {
+  return std::bit_cast<Floats>(std::bit_cast<Words>(mask) & std::bit_cast<Words>(a));
+}
+
+inline Bytes addSaturated(Bytes a, Bytes b) { return x86::as<Bytes>(_mm256_adds_epu8(x86::m(a), x86::m(b))); }
+inline Bytes subtractSaturated(Bytes a, Bytes b) {
+  return x86::as<Bytes>(_mm256_subs_epu8(x86::m(a), x86::m(b)));
+}
+
+/// c + a b, rounded once.
+inline Floats multiplyAdd(Floats c, Floats a, Floats b) {
+  return std::bit_cast<Floats>(_mm256_fmadd_ps(x86::m(a), x86::m(b), x86::m(c)));
+}
+/// |a - b|
+inline Floats distance(Floats a, Floats b) {
+  return std::bit_cast<Floats>(std::bit_cast<Words>(a - b) & 0x7fffffffu);
+}
+
+/// Bytes of each 16 of a block, by the 16 places in `order`.
+inline Bytes shuffled(Bytes v, const unsigned char (&order)[16]) {
+  return x86::as<Bytes>(_mm256_shuffle_epi8(x86::m(v), _mm256_broadcastsi128_si256(x86::loadHalf(order))));
+}
+
+// ---- widening
+
+inline Two<Halves> widen(Bytes a) {
+  return {x86::as<Halves>(_mm256_unpacklo_epi8(x86::m(a), x86::zero())),
+          x86::as<Halves>(_mm256_unpackhi_epi8(x86::m(a), x86::zero()))};
+}
+inline Two<SignedHalves> widen(SignedBytes a) {
+  return {x86::as<SignedHalves>(_mm256_unpacklo_epi8(x86::m(a), x86::m(a))) >> 8,
+          x86::as<SignedHalves>(_mm256_unpackhi_epi8(x86::m(a), x86::m(a))) >> 8};
+}
+template <int n>
+inline Two<Halves> widenShifted(Bytes a) {
+  const Two<Halves> wide = widen(a);
+  return {wide.low << n, wide.high << n};
+}
+template <int n>
+inline Two<SignedHalves> widenShifted(SignedBytes a) {
+  // As the upper bytes, they bring their signs along.
+  return {x86::as<SignedHalves>(_mm256_unpacklo_epi8(x86::zero(), x86::m(a))) >> (8 - n),
+          x86::as<SignedHalves>(_mm256_unpackhi_epi8(x86::zero(), x86::m(a))) >> (8 - n)};
+}
+inline Two<SignedHalves> asSigned(const Two<Halves>& a) {
+  return {std::bit_cast<SignedHalves>(a.low), std::bit_cast<SignedHalves>(a.high)};
+}
+inline Two<SignedHalves> difference(Bytes a, Bytes b) {
+  // Products of neighbours with 1 and -1.
+  const __m256i weights = x86::kept(_mm256_set1_epi16(static_cast<int16_t>(0xff01)));
+  return {x86::as<SignedHalves>(_mm256_maddubs_epi16(_mm256_unpacklo_epi8(x86::m(a), x86::m(b)), weights)),
+          x86::as<SignedHalves>(_mm256_maddubs_epi16(_mm256_unpackhi_epi8(x86::m(a), x86::m(b)), weights))};
+}
+inline Two<Halves> add(const Two<Halves>& a, Bytes b) {
+  const Two<Halves> wide = widen(b);
+  return {a.low + wide.low, a.high + wide.high};
+}
+inline Two<SignedHalves> add(const Two<SignedHalves>& a, Bytes b) {
+  const Two<SignedHalves> wide = asSigned(widen(b));
+  return {a.low + wide.low, a.high + wide.high};
+}
+
+inline Two<Halves> multiply(Bytes a, unsigned char weight) {
+  const Two<Halves> wide = widen(a);
+  return {x86::as<Halves>(x86::product(x86::m(wide.low), weight)),
+          x86::as<Halves>(x86::product(x86::m(wide.high), weight))};
+}
+inline Two<Halves> multiplyAdd(const Two<Halves>& sum, Bytes a, unsigned char weight) {
+  const Two<Halves> products = multiply(a, weight);
+  return {sum.low + products.low, sum.high + products.high};
+}
+inline Two<SignedHalves> multiply(SignedBytes a, signed char weight) {
+  const Two<SignedHalves> wide = widen(a);
+  return {x86::as<SignedHalves>(x86::product(x86::m(wide.low), weight)),
+          x86::as<SignedHalves>(x86::product(x86::m(wide.high), weight))};
+}
+inline Two<SignedHalves> multiplyAdd(const Two<SignedHalves>& sum, SignedBytes a, signed char weight) {
+  const Two<SignedHalves> products = multiply(a, weight);
+  return {sum.low + products.low, sum.high + products.high};
+}
+
+// ---- in 16 bits
+
+/// a + (b >> n)
+template <int n, typename V>
+inline Two<V> addShifted(const Two<V>& a, const Two<V>& b) {
+  return {a.low + (b.low >> n), a.high + (b.high >> n)};
+}
+/// (2 a weight + 2^15) >> 16
+inline Two<SignedHalves> multiplyRounded(const Two<SignedHalves>& a, int16_t weight) {
+  const __m256i w = x86::kept(_mm256_set1_epi16(weight));
+  return {x86::as<SignedHalves>(_mm256_mulhrs_epi16(x86::m(a.low), w)),
+          x86::as<SignedHalves>(_mm256_mulhrs_epi16(x86::m(a.high), w))};
+}
+
+// ---- narrowing
+
+/// Limited to a byte, and to a signed one.
+inline Bytes narrow(const Two<SignedHalves>& a) {
+  return x86::as<Bytes>(_mm256_packus_epi16(x86::m(a.low), x86::m(a.high)));
+}
+inline SignedBytes narrowSigned(const Two<SignedHalves>& a) {
+  return x86::as<SignedBytes>(_mm256_packs_epi16(x86::m(a.low), x86::m(a.high)));
+}
+/// (a + 2^(n-1)) >> n, limited to a byte.
+template <int n>
+inline Bytes narrowRounded(const Two<SignedHalves>& a) {
+  return narrow(multiplyRounded(a, static_cast<int16_t>(1 << (15 - n))));
+}
+/// The same of unsigned lanes that need no limit: a + 2^(n-1) is less than 2^16, and the result a byte.
+template <int n>
+inline Bytes narrowRounded(const Two<Halves>& a) {
+  constexpr uint16_t kHalf = 1 << (n - 1);
+  return narrow(asSigned({(a.low + kHalf) >> n, (a.high + kHalf) >> n}));
+}
+
+// ---- weighed pixels
+
+/// The first three channels of a block of pixels, in the form in which they are best weighed: here pixels of
+/// four bytes, pixels 4 k to 4 k + 3 and 16 further in the halves of register k. What stands for a fourth
+/// channel does not count.
+struct Colours {
+  __m256i v[4];
+};
+/// Those of every second pixel, from the first on: 4 k to 4 k + 3 and 8 further in register k.
+struct EvenColours {
+  __m256i v[2];
+};
+
+template <int nc>
+inline Colours loadColours(const unsigned char* p) {
+  Colours all;
+  if constexpr (nc == 4) {
+    x86::loadFour(p, all.v);
+  } else {
+    static_assert(nc == 3);
+    static constexpr x86::Table kFirst =
+        x86::tableOf([](int i) { return i % 4 == 3 ? -1 : i / 4 * 3 + i % 4; });
+    static constexpr x86::Table kLast =
+        x86::tableOf([](int i) { return i % 4 == 3 ? -1 : i / 4 * 3 + i % 4 + 4; });
+    for (int i = 0; i < 3; ++i) {
+      all.v[i] = _mm256_shuffle_epi8(x86::loadHalves(p + 12 * i, p + 48 + 12 * i), kFirst.twice());
+    }
+    // The last bytes are the end of what is loaded, so that nothing behind the block is read.
+    all.v[3] = _mm256_shuffle_epi8(x86::loadHalves(p + 32, p + 80), kLast.twice());
+  }
+  return all;
+}
+inline EvenColours evenColumns(const Colours& c) {
+  const auto even = [](__m256i a, __m256i b) {
+    return _mm256_castps_si256(_mm256_shuffle_ps(_mm256_castsi256_ps(a), _mm256_castsi256_ps(b), 0x88));
+  };
+  return {{even(c.v[0], c.v[1]), even(c.v[2], c.v[3])}};
+}
+
+namespace x86 {
+// Sums of neighbouring products of bytes and weights, and of neighbouring sums. Weights beyond a signed byte
+// are taken as unsigned, and 128 from each byte: the sum is then less by 128 times that of the weights.
+template <Weights w>
+inline constexpr bool kLarge = w.c0 > 127 || w.c1 > 127 || w.c2 > 127;
+template <Weights w>
+inline __m256i weighed(__m256i a, __m256i b) {
+  const auto bits = [](int weight) { return static_cast<uint32_t>(static_cast<uint8_t>(weight)); };
+  const auto all = static_cast<int>(bits(w.c0) | bits(w.c1) << 8 | bits(w.c2) << 16);
+  const __m256i weights = _mm256_set1_epi32(all);
+  if constexpr (kLarge<w>) {
+    static_assert(w.c0 + w.c1 <= 256 && w.c0 >= 0 && w.c1 >= 0 && w.c2 >= 0);
+    const __m256i middle = _mm256_set1_epi8(-128);
+    return _mm256_hadd_epi16(_mm256_maddubs_epi16(weights, _mm256_xor_si256(a, middle)),
+                             _mm256_maddubs_epi16(weights, _mm256_xor_si256(b, middle)));
+  } else {
+    static_assert((w.c0 > 0 ? w.c0 : 0) + (w.c1 > 0 ? w.c1 : 0) <= 128);
+    static_assert((w.c0 < 0 ? w.c0 : 0) + (w.c1 < 0 ? w.c1 : 0) >= -128);
+    return _mm256_hadd_epi16(_mm256_maddubs_epi16(a, weights), _mm256_maddubs_epi16(b, weights));
+  }
+}
+template <Weights w>
+inline constexpr auto kTaken = static_cast<uint16_t>(kLarge<w> ? 128 * (w.c0 + w.c1 + w.c2) : 0);
+}  // namespace x86
+
+/// w.c0 c0 + w.c1 c1 + w.c2 c2 in 16 bits, signed or unsigned; at least one weight is not negative.
+template <Weights w>
+inline Halves weighed(const EvenColours& c) {
+  return x86::as<Halves>(x86::weighed<w>(c.v[0], c.v[1])) + x86::kTaken<w>;
+}
+template <Weights w>
+inline Two<Halves> weighed(const Colours& c) {
+  return {x86::as<Halves>(x86::weighed<w>(c.v[0], c.v[1])) + x86::kTaken<w>,
+          x86::as<Halves>(x86::weighed<w>(c.v[2], c.v[3])) + x86::kTaken<w>};
+}
+
+/// 128 + ((a + 2^(n-1)) >> n), limited to a byte, of each signed lane of two registers, in turn.
+using BytePairs = Bytes;
+template <int n>
+inline BytePairs centredPairs(Halves first, Halves second) {
+  static constexpr unsigned char kInTurn[16] = {0, 8, 1, 9, 2, 10, 3, 11, 4, 12, 5, 13, 6, 14, 7, 15};
+  const Two<SignedHalves> shifted =
+      multiplyRounded(asSigned({first, second}), static_cast<int16_t>(1 << (15 - n)));
+  return shuffled(std::bit_cast<Bytes>(narrowSigned(shifted)), kInTurn) ^ 0x80;
+}
+inline void storePairs(unsigned char* p, BytePairs v) { store(p, v); }
+
+}  // namespace HPC::fastcv::arm
