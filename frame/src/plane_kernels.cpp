@@ -163,14 +163,13 @@ inline void decode_block(const Scratch& scratch, ptrdiff_t rows, bool first_is_v
   for (ptrdiff_t n = rows / 2; n != 0; --n) {
     ChromaBlock chroma;
     if constexpr (pairs) {
-      const uint8x16x2_t both = vld2q_u8(chroma_at);
-      chroma = {both.val[0], both.val[1]};
+      loadSamplePairs(chroma_at, chroma.first, chroma.second);
     } else {
-      chroma = {vld1q_u8(chroma_at), vld1q_u8(chroma_at + 16)};
+      chroma = {loadSamples(chroma_at), loadSamples(chroma_at + 16)};
     }
     chroma_at += kBlock;
     keepInRegister(chroma_at);
-    decoder.decode([=](int row, int half) TILE_LAMBDA { return vld1q_u8(luma_at + 16 * row + 32 * half); },
+    decoder.decode([=](int row, int part) TILE_LAMBDA { return loadParts(luma_at + 16 * row, 32, part); },
                    chroma, out, step);
     luma_at += 64;
     keepInRegister(luma_at);
@@ -239,6 +238,11 @@ void copy_pixels(int bytes, ptrdiff_t height, ptrdiff_t size, const Byte* src, p
     (mirrored ? rearrange_row<true> : rearrange_row<false>)(src + row * stride, to.data + row * to.stride,
                                                             size, order);
   }
+}
+
+inline uint8x16_t reversedBytes(uint8x16_t v) {
+  static constexpr unsigned char kOrder[] = {15, 14, 13, 12, 11, 10, 9, 8, 7, 6, 5, 4, 3, 2, 1, 0};
+  return vqtbl1q_u8(v, vld1q_u8(kOrder));
 }
 
 /// Interleaves rows of samples of two planes.

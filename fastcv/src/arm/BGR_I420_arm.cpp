@@ -76,6 +76,8 @@ T* chromaRow(T* plane, int step, ptrdiff_t j, ptrdiff_t stride, ptrdiff_t width)
 
 // ---- I420 to BGR
 
+#if defined(__ARM_NEON)
+
 // A 20-bit multiple of a chroma sample is made of 16-bit products: the sample times a small number, which
 // fits 16 bits again, times a factor, plus the sample times what is left.
 constexpr int kSmallU = 66, kSmallV = 114;
@@ -104,18 +106,106 @@ struct DecodeConstants {
   int16x8_t factors;
 };
 
-// 32-bit lanes: of eight chroma samples, or of eight even or odd columns.
-struct Wide {
-  int32x4_t low;
-  int32x4_t high;
+// Eight chroma samples less 128, and times the small numbers.
+struct ChromaBlock {
+  SignedHalves u, v, smallU, smallV;
 };
 
-// One row pair of a decoding: 32 columns a block.
+// What chroma adds to blue and red and takes from green.
+class Decoder {
+ public:
+  static constexpr int kColumns = 16;  // of a block
+
+  // `use(part, chroma)` is given the chroma of the two blocks.
+  template <typename Use>
+  void chroma(const unsigned char* u, const unsigned char* v, const Use& use) const {
+    const SignedBytes u8 = centred(u);
+    const SignedBytes v8 = centred(v);
+    use(0, terms({vmovl_s8(vget_low_s8(u8)), vmovl_s8(vget_low_s8(v8)),
+                  vmull_s8(vget_low_s8(u8), vget_low_s8(smallU_)),
+                  vmull_s8(vget_low_s8(v8), vget_low_s8(smallV_))}));
+    use(1, terms({vmovl_high_s8(u8), vmovl_high_s8(v8), vmull_high_s8(u8, smallU_),
+                  vmull_high_s8(v8, smallV_)}));
+  }
+
+  struct Terms {
+    Two<SignedWords> b, minusG, r;
+  };
+
+  EvenOdd luma(Bytes stored) const {
+    const Bytes y = subtractSaturated(stored, yZero_);
+    return {{scaled<0>(y), scaled<1>(y)}, {scaled<2>(y), scaled<3>(y)}};
+  }
+
+ private:
+  SignedBytes centred(const unsigned char* stored) const {
+    return vreinterpretq_s8_u8(veorq_u8(vld1q_u8(stored), chromaZero_));
+  }
+
+  template <DecodeFactor factor>
+  Two<SignedWords> times(SignedHalves a) const {
+    return {vmull_n_s16(vget_low_s16(a), vgetq_lane_s16(factors_, factor)),
+            vmull_n_s16(vget_high_s16(a), vgetq_lane_s16(factors_, factor))};
+  }
+  template <DecodeFactor factor>
+  Two<SignedWords> plusTimes(const Two<SignedWords>& sum, SignedHalves a) const {
+    return {vmlal_n_s16(sum.low, vget_low_s16(a), vgetq_lane_s16(factors_, factor)),
+            vmlal_n_s16(sum.high, vget_high_s16(a), vgetq_lane_s16(factors_, factor))};
+  }
+
+  Terms terms(const ChromaBlock& c) const {
+    const Two<SignedWords> wideU = {vmovl_s16(vget_low_s16(c.u)), vmovl_s16(vget_high_s16(c.u))};
+    return {times<kFactorBU>(c.smallU), plusTimes<kFactorGV>(plusTimes<kFactorGU>(wideU, c.smallU), c.smallV),
+            plusTimes<kFactorRV>(times<kRestRV>(c.v), c.smallV)};
+  }
+
+  template <int lanes>
+  SignedWords scaled(Bytes y) const {
+    return vmulq_s32(vreinterpretq_s32_u8(vqtbl1q_u8(y, lanes_[lanes])), yGain_);
+  }
+
+  Bytes lanes_[4] = {load(kLanes[0]), load(kLanes[1]), load(kLanes[2]), load(kLanes[3])};
+  uint8x16_t yZero_ = vdupq_n_u8(kYZero);
+  uint8x16_t chromaZero_ = vdupq_n_u8(kChromaZero);
+  int32x4_t yGain_ = vdupq_n_s32(kYGain);
+  int8x16_t smallU_ = vdupq_n_s8(kSmallU);
+  int8x16_t smallV_ = vdupq_n_s8(kSmallV);
+  int16x8_t factors_ = load(kDecodeFactors);
+};
+
+#else
+
+// What chroma adds to blue and red and takes from green.
+class Decoder {
+ public:
+  static constexpr int kColumns = 32;  // of a block
+
+  struct Terms {
+    Two<SignedWords> b, minusG, r;
+  };
+
+  template <typename Use>
+  void chroma(const unsigned char* u, const unsigned char* v, const Use& use) const {
+    const CentredSamples centredU = loadCentredSamples(u);
+    const CentredSamples centredV = loadCentredSamples(v);
+    const Two<SignedWords> ofU = multiply(centredU, -kGU);
+    const Two<SignedWords> ofV = multiply(centredV, -kGV);
+    use(0, Terms{multiply(centredU, kBU), {ofU.low + ofV.low, ofU.high + ofV.high}, multiply(centredV, kRV)});
+  }
+
+  EvenOdd luma(Bytes stored) const {
+    return multiplyWords(subtractSaturated(stored, splat<Bytes>(kYZero)), kYGain);
+  }
+};
+
+#endif
+
+// One row pair of a decoding: 32 columns at a time.
 template <int dcn, int bIdx>
 struct DecodePair {
   static constexpr int kBlock = 32;
 
-  DecodeConstants k;
+  Decoder decoder;
   const unsigned char* luma0;
   const unsigned char* luma1;
   const unsigned char* u;
@@ -124,12 +214,11 @@ struct DecodePair {
   unsigned char* out1;
 
   void block(ptrdiff_t x, Blocks<1>) const {
-    const int8x16_t u8 = centred(u + x / 2);
-    const int8x16_t v8 = centred(v + x / 2);
-    half(x, vmovl_s8(vget_low_s8(u8)), vmull_s8(vget_low_s8(u8), vget_low_s8(k.smallU)),
-         vmovl_s8(vget_low_s8(v8)), vmull_s8(vget_low_s8(v8), vget_low_s8(k.smallV)));
-    half(x + 16, vmovl_high_s8(u8), vmull_high_s8(u8, k.smallU), vmovl_high_s8(v8),
-         vmull_high_s8(v8, k.smallV));
+    decoder.chroma(u + x / 2, v + x / 2, [=, this](int part, const Decoder::Terms& terms) {
+      const ptrdiff_t at = x + part * Decoder::kColumns;
+      row(luma0 + at, terms, out0 + at * dcn);
+      row(luma1 + at, terms, out1 + at * dcn);
+    });
   }
 
   void step(ptrdiff_t x) const {
@@ -145,61 +234,14 @@ struct DecodePair {
   }
 
  private:
-  int8x16_t centred(const unsigned char* stored) const {
-    return vreinterpretq_s8_u8(veorq_u8(vld1q_u8(stored), k.chromaZero));
-  }
-
-  template <DecodeFactor factor>
-  Wide times(int16x8_t a) const {
-    return {vmull_n_s16(vget_low_s16(a), vgetq_lane_s16(k.factors, factor)),
-            vmull_n_s16(vget_high_s16(a), vgetq_lane_s16(k.factors, factor))};
-  }
-  template <DecodeFactor factor>
-  Wide plusTimes(const Wide& sum, int16x8_t a) const {
-    return {vmlal_n_s16(sum.low, vget_low_s16(a), vgetq_lane_s16(k.factors, factor)),
-            vmlal_n_s16(sum.high, vget_high_s16(a), vgetq_lane_s16(k.factors, factor))};
-  }
-
-  // Sixteen columns of both rows, from their eight chroma samples and these times the small numbers.
-  void half(ptrdiff_t x, int16x8_t u16, int16x8_t smallU, int16x8_t v16, int16x8_t smallV) const {
-    const Wide wideU = {vmovl_s16(vget_low_s16(u16)), vmovl_s16(vget_high_s16(u16))};
-    const Wide b = times<kFactorBU>(smallU);
-    const Wide minusG = plusTimes<kFactorGV>(plusTimes<kFactorGU>(wideU, smallU), smallV);
-    const Wide r = plusTimes<kFactorRV>(times<kRestRV>(v16), smallV);
-    row(luma0 + x, b, minusG, r, out0 + x * dcn);
-    row(luma1 + x, b, minusG, r, out1 + x * dcn);
-  }
-
-  void row(const unsigned char* luma, const Wide& b, const Wide& minusG, const Wide& r,
-           unsigned char* out) const {
-    const uint8x16_t y = vqsubq_u8(vld1q_u8(luma), k.yZero);
-    const Wide even = {scaled<0>(y), scaled<1>(y)};
-    const Wide odd = {scaled<2>(y), scaled<3>(y)};
-    const uint8x16_t blue = joined(sum(even, b), sum(odd, b));
-    const uint8x16_t green = joined(difference(even, minusG), difference(odd, minusG));
-    const uint8x16_t red = joined(sum(even, r), sum(odd, r));
+  // (luma + chroma + 2^19) >> 20 is (((luma + chroma) >> 16) + 8) >> 4: the sum is narrowed to its upper
+  // half, which lies between -258 * 16 and 535 * 16, then rounded, shifted and saturated.
+  void row(const unsigned char* luma, const Decoder::Terms& terms, unsigned char* out) const {
+    const EvenOdd y = decoder.luma(load(luma));
+    const Bytes blue = addNarrowed<kShift>(y, terms.b);
+    const Bytes green = subtractNarrowed<kShift>(y, terms.minusG);
+    const Bytes red = addNarrowed<kShift>(y, terms.r);
     storePixels(out, bIdx == 0 ? pixelsOf<dcn>(blue, green, red) : pixelsOf<dcn>(red, green, blue));
-  }
-
-  template <int lanes>
-  int32x4_t scaled(uint8x16_t y) const {
-    return vmulq_s32(vreinterpretq_s32_u8(vqtbl1q_u8(y, k.lanes[lanes])), k.yGain);
-  }
-
-  // (luma + chroma + 2^19) >> 20 is (((luma + chroma) >> 16) + 8) >> 4: the sum is narrowed to its upper half
-  // at once, which lies between -258 * 16 and 535 * 16, then rounded, shifted and saturated.
-  static uint8x8_t sum(const Wide& luma, const Wide& chroma) {
-    return rounded(vaddhn_s32(luma.low, chroma.low), vaddhn_s32(luma.high, chroma.high));
-  }
-  static uint8x8_t difference(const Wide& luma, const Wide& chroma) {
-    return rounded(vsubhn_s32(luma.low, chroma.low), vsubhn_s32(luma.high, chroma.high));
-  }
-  static uint8x8_t rounded(int16x4_t low, int16x4_t high) {
-    return vqrshrun_n_s16(vcombine_s16(low, high), kShift - 16);
-  }
-
-  static uint8x16_t joined(uint8x8_t even, uint8x8_t odd) {
-    return vzip1q_u8(vcombine_u8(even, even), vcombine_u8(odd, odd));
   }
 
   static void pixel(int y, int b, int g, int r, unsigned char* out) {
@@ -216,17 +258,17 @@ template <int dcn, int bIdx>
 struct YUV420p2RGB_u8_neon {
   static_assert(bIdx == 0 || bIdx == 2);
 
-  DecodeConstants constants;
+  Decoder decoder;
 
   __attribute__((noinline)) void operator()(int height, int width, const unsigned char* y,
                                             const unsigned char* u, const unsigned char* v,
                                             unsigned char* dst, ptrdiff_t srcStride, int uStep, int vStep,
                                             ptrdiff_t dstStride) const {
     using Pair = DecodePair<dcn, bIdx>;
-    forEachRowPair<Pair::kBlock, 1>(height, width, [=, k = constants](ptrdiff_t row) {
+    forEachRowPair<Pair::kBlock, 1>(height, width, [=, copy = decoder](ptrdiff_t row) {
       const unsigned char* luma = y + row * srcStride;
       unsigned char* out = dst + row * dstStride;
-      return Pair{k,
+      return Pair{copy,
                   luma,
                   luma + srcStride,
                   chromaRow(u, uStep, row / 2, srcStride, width),
@@ -241,14 +283,7 @@ template <int dcn, int bIdx, int uIdx>
 void YUV420ptoRGB(int height, int width, int srcStride, const unsigned char* src, int dstStride,
                   unsigned char* dst) {
   KERNEL_ASSERT(kSource, width % 2 == 0 && height % 2 == 0);
-  const YUV420p2RGB_u8_neon<dcn, bIdx> convert = {
-      {{vld1q_u8(kLanes[0]), vld1q_u8(kLanes[1]), vld1q_u8(kLanes[2]), vld1q_u8(kLanes[3])},
-       vdupq_n_u8(kYZero),
-       vdupq_n_u8(kChromaZero),
-       vdupq_n_s32(kYGain),
-       vdupq_n_s8(kSmallU),
-       vdupq_n_s8(kSmallV),
-       vld1q_s16(kDecodeFactors)}};
+  const YUV420p2RGB_u8_neon<dcn, bIdx> convert;
   const auto chroma = chromaPlanesOf<uIdx>(src, height, width, srcStride);
   convert(height, width, src, chroma.u, chroma.v, dst, srcStride, chroma.uStep, chroma.vStep, dstStride);
 }
@@ -269,6 +304,8 @@ constexpr int kLumaB = 12, kLumaG = 63, kLumaRShift = 5;
 constexpr int kLumaShift = 6;
 constexpr unsigned short kLumaScale = 16777;  // of 2^15: 64 / 125
 
+#if defined(__ARM_NEON)
+
 // Chroma in 32 bits, out of unsigned 16-bit products: a colour times a small number, then times a factor.
 constexpr int kSmallPlus = 157;  // of the colour that counts positive
 constexpr int kSmallUG = 5, kSmallUR = 44;
@@ -279,82 +316,42 @@ static_assert(kSmallPlus * kEncodeFactors[kFactorPlus] == kUB && kVR == kUB);
 static_assert(kSmallUG * kEncodeFactors[kFactorUG] == -kUG && kSmallUR * kEncodeFactors[kFactorUR] == -kUR);
 static_assert(kSmallVB * kEncodeFactors[kFactorVB] == -kVB && kSmallVG * kEncodeFactors[kFactorVG] == -kVG);
 
-struct EncodeConstants {
-  uint8x16_t lumaB;
-  uint8x16_t lumaG;
-  uint8x16_t yZero;
-  uint8x8_t smallPlus;
-  uint8x8_t smallUG;
-  uint8x8_t smallUR;
-  uint8x8_t smallVB;
-  uint8x8_t smallVG;
-  uint16x8_t factors;
-  uint32x4_t chromaBias;
-};
-
-// One row pair of an encoding: 16 columns a block.
-template <int scn, int bIdx>
-struct EncodePair {
-  static constexpr int kBlock = 16;
-
-  EncodeConstants k;
-  const unsigned char* in0;
-  const unsigned char* in1;
-  unsigned char* luma0;
-  unsigned char* luma1;
-  unsigned char* u;
-  unsigned char* v;
-
-  void block(ptrdiff_t x, Blocks<1>) const {
-    const Pixels<uint8x16_t, scn> top = loadPixels<uint8x16_t, scn>(in0 + x * scn);
-    const Pixels<uint8x16_t, scn> bottom = loadPixels<uint8x16_t, scn>(in1 + x * scn);
-    vst1q_u8(luma0 + x, lumaOf(top));
-    vst1q_u8(luma1 + x, lumaOf(bottom));
-    const uint8x8_t b = evenColumns(top.c[bIdx]);
-    const uint8x8_t g = evenColumns(top.c[1]);
-    const uint8x8_t r = evenColumns(top.c[kRed]);
-    const uint8x8_t blockU = chromaOf(vmull_u8(b, k.smallPlus), Minus<kFactorUG>{vmull_u8(g, k.smallUG)},
-                                      Minus<kFactorUR>{vmull_u8(r, k.smallUR)});
-    const uint8x8_t blockV = chromaOf(vmull_u8(r, k.smallPlus), Minus<kFactorVB>{vmull_u8(b, k.smallVB)},
-                                      Minus<kFactorVG>{vmull_u8(g, k.smallVG)});
-    vst1_u8(u + x / 2, blockU);
-    vst1_u8(v + x / 2, blockV);
-  }
-
-  void step(ptrdiff_t x) const {
-    for (ptrdiff_t column = x; column < x + 2; ++column) {
-      luma0[column] = lumaOf(in0 + column * scn);
-      luma1[column] = lumaOf(in1 + column * scn);
-    }
-    u[x / 2] = chromaOf(in0 + x * scn, kUB, kUG, kUR);
-    v[x / 2] = chromaOf(in0 + x * scn, kVB, kVG, kVR);
-  }
-
- private:
-  static constexpr int kRed = 2 - bIdx;
-
-  uint8x16_t lumaOf(const Pixels<uint8x16_t, scn>& p) const {
-    const uint8x16_t b = p.c[bIdx];
-    const uint8x16_t g = p.c[1];
-    const uint8x16_t r = p.c[kRed];
+// What is stored of pixels.
+template <int bIdx>
+class Encoder {
+ public:
+  Bytes luma(const Colours& p) const {
+    const Bytes b = p.c[bIdx], g = p.c[1], r = p.c[2 - bIdx];
     const uint8x16_t eighths = vshrq_n_u8(vrhaddq_u8(b, vrshrq_n_u8(r, 1)), 1);
     uint16x8_t low = vshll_n_u8(vget_low_u8(r), kLumaRShift);
     uint16x8_t high = vshll_n_u8(vget_high_u8(r), kLumaRShift);
-    low = vmlal_u8(low, vget_low_u8(g), vget_low_u8(k.lumaG));
-    high = vmlal_high_u8(high, g, k.lumaG);
-    low = vmlal_u8(low, vget_low_u8(b), vget_low_u8(k.lumaB));
-    high = vmlal_high_u8(high, b, k.lumaB);
+    low = vmlal_u8(low, vget_low_u8(g), vget_low_u8(lumaG_));
+    high = vmlal_high_u8(high, g, lumaG_);
+    low = vmlal_u8(low, vget_low_u8(b), vget_low_u8(lumaB_));
+    high = vmlal_high_u8(high, b, lumaB_);
     low = vaddw_u8(low, vget_low_u8(eighths));
     high = vaddw_high_u8(high, eighths);
-    return vaddq_u8(vcombine_u8(thousandths(low), thousandths(high)), k.yZero);
-  }
-  uint8x8_t thousandths(uint16x8_t eighths) const {
-    const int16x8_t scaled = vqdmulhq_n_s16(vreinterpretq_s16_u16(eighths),
-                                            static_cast<short>(vgetq_lane_u16(k.factors, kFactorLuma)));
-    return vrshrn_n_u16(vreinterpretq_u16_s16(scaled), kLumaShift);
+    return vaddq_u8(vcombine_u8(thousandths(low), thousandths(high)), yZero_);
   }
 
-  static uint8x8_t evenColumns(uint8x16_t a) { return vmovn_u16(vreinterpretq_u16_u8(a)); }
+  // U and V of every second pixel.
+  void storeChroma(const Colours& p, unsigned char* u, unsigned char* v) const {
+    const EvenColours even = evenColumns(p);
+    const uint8x8_t b = even.c[bIdx], g = even.c[1], r = even.c[2 - bIdx];
+    const uint8x8_t blockU = chromaOf(vmull_u8(b, smallPlus_), Minus<kFactorUG>{vmull_u8(g, smallUG_)},
+                                      Minus<kFactorUR>{vmull_u8(r, smallUR_)});
+    const uint8x8_t blockV = chromaOf(vmull_u8(r, smallPlus_), Minus<kFactorVB>{vmull_u8(b, smallVB_)},
+                                      Minus<kFactorVG>{vmull_u8(g, smallVG_)});
+    vst1_u8(u, blockU);
+    vst1_u8(v, blockV);
+  }
+
+ private:
+  uint8x8_t thousandths(uint16x8_t eighths) const {
+    const int16x8_t scaled = vqdmulhq_n_s16(vreinterpretq_s16_u16(eighths),
+                                            static_cast<short>(vgetq_lane_u16(factors_, kFactorLuma)));
+    return vrshrn_n_u16(vreinterpretq_u16_s16(scaled), kLumaShift);
+  }
 
   // A colour that counts negative, times its small number.
   template <EncodeFactor factor>
@@ -373,11 +370,90 @@ struct EncodePair {
   // The instruction that narrows to the upper half adds 2^15, which the bias leaves to it.
   template <EncodeFactor factor0, EncodeFactor factor1>
   uint16x4_t upperHalves(uint16x4_t plus, uint16x4_t minus0, uint16x4_t minus1) const {
-    uint32x4_t sum = vmull_n_u16(plus, vgetq_lane_u16(k.factors, kFactorPlus));
-    sum = vmlsl_n_u16(sum, minus0, vgetq_lane_u16(k.factors, factor0));
-    sum = vmlsl_n_u16(sum, minus1, vgetq_lane_u16(k.factors, factor1));
-    return vraddhn_u32(sum, k.chromaBias);
+    uint32x4_t sum = vmull_n_u16(plus, vgetq_lane_u16(factors_, kFactorPlus));
+    sum = vmlsl_n_u16(sum, minus0, vgetq_lane_u16(factors_, factor0));
+    sum = vmlsl_n_u16(sum, minus1, vgetq_lane_u16(factors_, factor1));
+    return vraddhn_u32(sum, chromaBias_);
   }
+
+  static constexpr unsigned kBias = (kChromaZero << kShift) + kHalf - (1 << 15);
+  uint8x16_t lumaB_ = vdupq_n_u8(kLumaB);
+  uint8x16_t lumaG_ = vdupq_n_u8(kLumaG);
+  uint8x16_t yZero_ = vdupq_n_u8(kYZero);
+  uint8x8_t smallPlus_ = vdup_n_u8(kSmallPlus);
+  uint8x8_t smallUG_ = vdup_n_u8(kSmallUG);
+  uint8x8_t smallUR_ = vdup_n_u8(kSmallUR);
+  uint8x8_t smallVB_ = vdup_n_u8(kSmallVB);
+  uint8x8_t smallVG_ = vdup_n_u8(kSmallVG);
+  uint16x8_t factors_ = load(kEncodeFactors);
+  uint32x4_t chromaBias_ = vdupq_n_u32(kBias);
+};
+
+#else
+
+// What is stored of pixels.
+template <int bIdx>
+class Encoder {
+ public:
+  Bytes luma(const Colours& p) const {
+    const Two<Halves> eighths = weighed<weightsOf(2, 0, 1)>(p);
+    const Two<Halves> m = weighed<weightsOf(kLumaB, kLumaG, 1 << kLumaRShift)>(p);
+    const auto thousandths = [](Halves whole, Halves part) {
+      return multiplyHigh(whole + ((part + 3) >> 3), 2 * kLumaScale);
+    };
+    return narrowRounded<kLumaShift>(
+               Two<Halves>{thousandths(m.low, eighths.low), thousandths(m.high, eighths.high)}) +
+           splat<Bytes>(kYZero);
+  }
+
+  // U and V of every second pixel.
+  void storeChroma(const Colours& p, unsigned char* u, unsigned char* v) const {
+    constexpr int kBias = (kChromaZero << kShift) + kHalf;
+    const WideColours wide = wideColours(evenColumns(p));
+    storeSamples(u, weighedShifted<kShift, weightsOf(kUB, kUG, kUR)>(wide, kBias), v,
+                 weighedShifted<kShift, weightsOf(kVB, kVG, kVR)>(wide, kBias));
+  }
+
+ private:
+  static constexpr Weights weightsOf(int blue, int green, int red) {
+    return bIdx == 0 ? Weights{blue, green, red} : Weights{red, green, blue};
+  }
+};
+
+#endif
+
+// One row pair of an encoding.
+template <int scn, int bIdx>
+struct EncodePair {
+  static constexpr int kBlock = kBlockPixels<unsigned char>;
+
+  Encoder<bIdx> encoder;
+  const unsigned char* in0;
+  const unsigned char* in1;
+  unsigned char* luma0;
+  unsigned char* luma1;
+  unsigned char* u;
+  unsigned char* v;
+
+  void block(ptrdiff_t x, Blocks<1>) const {
+    const Colours top = loadColours<scn>(in0 + x * scn);
+    const Colours bottom = loadColours<scn>(in1 + x * scn);
+    store(luma0 + x, encoder.luma(top));
+    store(luma1 + x, encoder.luma(bottom));
+    encoder.storeChroma(top, u + x / 2, v + x / 2);
+  }
+
+  void step(ptrdiff_t x) const {
+    for (ptrdiff_t column = x; column < x + 2; ++column) {
+      luma0[column] = lumaOf(in0 + column * scn);
+      luma1[column] = lumaOf(in1 + column * scn);
+    }
+    u[x / 2] = chromaOf(in0 + x * scn, kUB, kUG, kUR);
+    v[x / 2] = chromaOf(in0 + x * scn, kVB, kVG, kVR);
+  }
+
+ private:
+  static constexpr int kRed = 2 - bIdx;
 
   static unsigned char lumaOf(const unsigned char* p) {
     return static_cast<unsigned char>(((kYB * p[bIdx] + kYG * p[1] + kYR * p[kRed] + kHalf) >> kShift) +
@@ -394,16 +470,16 @@ template <int scn, int bIdx>
 struct RGB2YUV420p_u8_neon {
   static_assert(bIdx == 0 || bIdx == 2);
 
-  EncodeConstants constants;
+  Encoder<bIdx> encoder;
 
   __attribute__((noinline)) void operator()(int height, int width, const unsigned char* src, unsigned char* y,
                                             unsigned char* u, unsigned char* v, ptrdiff_t srcStride,
                                             int uStep, int vStep, ptrdiff_t dstStride) const {
     using Pair = EncodePair<scn, bIdx>;
-    forEachRowPair<Pair::kBlock, 1>(height, width, [=, k = constants](ptrdiff_t row) {
+    forEachRowPair<Pair::kBlock, 1>(height, width, [=, copy = encoder](ptrdiff_t row) {
       const unsigned char* in = src + row * srcStride;
       unsigned char* luma = y + row * dstStride;
-      return Pair{k,
+      return Pair{copy,
                   in,
                   in + srcStride,
                   luma,
@@ -418,11 +494,7 @@ template <int scn, int bIdx, int uIdx>
 void RGBtoYUV420p(int height, int width, int srcStride, const unsigned char* src, int dstStride,
                   unsigned char* dst) {
   KERNEL_ASSERT(kSource, width % 2 == 0 && height % 2 == 0);
-  constexpr unsigned kBias = (kChromaZero << kShift) + kHalf - (1 << 15);
-  const RGB2YUV420p_u8_neon<scn, bIdx> convert = {
-      {vdupq_n_u8(kLumaB), vdupq_n_u8(kLumaG), vdupq_n_u8(kYZero), vdup_n_u8(kSmallPlus), vdup_n_u8(kSmallUG),
-       vdup_n_u8(kSmallUR), vdup_n_u8(kSmallVB), vdup_n_u8(kSmallVG), vld1q_u16(kEncodeFactors),
-       vdupq_n_u32(kBias)}};
+  const RGB2YUV420p_u8_neon<scn, bIdx> convert;
   const auto chroma = chromaPlanesOf<uIdx>(dst, height, width, dstStride);
   convert(height, width, src, dst, chroma.u, chroma.v, srcStride, chroma.uStep, chroma.vStep, dstStride);
 }

@@ -31,48 +31,38 @@ inline constexpr ChromaWeights kWeightsV = {86, 44};
 /// Y + ((t + 32) >> 6), and the added term, -220 to 218, splits into two bytes of which one is 0: adding the
 /// one and subtracting the other, both saturating, is the clamped sum for 16 pixels at once.
 struct ChromaTerm {
-  uint8x16_t plus;
-  uint8x16_t minus;
+  Bytes plus;
+  Bytes minus;
 };
 
 namespace detail {
 
 /// The terms of 16 chroma samples from t, their products in 16 bits, which reach at most 110 * 128 = 14080.
-inline ChromaTerm chromaTerm(int16x8_t low, int16x8_t high) {
+template <typename Products>
+inline ChromaTerm chromaTerm(const Products& t) {
   // The negative part is -((t + 32) >> 6) = (31 - t) >> 6, which is the rounding shift of -1 - t: of the bits
   // of t inverted, for which no constant takes a register.
-  return {roundingShiftToBytes<kDecodeShift>(low, high),
-          roundingShiftToBytes<kDecodeShift>(vmvnq_s16(low), vmvnq_s16(high))};
+  return {sampleBytes<kDecodeShift>(t), sampleBytes<kDecodeShift>(~t)};
 }
 
-inline int16x8_t asSigned(uint16x8_t v) { return vreinterpretq_s16_u16(v); }
-
-inline uint8x16_t weightVector(int weight) { return vdupq_n_u8(static_cast<unsigned char>(weight)); }
+inline SignedHalves offset(int weight) { return splat<SignedHalves>(static_cast<int16_t>(weight * 128)); }
+inline unsigned char byteOf(int weight) { return static_cast<unsigned char>(weight); }
 
 /// weight * (stored - 128): the product with the stored byte, which a core finds faster than with a 16-bit
 /// difference, less that with 128.
-inline ChromaTerm colourTerm(uint8x16_t stored, int weight) {
-  const uint8x16_t w = weightVector(weight);
-  const int16x8_t low = asSigned(vmull_u8(vget_low_u8(stored), vget_low_u8(w)));
-  const int16x8_t high = asSigned(vmull_high_u8(stored, w));
-  const int16x8_t offset = vdupq_n_s16(static_cast<int16_t>(weight * 128));
-  return chromaTerm(vsubq_s16(low, offset), vsubq_s16(high, offset));
+inline ChromaTerm colourTerm(Samples stored, int weight) {
+  return chromaTerm(asSigned(multiply(stored, byteOf(weight))) - offset(weight));
 }
 
 /// -weight1 * (stored1 - 128) - weight2 * (stored2 - 128)
-inline ChromaTerm greenTerm(uint8x16_t stored1, int weight1, uint8x16_t stored2, int weight2) {
-  const uint8x16_t w1 = weightVector(weight1);
-  const uint8x16_t w2 = weightVector(weight2);
-  const int16x8_t low = asSigned(
-      vmlal_u8(vmull_u8(vget_low_u8(stored1), vget_low_u8(w1)), vget_low_u8(stored2), vget_low_u8(w2)));
-  const int16x8_t high = asSigned(vmlal_high_u8(vmull_high_u8(stored1, w1), stored2, w2));
-  const int16x8_t offset = vdupq_n_s16(static_cast<int16_t>((weight1 + weight2) * 128));
-  return chromaTerm(vsubq_s16(offset, low), vsubq_s16(offset, high));
+inline ChromaTerm greenTerm(Samples stored1, int weight1, Samples stored2, int weight2) {
+  return chromaTerm(offset(weight1 + weight2) -
+                    asSigned(multiplyAdd(multiply(stored1, byteOf(weight1)), stored2, byteOf(weight2))));
 }
 
 }  // namespace detail
 
-/// The terms of 16 chroma samples, or, spread, those of 16 pixels of a row.
+/// The terms of 16 chroma samples, or, spread, those of a block of a row's pixels.
 struct ChromaTerms {
   ChromaTerm first;  ///< of the colour that is the first sample's
   ChromaTerm green;
@@ -80,40 +70,34 @@ struct ChromaTerms {
 };
 
 /// The terms of 16 first and 16 second chroma samples, U and V in either order.
-inline ChromaTerms chromaTerms(uint8x16_t first, ChromaWeights firstWeights, uint8x16_t second,
+inline ChromaTerms chromaTerms(Samples first, ChromaWeights firstWeights, Samples second,
                                ChromaWeights secondWeights) {
   return {detail::colourTerm(first, firstWeights.colour),
           detail::greenTerm(first, firstWeights.green, second, secondWeights.green),
           detail::colourTerm(second, secondWeights.colour)};
 }
 
-/// Spreads 16 chroma terms over the 32 pixels of a row: those of the first or of the second 16.
-template <bool second>
-inline ChromaTerm spread(const ChromaTerm& term) {
-  if constexpr (second) {
-    return {vzip2q_u8(term.plus, term.plus), vzip2q_u8(term.minus, term.minus)};
-  } else {
-    return {vzip1q_u8(term.plus, term.plus), vzip1q_u8(term.minus, term.minus)};
-  }
-}
-template <bool second>
+/// Spreads 16 chroma terms over the columns of a block, the first or the second.
+template <int part>
 inline ChromaTerms spread(const ChromaTerms& terms) {
-  return {spread<second>(terms.first), spread<second>(terms.green), spread<second>(terms.second)};
+  const auto each = [](const ChromaTerm& term) {
+    return ChromaTerm{spread<part>(term.plus), spread<part>(term.minus)};
+  };
+  return {each(terms.first), each(terms.green), each(terms.second)};
 }
 
-inline uint8x16_t addTerm(uint8x16_t luma, const ChromaTerm& term) {
-  return vqsubq_u8(vqaddq_u8(luma, term.plus), term.minus);
+inline Bytes addTerm(Bytes luma, const ChromaTerm& term) {
+  return subtractSaturated(addSaturated(luma, term.plus), term.minus);
 }
 
-/// 16 pixels of their luma and their terms. The first channel is the first sample's colour; with `swapped`
-/// the second's.
+/// A block of pixels of their luma and their terms. The first channel is the first sample's colour; with
+/// `swapped` the second's.
 template <bool swapped>
-inline Pixels<uint8x16_t, 3> decodedPixels(uint8x16_t luma, const ChromaTerms& terms) {
-  const uint8x16_t first = addTerm(luma, terms.first);
-  const uint8x16_t green = addTerm(luma, terms.green);
-  const uint8x16_t second = addTerm(luma, terms.second);
-  return swapped ? Pixels<uint8x16_t, 3>{{second, green, first}}
-                 : Pixels<uint8x16_t, 3>{{first, green, second}};
+inline Pixels<Bytes, 3> decodedPixels(Bytes luma, const ChromaTerms& terms) {
+  const Bytes first = addTerm(luma, terms.first);
+  const Bytes green = addTerm(luma, terms.green);
+  const Bytes second = addTerm(luma, terms.second);
+  return swapped ? Pixels<Bytes, 3>{{second, green, first}} : Pixels<Bytes, 3>{{first, green, second}};
 }
 
 /// The column pairs of a chroma sample in up to two rows, pixel by pixel. `u` and `v` are the stored bytes.
@@ -151,8 +135,8 @@ inline constexpr int kDecodeColumns = 32;
 
 /// 16 first and 16 second chroma samples.
 struct ChromaBlock {
-  uint8x16_t first;
-  uint8x16_t second;
+  Samples first;
+  Samples second;
 };
 
 /// What is the same for all blocks of a picture. `swapped` as for `decodedPixels`.
@@ -162,34 +146,38 @@ class ColourDecoder {
   /// The first samples are V, or U.
   explicit ColourDecoder(bool firstIsV)
       : first_(firstIsV ? kWeightsV : kWeightsU), second_(firstIsV ? kWeightsU : kWeightsV) {
-    uint8x16_t alpha = splat<uint8x16_t>(kOpaque<unsigned char>);
-    for (uint8x16_t& ofRow : alpha_) {
+    Bytes alpha = splat<Bytes>(kOpaque<unsigned char>);
+    for (Bytes& ofRow : alpha_) {
       forget(alpha);
       ofRow = alpha;
     }
   }
 
-  /// Decodes a block of two rows: `luma(row, half)` gives 16 columns. Each row's second half is stored 16
-  /// pixels behind the first, and then its pointer moves on by `step`. The luma is asked for when it is
-  /// needed, as registers are few.
+  /// Decodes 32 columns of two rows: `luma(row, part)` gives those of one block. Each row's last 16 pixels
+  /// are stored behind the first, then its pointer moves on from them by `step`. The luma is asked for when
+  /// it is needed, as registers are few.
   template <typename Luma>
   TILE_INLINE void decode(const Luma& luma, const ChromaBlock& chroma, unsigned char* (&out)[2],
                           ptrdiff_t step) const {
     const ChromaTerms terms = chromaTerms(chroma.first, first_, chroma.second, second_);
-    half(luma(0, 0), luma(1, 0), spread<false>(terms), out, 16 * nc);
-    half(luma(0, 1), luma(1, 1), spread<true>(terms), out, step);
+    if constexpr (kSampleBlocks == 2) {
+      part(luma(0, 0), luma(1, 0), spread<0>(terms), out, 16 * nc);
+      part(luma(0, 1), luma(1, 1), spread<1>(terms), out, step);
+    } else {
+      part(luma(0, 0), luma(1, 0), terms, out, 16 * nc + step);
+    }
   }
 
  private:
-  TILE_INLINE void half(uint8x16_t luma0, uint8x16_t luma1, const ChromaTerms& terms,
-                        unsigned char* (&out)[2], ptrdiff_t step) const {
+  TILE_INLINE void part(Bytes luma0, Bytes luma1, const ChromaTerms& terms, unsigned char* (&out)[2],
+                        ptrdiff_t step) const {
     store<0>(decodedPixels<swapped>(luma0, terms), out[0], step);
     store<1>(decodedPixels<swapped>(luma1, terms), out[1], step);
   }
 
   /// An alpha for each row: one register cannot stand behind several colour registers.
   template <int row>
-  TILE_INLINE void store(const Pixels<uint8x16_t, 3>& pixels, unsigned char*& out, ptrdiff_t step) const {
+  TILE_INLINE void store(const Pixels<Bytes, 3>& pixels, unsigned char*& out, ptrdiff_t step) const {
     storePixels(out, withAlpha<nc>(pixels, alpha_[row]));
     out += step;
     keepInRegister(out);
@@ -197,13 +185,8 @@ class ColourDecoder {
 
   ChromaWeights first_;
   ChromaWeights second_;
-  uint8x16_t alpha_[2];
+  Bytes alpha_[2];
 };
-
-inline uint8x16_t reversedBytes(uint8x16_t v) {
-  static constexpr unsigned char kOrder[] = {15, 14, 13, 12, 11, 10, 9, 8, 7, 6, 5, 4, 3, 2, 1, 0};
-  return vqtbl1q_u8(v, vld1q_u8(kOrder));
-}
 
 /// Two rows of luma and their row of chroma.
 struct RowPair {
@@ -226,17 +209,16 @@ class RowPairReader {
   TILE_INLINE ChromaBlock chroma() const {
     ChromaBlock block;
     if constexpr (pairs) {
-      const uint8x16x2_t both = vld2q_u8(first_);
-      block = {both.val[0], both.val[1]};
+      loadSamplePairs(first_, block.first, block.second);
     } else {
-      block = {vld1q_u8(first_), vld1q_u8(second_)};
+      block = {loadSamples(first_), loadSamples(second_)};
     }
-    return mirrored ? ChromaBlock{reversedBytes(block.first), reversedBytes(block.second)} : block;
+    return mirrored ? ChromaBlock{reversed(block.first), reversed(block.second)} : block;
   }
 
-  TILE_INLINE uint8x16_t luma(int row, int half) const {
-    const uint8x16_t v = vld1q_u8(luma_[row] + 16 * (mirrored ? 1 - half : half));
-    return mirrored ? reversedBytes(v) : v;
+  TILE_INLINE Bytes luma(int row, int part) const {
+    const Bytes v = load(luma_[row] + 16 * (mirrored && kSampleBlocks == 2 ? 1 - part : part));
+    return mirrored ? reversed(v) : v;
   }
 
   TILE_INLINE void next() {
@@ -282,7 +264,7 @@ TILE_INLINE void decodeRowPair(const ColourDecoder<nc, swapped>& decoder, const 
     unsigned char* out[2] = {out0 + x * nc, out1 + x * nc};
     KERNEL_ROLLED_LOOP
     for (; blocks != 0; --blocks) {
-      decoder.decode([&](int row, int half) TILE_LAMBDA { return from.luma(row, half); }, from.chroma(), out,
+      decoder.decode([&](int row, int part) TILE_LAMBDA { return from.luma(row, part); }, from.chroma(), out,
                      16 * nc);
       expectStores(out[0]);
       expectStores(out[1]);

@@ -28,6 +28,19 @@ struct Two {
   V high;
 };
 
+template <typename V>
+inline Two<V> operator-(const Two<V>& a, V b) {
+  return {a.low - b, a.high - b};
+}
+template <typename V>
+inline Two<V> operator-(V a, const Two<V>& b) {
+  return {a - b.low, a - b.high};
+}
+template <typename V>
+inline Two<V> operator~(const Two<V>& a) {
+  return {~a.low, ~a.high};
+}
+
 /// Factors of the first three channels of a pixel.
 struct Weights {
   int c0, c1, c2;

@@ -41,6 +41,8 @@ inline V splat(ElementOf<V> value) {
 
 inline Bytes load(const unsigned char* p) { return vld1q_u8(p); }
 inline Floats load(const float* p) { return vld1q_f32(p); }
+inline SignedHalves load(const short* p) { return vld1q_s16(p); }
+inline Halves load(const unsigned short* p) { return vld1q_u16(p); }
 inline void load(const unsigned char* p, Bytes& v) { v = vld1q_u8(p); }
 inline void load(const float* p, Floats& v) { v = vld1q_f32(p); }
 inline void store(unsigned char* p, Bytes v) { vst1q_u8(p, v); }
@@ -153,19 +155,22 @@ inline Two<SignedHalves> add(const Two<SignedHalves>& a, Bytes b) {
           vreinterpretq_s16_u16(vaddw_high_u8(vreinterpretq_u16_s16(a.high), b))};
 }
 
+// One register holds a weight, for both halves.
 inline Two<Halves> multiply(Bytes a, unsigned char weight) {
-  return {vmull_u8(vget_low_u8(a), vdup_n_u8(weight)), vmull_high_u8(a, vdupq_n_u8(weight))};
+  const Bytes w = vdupq_n_u8(weight);
+  return {vmull_u8(vget_low_u8(a), vget_low_u8(w)), vmull_high_u8(a, w)};
 }
 inline Two<Halves> multiplyAdd(const Two<Halves>& sum, Bytes a, unsigned char weight) {
-  return {vmlal_u8(sum.low, vget_low_u8(a), vdup_n_u8(weight)),
-          vmlal_high_u8(sum.high, a, vdupq_n_u8(weight))};
+  const Bytes w = vdupq_n_u8(weight);
+  return {vmlal_u8(sum.low, vget_low_u8(a), vget_low_u8(w)), vmlal_high_u8(sum.high, a, w)};
 }
 inline Two<SignedHalves> multiply(SignedBytes a, signed char weight) {
-  return {vmull_s8(vget_low_s8(a), vdup_n_s8(weight)), vmull_high_s8(a, vdupq_n_s8(weight))};
+  const SignedBytes w = vdupq_n_s8(weight);
+  return {vmull_s8(vget_low_s8(a), vget_low_s8(w)), vmull_high_s8(a, w)};
 }
 inline Two<SignedHalves> multiplyAdd(const Two<SignedHalves>& sum, SignedBytes a, signed char weight) {
-  return {vmlal_s8(sum.low, vget_low_s8(a), vdup_n_s8(weight)),
-          vmlal_high_s8(sum.high, a, vdupq_n_s8(weight))};
+  const SignedBytes w = vdupq_n_s8(weight);
+  return {vmlal_s8(sum.low, vget_low_s8(a), vget_low_s8(w)), vmlal_high_s8(sum.high, a, w)};
 }
 
 // ---- in 16 bits
@@ -270,5 +275,70 @@ inline BytePairs centredPairs(Halves first, Halves second) {
   return {{centred(first), centred(second)}};
 }
 inline void storePairs(unsigned char* p, const BytePairs& v) { vst2_u8(p, v); }
+
+// ---- samples of chroma
+
+/// 16 chroma samples, which belong to 32 columns.
+using Samples = Bytes;
+/// How many blocks of bytes the 32 columns are.
+inline constexpr int kSampleBlocks = 2;
+
+inline Samples loadSamples(const unsigned char* p) { return vld1q_u8(p); }
+inline void loadSamplePairs(const unsigned char* p, Samples& first, Samples& second) {
+  const uint8x16x2_t both = vld2q_u8(p);
+  first = both.val[0], second = both.val[1];
+}
+/// The block number `part` of two, of which 16 bytes each lie `step` behind those before.
+inline Bytes loadParts(const unsigned char* p, ptrdiff_t step, int part) { return vld1q_u8(p + step * part); }
+
+inline Bytes reversed(Bytes v) {
+  static constexpr unsigned char kOrder[] = {15, 14, 13, 12, 11, 10, 9, 8, 7, 6, 5, 4, 3, 2, 1, 0};
+  return shuffled(v, kOrder);
+}
+
+/// What 16 samples add, as bytes, and the bytes of the columns of block `part`.
+template <int n>
+inline Bytes sampleBytes(const Two<SignedHalves>& a) {
+  return narrowRounded<n>(a);
+}
+template <int part>
+inline Bytes spread(Bytes v) {
+  return part == 0 ? vzip1q_u8(v, v) : vzip2q_u8(v, v);
+}
+
+// ---- lanes of 32 bits
+
+/// Of eight neighbouring samples, or of the even or the odd columns of a block.
+struct EvenOdd {
+  Two<SignedWords> even;
+  Two<SignedWords> odd;
+};
+
+namespace detail {
+// Of two results, that of sum s in 32 bits being ((s >> 16) + 2^(n-17)) >> (n - 16), limited to a byte.
+template <int n>
+inline Bytes narrowedColumns(int16x4_t even0, int16x4_t even1, int16x4_t odd0, int16x4_t odd1) {
+  const auto rounded = [](int16x4_t low, int16x4_t high) {
+    const uint8x8_t bytes = vqrshrun_n_s16(vcombine_s16(low, high), n - 16);
+    return vcombine_u8(bytes, bytes);
+  };
+  return vzip1q_u8(rounded(even0, even1), rounded(odd0, odd1));
+}
+}  // namespace detail
+
+/// (luma + chroma + 2^(n-1)) >> n, limited to a byte, of the even and the odd column of each sample; n is
+/// more than 16, and (luma + chroma) >> 16 fits 16 bits.
+template <int n>
+inline Bytes addNarrowed(const EvenOdd& luma, const Two<SignedWords>& chroma) {
+  return detail::narrowedColumns<n>(
+      vaddhn_s32(luma.even.low, chroma.low), vaddhn_s32(luma.even.high, chroma.high),
+      vaddhn_s32(luma.odd.low, chroma.low), vaddhn_s32(luma.odd.high, chroma.high));
+}
+template <int n>
+inline Bytes subtractNarrowed(const EvenOdd& luma, const Two<SignedWords>& chroma) {
+  return detail::narrowedColumns<n>(
+      vsubhn_s32(luma.even.low, chroma.low), vsubhn_s32(luma.even.high, chroma.high),
+      vsubhn_s32(luma.odd.low, chroma.low), vsubhn_s32(luma.odd.high, chroma.high));
+}
 
 }  // namespace HPC::fastcv::arm

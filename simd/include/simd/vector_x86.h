@@ -451,4 +451,150 @@ inline BytePairs centredPairs(Halves first, Halves second) {
 }
 inline void storePairs(unsigned char* p, BytePairs v) { store(p, v); }
 
+// ---- samples of chroma
+
+/// 16 chroma samples, which belong to 32 columns: here in 16 bits, which are the places of their columns.
+using Samples = Halves;
+/// How many blocks of bytes the 32 columns are.
+inline constexpr int kSampleBlocks = 1;
+
+inline Samples loadSamples(const unsigned char* p) {
+  return x86::as<Samples>(_mm256_cvtepu8_epi16(x86::loadHalf(p)));
+}
+inline void loadSamplePairs(const unsigned char* p, Samples& first, Samples& second) {
+  const auto both = std::bit_cast<Halves>(load(p));
+  first = both & 0xff;
+  second = both >> 8;
+}
+/// The block number `part` of two, of which 16 bytes each lie `step` behind those before: here all of it.
+inline Bytes loadParts(const unsigned char* p, ptrdiff_t step, int /*part*/) {
+  return x86::as<Bytes>(x86::loadHalves(p, p + step));
+}
+
+inline Bytes reversed(Bytes v) {
+  static constexpr unsigned char kOrder[] = {15, 14, 13, 12, 11, 10, 9, 8, 7, 6, 5, 4, 3, 2, 1, 0};
+  const __m256i each = x86::m(shuffled(v, kOrder));
+  return x86::as<Bytes>(_mm256_permute2x128_si256(each, each, 1));
+}
+inline Samples reversed(Samples v) {
+  // The bytes of a sample change places too.
+  const auto bytes = std::bit_cast<Halves>(reversed(std::bit_cast<Bytes>(v)));
+  return bytes >> 8;
+}
+
+inline Halves multiply(Samples a, unsigned char weight) {
+  return x86::as<Halves>(x86::product(x86::m(a), weight));
+}
+inline Halves multiplyAdd(Halves sum, Samples a, unsigned char weight) { return sum + multiply(a, weight); }
+inline SignedHalves asSigned(Halves a) { return std::bit_cast<SignedHalves>(a); }
+
+/// What 16 samples add, as bytes, and the bytes of the columns of block `part`. Here limited from below
+/// alone.
+template <int n>
+inline Bytes sampleBytes(SignedHalves a) {
+  static constexpr unsigned char kTwice[] = {0, 0, 2, 2, 4, 4, 6, 6, 8, 8, 10, 10, 12, 12, 14, 14};
+  const __m256i rounded = _mm256_srai_epi16(x86::m(a + static_cast<int16_t>(1 << (n - 1))), n);
+  return shuffled(x86::as<Bytes>(_mm256_max_epi16(rounded, x86::zero())), kTwice);
+}
+template <int part>
+inline Bytes spread(Bytes v) {
+  return v;
+}
+
+// ---- lanes of 32 bits
+
+/// Of sixteen neighbouring samples, or of the even or the odd columns of a block.
+struct EvenOdd {
+  Two<SignedWords> even;
+  Two<SignedWords> odd;
+};
+
+namespace x86 {
+// Bytes `first`, `first` + `step`, ... of each half, one to a lane of 32 bits, as 128 times the byte and the
+// byte: what `multiplyPairs` takes.
+template <int first, int step>
+inline __m256i pairsOf(__m256i bytes) {
+  static constexpr Table kFourTimes = tableOf([](int i) { return first + step * (i / 4); });
+  return _mm256_maddubs_epi16(_mm256_shuffle_epi8(bytes, kFourTimes.twice()), _mm256_set1_epi32(0x00014040));
+}
+// The byte times `factor`, of up to 22 bits and a sign.
+inline SignedWords multiplyPairs(__m256i pairs, int factor) {
+  const uint32_t high = static_cast<uint16_t>(factor >> 7), low = static_cast<uint32_t>(factor) & 0x7f;
+  return as<SignedWords>(_mm256_madd_epi16(pairs, _mm256_set1_epi32(static_cast<int>(low << 16 | high))));
+}
+// Limited sums of the even and of the odd columns, in turn.
+template <int n>
+inline Bytes narrowedColumns(const Two<SignedWords>& even, const Two<SignedWords>& odd) {
+  // The upper halves, of which that of an even column goes where the lower one of its odd column is.
+  const auto merged = [](SignedWords e, SignedWords o) {
+    return as<SignedHalves>(_mm256_blend_epi16(_mm256_srli_epi32(m(e), 16), m(o), 0xaa));
+  };
+  return narrowRounded<n - 16>(Two<SignedHalves>{merged(even.low, odd.low), merged(even.high, odd.high)});
+}
+}  // namespace x86
+
+/// The bytes of a block times a factor of up to 22 bits; bytes are less than 240.
+inline EvenOdd multiplyWords(Bytes a, int factor) {
+  const auto each = [=](__m256i pairs) { return x86::multiplyPairs(pairs, factor); };
+  return {{each(x86::pairsOf<0, 2>(x86::m(a))), each(x86::pairsOf<8, 2>(x86::m(a)))},
+          {each(x86::pairsOf<1, 2>(x86::m(a))), each(x86::pairsOf<9, 2>(x86::m(a)))}};
+}
+
+/// (luma + chroma + 2^(n-1)) >> n, limited to a byte, of the even and the odd column of each sample; n is
+/// more than 16, and (luma + chroma) >> 16 fits 16 bits.
+template <int n>
+inline Bytes addNarrowed(const EvenOdd& luma, const Two<SignedWords>& chroma) {
+  return x86::narrowedColumns<n>({luma.even.low + chroma.low, luma.even.high + chroma.high},
+                                 {luma.odd.low + chroma.low, luma.odd.high + chroma.high});
+}
+template <int n>
+inline Bytes subtractNarrowed(const EvenOdd& luma, const Two<SignedWords>& chroma) {
+  return x86::narrowedColumns<n>({luma.even.low - chroma.low, luma.even.high - chroma.high},
+                                 {luma.odd.low - chroma.low, luma.odd.high - chroma.high});
+}
+
+/// 16 stored samples less 128, each as what products with factors of 22 bits are made of.
+struct CentredSamples {
+  __m256i low, high;
+};
+inline CentredSamples loadCentredSamples(const unsigned char* p) {
+  const __m256i v = _mm256_sub_epi16(_mm256_cvtepu8_epi16(x86::loadHalf(p)), _mm256_set1_epi16(128));
+  const __m256i scaled = _mm256_slli_epi16(v, 7);
+  return {_mm256_unpacklo_epi16(scaled, v), _mm256_unpackhi_epi16(scaled, v)};
+}
+inline Two<SignedWords> multiply(const CentredSamples& a, int factor) {
+  return {x86::multiplyPairs(a.low, factor), x86::multiplyPairs(a.high, factor)};
+}
+
+/// The first three channels of every second pixel, each as what products with factors of 22 bits are made of.
+struct WideColours {
+  __m256i c[3][2];
+};
+inline WideColours wideColours(const EvenColours& v) {
+  return {{{x86::pairsOf<0, 4>(v.v[0]), x86::pairsOf<0, 4>(v.v[1])},
+           {x86::pairsOf<1, 4>(v.v[0]), x86::pairsOf<1, 4>(v.v[1])},
+           {x86::pairsOf<2, 4>(v.v[0]), x86::pairsOf<2, 4>(v.v[1])}}};
+}
+/// (w.c0 c0 + w.c1 c1 + w.c2 c2 + bias) >> n of each pixel, from 0 to 255.
+template <int n, Weights w>
+inline Halves weighedShifted(const WideColours& v, int bias) {
+  const auto sum = [=](__m256i c0, __m256i c1, __m256i c2) {
+    const SignedWords all =
+        x86::multiplyPairs(c0, w.c0) + x86::multiplyPairs(c1, w.c1) + (x86::multiplyPairs(c2, w.c2) + bias);
+    return x86::m(all >> n);
+  };
+  return x86::as<Halves>(
+      _mm256_packs_epi32(sum(v.c[0][0], v.c[1][0], v.c[2][0]), sum(v.c[0][1], v.c[1][1], v.c[2][1])));
+}
+/// Stores 16 lanes below 256 at `p`, and 16 at `q`.
+inline void storeSamples(unsigned char* p, Halves first, unsigned char* q, Halves second) {
+  const __m256i both = _mm256_packus_epi16(x86::m(first), x86::m(second));
+  x86::storeHalves(p, q, _mm256_permute4x64_epi64(both, 0xd8));
+}
+
+/// (a factor) >> 16, without signs.
+inline Halves multiplyHigh(Halves a, uint16_t factor) {
+  return x86::as<Halves>(_mm256_mulhi_epu16(x86::m(a), _mm256_set1_epi16(static_cast<int16_t>(factor))));
+}
+
 }  // namespace HPC::fastcv::arm
