@@ -30,14 +30,14 @@ public final class FuzzCalls {
 
         @Override
         protected int next(int bits) {
-            if (bytes == null || atEnd()) {
+            if (bytes == null || atEnd()) { // the superclass chooses before there are any
                 return super.next(bits);
             }
             int value = 0;
             for (int taken = 0; taken < bits && !atEnd(); taken += 8) {
                 value = value << 8 | bytes[next++] & 0xff;
             }
-            return value >>> 32 - bits == 0 ? value : value & (int) ((1L << bits) - 1);
+            return value & (int) ((1L << bits) - 1);
         }
     }
 
