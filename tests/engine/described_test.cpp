@@ -80,15 +80,20 @@ std::string TextOf(const Feature& feature) {
 
 class DescribedTest : public testing::Test {
  protected:
+  // The model, its file and the verifier are large, and the same for all tests.
   static void SetUpTestSuite() {
-    model_ = new std::vector<uint8_t>(FileOf(RandomModel(FaceDescriptorShape(), 21)));
+    convolutions_ = new auto(RandomModel(FaceDescriptorShape(), 21));
+    model_ = new std::vector<uint8_t>(FileOf(*convolutions_));
     files_ = new Files;
     path_ = new std::string(files_->Write("model", *model_));
+    shared_ = new Verifier(*path_);
   }
   static void TearDownTestSuite() {
+    delete shared_;
     delete files_;
     delete model_;
     delete path_;
+    delete convolutions_;
   }
 
   std::unique_ptr<Feature> FeatureOf(const TestFrame& frame, const ky_face_t& face) const {
@@ -100,6 +105,12 @@ class DescribedTest : public testing::Test {
 
   std::unique_ptr<Feature> PortraitFeature(int format = KY_PIXEL_RGB) const {
     return FeatureOf(TestFrame(Portrait(), format), FaceWithEyes(kLeftEye, kRightEye));
+  }
+
+  /// The text of the portrait's feature, which many tests take.
+  const std::string& PortraitText() const {
+    static const std::string text = TextOf(*PortraitFeature());
+    return text;
   }
 
   static int Create(const std::vector<uint8_t>& bytes) {
@@ -118,10 +129,12 @@ class DescribedTest : public testing::Test {
     return score;
   }
 
+  static inline std::vector<ModelConvolution>* convolutions_ = nullptr;
   static inline std::vector<uint8_t>* model_ = nullptr;
   static inline Files* files_ = nullptr;
   static inline std::string* path_ = nullptr;
-  const Verifier verifier_{*path_};
+  static inline Verifier* shared_ = nullptr;
+  const Verifier& verifier_ = *shared_;
 };
 
 TEST_F(DescribedTest, TellsItsVersionAndLength) {
@@ -200,7 +213,7 @@ std::string Sealed(std::vector<uint8_t> bytes) {
 }
 
 TEST_F(DescribedTest, TextsThatWereNeverWrittenAreRefused) {
-  const std::string text = TextOf(*PortraitFeature());
+  const std::string& text = PortraitText();
   const std::vector<uint8_t> bytes = FromBase64(text);
   ASSERT_EQ(text, Sealed(bytes));
   for (size_t i = 0; i < bytes.size(); ++i) {
@@ -233,7 +246,7 @@ TEST_F(DescribedTest, TextsThatWereNeverWrittenAreRefused) {
 }
 
 TEST_F(DescribedTest, SimilarityIsHalfAtTheThresholdsDistance) {
-  const std::vector<uint8_t> bytes = FromBase64(TextOf(*PortraitFeature()));
+  const std::vector<uint8_t> bytes = FromBase64(PortraitText());
   std::array<float, 128> numbers = {};
   const auto feature_of = [&] {
     std::vector<uint8_t> changed = bytes;
@@ -290,7 +303,7 @@ TEST_F(DescribedTest, KindsNeverCompare) {
 }
 
 TEST_F(DescribedTest, ColourCounts) {
-  const std::string rgb = TextOf(*PortraitFeature(KY_PIXEL_RGB));
+  const std::string& rgb = PortraitText();
   for (const int format : {KY_PIXEL_BGR, KY_PIXEL_BGRA, KY_PIXEL_RGBA}) {
     EXPECT_EQ(rgb, TextOf(*PortraitFeature(format))) << format;
   }
@@ -338,8 +351,7 @@ std::vector<uint8_t> Following(const std::string& bytes) { return {bytes.begin()
 TEST_F(DescribedTest, ALandmarkModelMayFollow) {
   const std::vector<ky_pointf_t> places = FivePoints({0.3F, 0.3F}, {0.7F, 0.33F});
   Files files;
-  const Verifier both(
-      files.Write("both", FileOf(RandomModel(FaceDescriptorShape(), 21), Following(Landmarks(places)))));
+  const Verifier both(files.Write("both", FileOf(*convolutions_, Following(Landmarks(places)))));
   EXPECT_EQ(KY_DESCRIPTOR_VERSION, ky_verify_get_version(both));
   const TestFrame frame(Portrait(), KY_PIXEL_RGB);
   ky_face_t face = {};
@@ -359,7 +371,7 @@ TEST_F(DescribedTest, ALandmarkModelMayFollow) {
 }
 
 TEST_F(DescribedTest, DamagedFilesAreRefused) {
-  const auto model = RandomModel(FaceDescriptorShape(), 21);
+  const auto& model = *convolutions_;
   const std::string landmarks = Landmarks(FivePoints({0.3F, 0.3F}, {0.7F, 0.33F}));
   const std::vector<uint8_t> both = FileOf(model, Following(landmarks));
   EXPECT_EQ(KY_SUCCESS, Create(both));
