@@ -39,9 +39,10 @@ NO_CODE = re.compile(
     r"""//[^\n]*|/\*.*?\*/|R"\((?:.*?)\)"|"(?:\\.|[^"\\\n])*"|'(?:\\.|[^'\\\n])'|^[ \t]*\#(?:\\\n|[^\n])*""",
     re.DOTALL | re.MULTILINE,
 )
-# Code of which no test can see a change: what only the compiler reads, and what is printed for people.
+# Code of which no test can see a change: what only the compiler reads, what keeps it from a choice, and what is printed
+# for people.
 UNSEEN = re.compile(
-    r"static_assert\s*\(.*?;|\[\[.*?\]\]|^\s*(?:import|package|using|namespace)\b[^\n]*|^FASTCV_\w+\([^)]*\)",
+    r"\basm(?: volatile)?\(.*?\);|static_assert\s*\(.*?;|\[\[.*?\]\]|^\s*(?:import|package|using|namespace)\b[^\n]*|^FASTCV_\w+\([^)]*\)",
     re.DOTALL | re.MULTILINE,
 )
 

@@ -4,7 +4,7 @@
 
 import unittest
 
-from mutants import mutants
+from mutants import mutants, only_for
 
 
 def changes(text, kind=None):
@@ -43,9 +43,18 @@ class Mutants(unittest.TestCase):
             "#define A(x) f(x, 1) \\\n    + 2 < 3",
             "#include <a1>",
             "static_assert(sizeof(T) == 4);",
+            '  asm("" : "+w"(v[1]));',
+            '  asm volatile("" ::: "memory");',
             "std::vector<int> v;",
         ):
             self.assertEqual(changes(text), set(), text)
+
+    def test_branches(self):
+        text = "a\n#if defined(__ARM_NEON)\nb\n#  ifdef X\nc\n#  endif\n#else\nd\n#endif\n#if !defined(__ARM_NEON)\ne\n#endif\nf"
+        for arm, own in ((True, "bc"), (False, "de")):
+            lines = dict(zip(text.split("\n"), only_for(arm, text)))
+            for name in "abcdef":
+                self.assertEqual(lines[name], None if name in "af" else name in own, name)
 
     def test_applies_at_its_place(self):
         text = "f(1);\nint a = 1;  // 1\n"
