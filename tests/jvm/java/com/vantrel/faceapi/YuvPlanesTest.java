@@ -189,15 +189,23 @@ public final class YuvPlanesTest {
 
     @Test
     public void planesThatChangeAreNoticed() {
-        ByteBuffer v = bytes(6);
+        String[] names = {"y", "u", "v"};
+        ByteBuffer[] buffers = {bytes(24), bytes(6), bytes(6)};
         YuvPlanes planes = YuvPlanes.of(
-                6, 4, new Plane(bytes(24), 6, 1), new Plane(bytes(6), 3, 1), new Plane(v, 3, 1));
-        v.position(1);
-        refuses("v must have at least 6 bytes from its position on, not 5", planes::checkSet);
-        v.position(0);
-        planes.checkSet();
-        v.limit(5);
-        refuses("v must have at least 6 bytes from its position on, not 5", planes::checkSet);
+                6, 4, new Plane(buffers[0], 6, 1), new Plane(buffers[1], 3, 1), new Plane(buffers[2], 3, 1));
+        for (int i = 0; i < names.length; i++) {
+            int whole = buffers[i].limit();
+            String complaint = names[i] + " must have at least " + whole + " bytes from its position on, not "
+                    + (whole - 1);
+            buffers[i].position(1);
+            refuses(complaint, planes::checkSet);
+            buffers[i].position(0);
+            planes.checkSet();
+            buffers[i].limit(whole - 1);
+            refuses(complaint, planes::checkSet);
+            buffers[i].limit(whole);
+            planes.checkSet();
+        }
     }
 
     @Test
