@@ -17,6 +17,7 @@ from .counting import NEWER_OPENCV, OPENCV, OWN, Key
 # A pass makes the buffers anew, so that no figure hangs on where they happened to lie, which for a rotation is much of it.
 # In a round of a pass everybody has a turn of as many calls as take about this long, in random order.
 PASSES = 15
+FEW_PASSES = 5  # where figures are many and only stand beside others
 ROUNDS = 2
 TURN_NANOSECONDS = 4_000_000
 
@@ -79,14 +80,14 @@ def in_python(contenders, opencv):
             for each in contenders if each.library == OPENCV and opencv.prepared(each.operation, (16, 16))]
 
 
-def measured(contenders, sizes):
+def measured(contenders, sizes, passes=PASSES):
     """{Key: Time} of pictures of these sizes, "1280x720"."""
     groups = {}
     for contender in contenders:
         groups.setdefault(contender.operation, []).append(contender)
     turns = {Key(each.operation, each.library, size): [] for size in sizes for each in contenders}
     order = random.Random(1)
-    for _ in range(PASSES):
+    for _ in range(passes):
         for size, group in order.sample([*itertools.product(sizes, groups.values())], len(sizes) * len(groups)):
             _take_turns(group, size, turns, order)
     return {Key(each.operation, each.library, size): _time(each, size, turns) for size in sizes for each in contenders}
