@@ -48,9 +48,9 @@ int built() { return sized<1>() < 4 || 4 / 4 == 1; }
 }  # fmt: skip
 
 
-def campaign(root):
+def campaign(root, report=False):
     """(exit status, what it printed) of a campaign over the small project."""
-    arguments = Namespace(path=[], sample=None, seed=1, preset="host", jobs=2, branches=False, tests="", list=False)
+    arguments = Namespace(path=[], sample=None, seed=1, preset="host", jobs=2, branches=False, tests="", list=False, report=report)
     printed = io.StringIO()
     with contextlib.redirect_stdout(printed), contextlib.redirect_stderr(io.StringIO()):
         status = Campaign(root, arguments).run()
@@ -74,7 +74,8 @@ class Campaigns(unittest.TestCase):
             self.assertEqual(by_change["+ -> -"], "noticed")
             self.assertEqual(by_change["<< -> >>"], "unnoticed")
             self.assertEqual(by_change["3 -> 4"], "unnoticed")
-            self.assertIn("fastcv/sum.cpp:2: shift: << -> >>", printed)
+            self.assertIn("fastcv/sum.cpp: int unseen(int a) { return a << 3; } @29 shift: << -> >>\n", printed)
+            self.assertEqual(campaign(root, report=True), (status, printed), "and so again, without a trial")
             self.assertEqual((root / "fastcv/sum.cpp").read_text(), FILES["fastcv/sum.cpp"])
             copy = root / "build/mutate/tree/fastcv/sum.cpp"
             self.assertEqual(copy.read_text(), FILES["fastcv/sum.cpp"], "put back")

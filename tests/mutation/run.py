@@ -295,6 +295,8 @@ class Campaign:
         return drawn
 
     def run(self):
+        if self.arguments.report:
+            return self._report(self._kept())
         candidates = self.candidates()
         if self.arguments.list:
             for mutant in candidates:
@@ -335,14 +337,17 @@ class Campaign:
                     f"{number}/{len(candidates)} {result['result']} {result.get('by', '')}: "
                     f"{mutant.path}:{mutant.line}: {mutant.kind}: {mutant.before} -> {mutant.after}"
                 )
-        return self._report(candidates, results)
+        return self._report({mutant.key: results[mutant.key] for mutant in candidates})
+
+    def _kept(self):
+        """What was tried by now; of two trials of one change the later counts."""
+        lines = self.results_file.read_text().splitlines() if self.results_file.exists() else []
+        kept = {entry["key"]: entry for entry in map(json.loads, lines)}
+        return {key: {"result": EQUIVALENT} if key in self.equivalent else entry for key, entry in kept.items()}
 
     def _earlier(self):
-        if not self.results_file.exists():
-            return {}
-        lines = (json.loads(line) for line in self.results_file.read_text().splitlines())
         # What was not noticed, or is no longer listed as equivalent, may be by now.
-        return {entry["key"]: entry for entry in lines if entry["result"] in (NOTICED, UNBUILT, HANGS)}
+        return {key: entry for key, entry in self._kept().items() if entry["result"] in (NOTICED, UNBUILT, HANGS)}
 
     def _recent(self, path):
         """The two tests that were last to notice a change to a file."""
@@ -376,24 +381,23 @@ class Campaign:
         finally:
             file.write_text(text)
 
-    def _report(self, candidates, results):
+    def _report(self, results):
+        """Prints a table by layer and what was not noticed; 1 when there is any."""
         kinds = (NOTICED, HANGS, UNNOTICED, EQUIVALENT, UNBUILT)
         by_area = defaultdict(Counter)
-        for mutant in candidates:
-            result = results[mutant.key]["result"]
-            by_area[area_of(mutant.path)][result] += 1
-            by_area["all"][result] += 1
+        for key, entry in results.items():
+            by_area[area_of(key)][entry["result"]] += 1
+            by_area["all"][entry["result"]] += 1
         print("| area | " + " | ".join(kinds) + " | of those that can be noticed |")
         print("|---" * (len(kinds) + 2) + "|")
-        for area, counts in by_area.items():
+        for area, counts in sorted(by_area.items(), key=lambda entry: (entry[0] == "all", entry[0])):
             seen = counts[NOTICED] + counts[HANGS]
             could = seen + counts[UNNOTICED]
             share = f"{100 * seen / could:.1f} %" if could else ""
             print(f"| {area} | " + " | ".join(str(counts[kind]) for kind in kinds) + f" | {share} |")
-        survivors = [mutant for mutant in candidates if results[mutant.key]["result"] == UNNOTICED]
-        for mutant in survivors:
-            print(f"{mutant.path}:{mutant.line}: {mutant.kind}: {mutant.before} -> {mutant.after}")
-            print(f"    {mutant.context}")
+        survivors = [key for key, entry in results.items() if entry["result"] == UNNOTICED]
+        for key in survivors:
+            print(key)
         return 1 if survivors else 0
 
     @staticmethod
