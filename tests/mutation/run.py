@@ -201,7 +201,7 @@ class Tree:
             limit = int(max(self.tests[name].seconds for name in stage) * 8 + 20)
             code, output = self._quiet(self._ctest(stage, limit, stop=True), 7200)
             if code != 0:
-                failed = re.search(r"Test +#\d+: (\S+) [ .]*(\*\*\*(?!Skipped)[^\n]*)", output)
+                failed = re.search(r"Test +#\d+: (\S+) [ .]*([A-Za-z ]*\*\*\*(?!Skipped)[^\n]*)", output)
                 if failed is None:
                     return "ctest", ""  # it was ended itself
                 return failed.group(1), failed.group(2)
