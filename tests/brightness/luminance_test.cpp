@@ -5,13 +5,16 @@
 
 #include <gtest/gtest.h>
 
+#include <algorithm>
 #include <cmath>
 #include <vector>
 
 #include "brightness/brightness.h"
 #include "brightness/src/lightness_sum.h"
 #include "brightness/src/luminance_tables.h"
+#include "brightness/total_lightness.h"
 #include "tests/support/lab_reference.h"
+#include "tests/support/sparse_memory.h"
 
 namespace {
 
@@ -111,5 +114,25 @@ void expectEveryColour() {
 
 TEST(LightnessSum, EveryColourBlueFirst) { expectEveryColour<0>(); }
 TEST(LightnessSum, EveryColourRedFirst) { expectEveryColour<2>(); }
+
+/// White pixels, as many as have a sum that 32 bits do not hold, in the memory of a few.
+TEST(TotalLightness, IsWholeBeyond32Bits) {
+  constexpr size_t kBlock = 1 << 16;
+  constexpr int kColumns = 1029 * (kBlock / 4);
+  static_assert(int64_t{kColumns} * 255 > int64_t{1} << 32);
+  const kyface::test::RepeatedMemory memory(1029, kBlock);
+  unsigned char* const pixels = memory.as<unsigned char>();
+  std::fill_n(pixels, kBlock, 255);
+  std::fill_n(pixels + 1028 * kBlock, kBlock, 255);
+  for (const bool rgba : {false, true}) {
+    const auto total = [&](int columns, int rows) {
+      return kyface::brightness::total_lightness(pixels, 0, columns, rows, rgba);
+    };
+    EXPECT_EQ(total(kColumns, 1), uint64_t{255} * kColumns);
+    EXPECT_EQ(total(kColumns - 5, 2), uint64_t{255} * 2 * (kColumns - 5)) << "a row that is parted twice";
+    EXPECT_EQ(total(kColumns / 3, 4), uint64_t{255} * 4 * (kColumns / 3))
+        << "rows of which some fit together";
+  }
+}
 
 }  // namespace
