@@ -61,7 +61,7 @@ def fault_of(root, layers, folder, source, quote, name):
             return "a public header names headers by their layer"
         return None
     if folder in TOP and (root / name).is_file():
-        return None if folder == "tests" or name.startswith("tests/support/") else "a header that is kept from it"
+        return None if folder in ("tests", "fuzz") or name.startswith("tests/support/") else "a header that is kept from it"
     return "no public header of a layer, and none beside it"
 
 

@@ -15,6 +15,7 @@
 #include "fastcv/kernels.h"
 #include "tests/support/death.h"
 #include "tests/support/guarded_image.h"
+#include "tests/support/rotated.h"
 
 namespace {
 
@@ -24,6 +25,8 @@ using HPC::fastcv::imgRotate270degree;
 using HPC::fastcv::imgRotate90degree;
 using kyface::test::GuardedImage;
 using kyface::test::literally;
+using kyface::test::Place;
+using kyface::test::sourceOf;
 using u8 = unsigned char;
 
 // Any bit pattern; as floats they are also infinities, denormals and signalling NaNs, which must not change.
@@ -41,23 +44,6 @@ class Bits {
  private:
   std::minstd_rand engine_;
 };
-
-struct Place {
-  int row;
-  int column;
-};
-
-// The source pixel that belongs at destination (r, c).
-Place sourceOf(int degree, int height, int width, int r, int c) {
-  switch (degree) {
-    case 90:
-      return {height - 1 - c, r};
-    case 180:
-      return {height - 1 - r, width - 1 - c};
-    default:
-      return {c, width - 1 - r};
-  }
-}
 
 template <typename T, int channels>
 struct Instance {

@@ -14,6 +14,7 @@
 #include "fastcv/kernels.h"
 #include "tests/support/death.h"
 #include "tests/support/guarded_image.h"
+#include "tests/support/rotated.h"
 #include "tests/support/sparse_memory.h"
 
 // Refusing memory takes an allocator of one's own, which a sanitizer already is.
@@ -70,6 +71,8 @@ using HPC::fastcv::imgRotate_I420;
 using kyface::test::ByteSource;
 using kyface::test::GuardedImage;
 using kyface::test::literally;
+using kyface::test::Place;
+using kyface::test::sourceOf;
 using kyface::test::SparseMemory;
 using u8 = unsigned char;
 using Offset = ptrdiff_t;
@@ -123,22 +126,6 @@ class Frame {
   std::vector<Offset> u_;
   std::vector<Offset> v_;
 };
-
-struct Place {
-  int row;
-  int column;
-};
-
-Place sourceOf(int degree, int height, int width, int r, int c) {
-  switch (degree) {
-    case 90:
-      return {height - 1 - c, r};
-    case 180:
-      return {height - 1 - r, width - 1 - c};
-    default:
-      return {c, width - 1 - r};
-  }
-}
 
 // Calls `sample(destination, source)` with the offsets of every sample that a rotation moves.
 template <typename Sample>

@@ -1,0 +1,28 @@
+// SPDX-FileCopyrightText: the libjni_kyface_api authors
+// SPDX-License-Identifier: Apache-2.0
+/// What a layout of `convert_planes` means for the size of a result.
+#pragma once
+
+#include "frame/planes.h"
+
+namespace kyface::test {
+
+/// Bytes of a pixel; of a pixel's luma in the 4:2:0 layouts.
+inline int pixel_bytes_of(PixelLayout layout) {
+  switch (layout) {
+    case PixelLayout::kRgba:
+    case PixelLayout::kBgra:
+      return 4;
+    case PixelLayout::kRgb:
+    case PixelLayout::kBgr:
+      return 3;
+    default:
+      return 1;
+  }
+}
+
+inline bool is_semi_planar(PixelLayout layout) {
+  return layout == PixelLayout::kNv21 || layout == PixelLayout::kNv12;
+}
+
+}  // namespace kyface::test
