@@ -66,9 +66,9 @@ void addView(std::vector<Operation>& operations, bool pairs, const Layout& layou
          const auto out = samples<unsigned char>(size.pixels() * 4);
          const int outWidth = rotatedBy(degrees == 0 ? 180 : degrees, size).width;
          return [=] {
-           if (kyface::convert_planes(planes.picture, {0, 0, size.width, size.height}, {degrees, mirrored},
-                                      {out.get(), static_cast<std::int64_t>(size.pixels()) * 4,
-                                       std::int64_t{outWidth} * layout.bytes, layout.layout}) !=
+           if (kyface::convertPlanes(planes.picture, {0, 0, size.width, size.height}, {degrees, mirrored},
+                                     {out.get(), static_cast<std::int64_t>(size.pixels()) * 4,
+                                      std::int64_t{outWidth} * layout.bytes, layout.layout}) !=
                kyface::PlanesStatus::kSuccess) {
              std::abort();
            }

@@ -14,6 +14,7 @@
 #include "fuzz_input.h"
 #include "tests/support/frame_reference.h"
 #include "tests/support/guarded_image.h"
+#include "tests/support/pixel_layout.h"
 
 namespace {
 
@@ -26,6 +27,8 @@ using kyface::Rectangle;
 using kyface::Target;
 using kyface::fuzz::Input;
 using kyface::test::GuardedImage;
+using kyface::test::is_semi_planar;
+using kyface::test::pixel_bytes_of;
 using Bytes = std::vector<unsigned char>;
 
 /// Bytes that end at a protected page.
@@ -35,23 +38,6 @@ class Memory : public GuardedImage<unsigned char> {
 };
 
 int64_t bytes_of(int64_t rows, int64_t stride, int64_t row) { return (rows - 1) * stride + row; }
-
-int channels_of(PixelLayout layout) {
-  switch (layout) {
-    case PixelLayout::kRgba:
-    case PixelLayout::kBgra:
-      return 4;
-    case PixelLayout::kRgb:
-    case PixelLayout::kBgr:
-      return 3;
-    default:
-      return 1;
-  }
-}
-
-bool is_semi_planar(PixelLayout layout) {
-  return layout == PixelLayout::kNv21 || layout == PixelLayout::kNv12;
-}
 
 /// The column and row of the picture that pixel (`x`, `y`) of the view shows. `part` is even.
 struct Place {
@@ -75,7 +61,7 @@ Place source_of(const Rectangle& part, const Orientation& orientation, int x, in
 }
 
 unsigned char sample(const Plane& plane, int column, int row) {
-  return plane.data[int64_t{row} * plane.row_stride + int64_t{column} * plane.pixel_stride];
+  return plane.data[int64_t{row} * plane.rowStride + int64_t{column} * plane.pixelStride];
 }
 
 /// The rows of the view, without padding.
@@ -108,7 +94,7 @@ Bytes expected(const PlanarPicture& picture, const Rectangle& part, const Orient
   }
   const bool rgb = layout == PixelLayout::kRgba || layout == PixelLayout::kRgb;
   return reference::to_pixels(frame, width, height, reference::kNv21,
-                              {rgb ? 2 : 0, rgb ? 0 : 2, channels_of(layout)});
+                              {rgb ? 2 : 0, rgb ? 0 : 2, pixel_bytes_of(layout)});
 }
 
 int even(int value) { return value & ~1; }
@@ -126,10 +112,10 @@ void disturb(Input& input, PlanarPicture& picture, Rectangle& part, Orientation&
       picture.height = input.any();
       break;
     case 2:
-      plane.row_stride = input.any();
+      plane.rowStride = input.any();
       break;
     case 3:
-      plane.pixel_stride = input.any();
+      plane.pixelStride = input.any();
       break;
     case 4:
       // Never more than there is.
@@ -173,12 +159,12 @@ bool fits(const PlanarPicture& picture, const Rectangle& part, const Orientation
     return data != nullptr && stride >= row && (rows - 1) * stride + row <= size;
   };
   const auto plane_holds = [&](const Plane& plane, Wide width, Wide height) {
-    return plane.pixel_stride >= 1 &&
-           holds(plane.data, plane.size, plane.row_stride, height, (width - 1) * plane.pixel_stride + 1);
+    return plane.pixelStride >= 1 &&
+           holds(plane.data, plane.size, plane.rowStride, height, (width - 1) * plane.pixelStride + 1);
   };
   const Wide width = picture.width;
   const Wide height = picture.height;
-  if (width < 1 || height < 1 || width % 2 != 0 || height % 2 != 0 || picture.y.pixel_stride != 1 ||
+  if (width < 1 || height < 1 || width % 2 != 0 || height % 2 != 0 || picture.y.pixelStride != 1 ||
       !plane_holds(picture.y, width, height) || !plane_holds(picture.u, width / 2, height / 2) ||
       !plane_holds(picture.v, width / 2, height / 2)) {
     return false;
@@ -202,7 +188,7 @@ bool fits(const PlanarPicture& picture, const Rectangle& part, const Orientation
   const bool sideways = degrees % 180 != 0;
   const Wide rows = sideways ? across : down;
   return holds(target.data, target.size, target.stride, is_semi_planar(target.layout) ? rows * 3 / 2 : rows,
-               (sideways ? down : across) * channels_of(target.layout));
+               (sideways ? down : across) * pixel_bytes_of(target.layout));
 }
 
 }  // namespace
@@ -215,9 +201,9 @@ extern "C" int LLVMFuzzerTestOneInput(const uint8_t* data, size_t size) {
 
   // Planes, or pairs that both chroma planes are views of.
   const int pairs = input.in(0, 2);
-  const int pixel_stride = pairs > 0 ? 2 : input.in(1, 3);
+  const int pixelStride = pairs > 0 ? 2 : input.in(1, 3);
   const int luma_stride = width + input.in(0, 5);
-  const int chroma_row = (width / 2 - 1) * pixel_stride + 1;
+  const int chroma_row = (width / 2 - 1) * pixelStride + 1;
   const int chroma_stride = chroma_row + (pairs > 0 ? 1 : 0) + input.in(0, 5);
   const auto luma_bytes = static_cast<int>(bytes_of(height, luma_stride, width));
   const auto chroma_bytes = static_cast<int>(bytes_of(height / 2, chroma_stride, chroma_row));
@@ -228,8 +214,8 @@ extern "C" int LLVMFuzzerTestOneInput(const uint8_t* data, size_t size) {
   PlanarPicture picture = {width,
                            height,
                            {luma.data(), luma_bytes, luma_stride, 1},
-                           {first.data(), chroma_bytes, chroma_stride, pixel_stride},
-                           {second.data(), chroma_bytes, chroma_stride, pixel_stride}};
+                           {first.data(), chroma_bytes, chroma_stride, pixelStride},
+                           {second.data(), chroma_bytes, chroma_stride, pixelStride}};
   if (pairs > 0) {
     picture.u.data = first.data() + (pairs - 1);
     picture.v.data = first.data() + (2 - pairs);
@@ -245,8 +231,8 @@ extern "C" int LLVMFuzzerTestOneInput(const uint8_t* data, size_t size) {
   }
   const Orientation chosen = {90 * input.in(0, 3), input.seldom(2)};
   const auto layout = PixelLayout{input.in(0, static_cast<int>(PixelLayout::kGray))};
-  const kyface::Size shown = kyface::size_of_view(part, chosen);
-  const int row = shown.width * channels_of(layout);
+  const kyface::Size shown = kyface::sizeOfView(part, chosen);
+  const int row = shown.width * pixel_bytes_of(layout);
   const int rows = is_semi_planar(layout) ? shown.height * 3 / 2 : shown.height;
   GuardedImage<unsigned char> out(rows, row, row + input.in(0, 9));
   Target target = {out.data(), bytes_of(rows, out.stride(), row), out.stride(), layout};
@@ -261,16 +247,16 @@ extern "C" int LLVMFuzzerTestOneInput(const uint8_t* data, size_t size) {
   second.fill(pixel);
 
   const Bytes before(target.data, target.data + bytes_of(rows, out.stride(), row));
-  const PlanesStatus status = kyface::convert_planes(picture, part, orientation, target);
+  const PlanesStatus status = kyface::convertPlanes(picture, part, orientation, target);
   const bool fit = fits(picture, part, orientation, target);
   FUZZ_CHECK((status == PlanesStatus::kSuccess) == fit);
   Bytes want = before;
   if (fit) {
-    const Rectangle whole = kyface::whole_pairs(part);
+    const Rectangle whole = kyface::wholePairs(part);
     FUZZ_CHECK(whole.left == even(part.left) && whole.top == even(part.top));
     const Bytes view = expected(picture, whole, orientation, target.layout);
-    const kyface::Size view_size = kyface::size_of_view(part, orientation);
-    const int64_t view_row = int64_t{view_size.width} * channels_of(target.layout);
+    const kyface::Size view_size = kyface::sizeOfView(part, orientation);
+    const int64_t view_row = int64_t{view_size.width} * pixel_bytes_of(target.layout);
     for (size_t i = 0; i < view.size(); ++i) {
       const auto at = static_cast<int64_t>(i);
       want[static_cast<size_t>(at / view_row * target.stride + at % view_row)] = view[i];

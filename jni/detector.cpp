@@ -22,8 +22,8 @@ struct Detector {
 
 jobjectArray kyFaceDetect(JNIEnv* env, long long handle, const unsigned char* image, int pixelFormat,
                           int width, int height, int stride, int orientation, jintArray status) {
-  return kyface::analyse_faces<Detector>(env, handle, image, pixelFormat, width, height, stride, orientation,
-                                         status);
+  return kyface::analyseFaces<Detector>(env, handle, image, pixelFormat, width, height, stride, orientation,
+                                        status);
 }
 
 }  // namespace
@@ -46,7 +46,7 @@ JNIEXPORT jlong JNICALL Java_com_vantrel_faceapi_FaceLibrary_kyFaceCreateDetecto
     return 0;
   }
   path.release();
-  return kyface::to_java(handle);
+  return kyface::toJava(handle);
 }
 
 JNIEXPORT void JNICALL Java_com_vantrel_faceapi_FaceLibrary_kyFaceDestroyDetector(JNIEnv* /*env*/,
@@ -56,7 +56,7 @@ JNIEXPORT void JNICALL Java_com_vantrel_faceapi_FaceLibrary_kyFaceDestroyDetecto
     FACE_LOG(ANDROID_LOG_ERROR, "kyFaceDestroyDetector destroy detect handle is null");
     return;
   }
-  ky_face_destroy_detector(kyface::to_handle(handle));
+  ky_face_destroy_detector(kyface::toHandle(handle));
   FACE_LOG(ANDROID_LOG_DEBUG, "ky_face_destroy_detector");
 }
 
@@ -64,9 +64,9 @@ JNIEXPORT jfloat JNICALL Java_com_vantrel_faceapi_FaceLibrary_getDetectThreshold
                                                                                  jlong handle,
                                                                                  jintArray status) {
   float threshold = 0.0F;
-  const int result = ky_face_detect_get_threshold(kyface::to_handle(handle), &threshold);
+  const int result = ky_face_detect_get_threshold(kyface::toHandle(handle), &threshold);
   FACE_LOG(ANDROID_LOG_DEBUG, "ky_face_detect_get_threshold threshold: %f", static_cast<double>(threshold));
-  return kyface::write_status(env, status, result) ? threshold : 0.0F;
+  return kyface::writeStatus(env, status, result) ? threshold : 0.0F;
 }
 
 JNIEXPORT void JNICALL Java_com_vantrel_faceapi_FaceLibrary_setDetectThreshold(JNIEnv* env, jclass /*type*/,
@@ -75,23 +75,23 @@ JNIEXPORT void JNICALL Java_com_vantrel_faceapi_FaceLibrary_setDetectThreshold(J
   if (threshold <= 0.0F) {  // a NaN goes on to the engine
     return;
   }
-  const int result = ky_face_detect_set_threshold(kyface::to_handle(handle), threshold);
+  const int result = ky_face_detect_set_threshold(kyface::toHandle(handle), threshold);
   FACE_LOG(ANDROID_LOG_DEBUG, "ky_face_detect_set_threshold threshold: %f", static_cast<double>(threshold));
-  kyface::write_status(env, status, result);
+  kyface::writeStatus(env, status, result);
 }
 
 JNIEXPORT jobjectArray JNICALL Java_com_vantrel_faceapi_FaceLibrary_kyFaceDetectBytes(
     JNIEnv* env, jclass /*type*/, jlong handle, jbyteArray image, jint pixelFormat, jint width, jint height,
     jint stride, jint orientation, jintArray status) {
-  return kyface::analyse_array<Detector>(kyFaceDetect, env, handle, image, pixelFormat, width, height, stride,
-                                         orientation, status);
+  return kyface::analyseArray<Detector>(kyFaceDetect, env, handle, image, pixelFormat, width, height, stride,
+                                        orientation, status);
 }
 
 JNIEXPORT jobjectArray JNICALL Java_com_vantrel_faceapi_FaceLibrary_kyFaceDetectInts(
     JNIEnv* env, jclass /*type*/, jlong handle, jintArray image, jint pixelFormat, jint width, jint height,
     jint stride, jint orientation, jintArray status) {
-  return kyface::analyse_array<Detector>(kyFaceDetect, env, handle, image, pixelFormat, width, height, stride,
-                                         orientation, status);
+  return kyface::analyseArray<Detector>(kyFaceDetect, env, handle, image, pixelFormat, width, height, stride,
+                                        orientation, status);
 }
 
 JNIEXPORT jint JNICALL Java_com_vantrel_faceapi_FaceLibrary_kyFaceShowInsideModel(JNIEnv* /*env*/,

@@ -11,16 +11,16 @@
 namespace kyface {
 
 /// An engine handle as Java carries it.
-inline ky_handle_t to_handle(long long handle) {
+inline ky_handle_t toHandle(long long handle) {
   return reinterpret_cast<ky_handle_t>(handle);  // NOLINT(performance-no-int-to-ptr): what Java's long is for
 }
 
 /// Java's value of an engine handle or feature.
-inline jlong to_java(void* handle) { return reinterpret_cast<jlong>(handle); }
+inline jlong toJava(void* handle) { return reinterpret_cast<jlong>(handle); }
 
 /// Puts the engine's result code, whatever it is, into the first element of a status array. Returns false
 /// when the JVM refuses the array.
-inline bool write_status(JNIEnv* env, jintArray status, int result) {
+inline bool writeStatus(JNIEnv* env, jintArray status, int result) {
   PinnedArray pinned(env, status);
   if (!pinned) {
     return false;

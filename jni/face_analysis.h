@@ -20,8 +20,8 @@ namespace kyface {
 /// null without faces, on an engine failure (what it names is in `status[0]`), and, with `status` untouched,
 /// for a null image, a null status array and a zero handle.
 template <typename Engine>
-jobjectArray analyse_faces(JNIEnv* env, long long handle, const unsigned char* image, int pixel_format,
-                           int width, int height, int stride, int orientation, jintArray status) {
+jobjectArray analyseFaces(JNIEnv* env, long long handle, const unsigned char* image, int pixelFormat,
+                          int width, int height, int stride, int orientation, jintArray status) {
   if (image == nullptr || status == nullptr) {
     return nullptr;
   }
@@ -29,38 +29,38 @@ jobjectArray analyse_faces(JNIEnv* env, long long handle, const unsigned char* i
     FACE_LOG(ANDROID_LOG_ERROR, Engine::kHandleIsNull);
     return nullptr;
   }
-  PinnedArray pinned_status(env, status);
-  if (!pinned_status) {
+  PinnedArray pinnedStatus(env, status);
+  if (!pinnedStatus) {
     return nullptr;
   }
   ky_face_t* faces = nullptr;
   int count = 0;
-  const int result = Engine::kAnalyse(to_handle(handle), image, pixel_format, width, height, stride,
+  const int result = Engine::kAnalyse(toHandle(handle), image, pixelFormat, width, height, stride,
                                       orientation, &faces, &count);
-  pinned_status[0] = result;
-  jobjectArray java_faces = nullptr;
+  pinnedStatus[0] = result;
+  jobjectArray javaFaces = nullptr;
   if (result == 0 && faces != nullptr && count >= 1) {
-    java_faces = ky_face_t_array_to_java_face(env, faces, count);
+    javaFaces = ky_face_t_array_to_java_face(env, faces, count);
   }
   // The engine gets back whatever it stored, after a failure too.
   Engine::kRelease(faces, count);
-  return java_faces;
+  return javaFaces;
 }
 
-/// What `analyse_faces` is for one engine.
-using FaceRoutine = jobjectArray(JNIEnv* env, long long handle, const unsigned char* image, int pixel_format,
+/// What `analyseFaces` is for one engine.
+using FaceRoutine = jobjectArray(JNIEnv* env, long long handle, const unsigned char* image, int pixelFormat,
                                  int width, int height, int stride, int orientation, jintArray status);
 
 /// Calls the routine on the pixels of a Java array, of bytes or of 32-bit pixels alike.
 template <typename Engine, typename Array>
-jobjectArray analyse_array(FaceRoutine* routine, JNIEnv* env, jlong handle, Array image, jint pixel_format,
-                           jint width, jint height, jint stride, jint orientation, jintArray status) {
+jobjectArray analyseArray(FaceRoutine* routine, JNIEnv* env, jlong handle, Array image, jint pixelFormat,
+                          jint width, jint height, jint stride, jint orientation, jintArray status) {
   if (image == nullptr) {
     FACE_LOG(ANDROID_LOG_DEBUG, Engine::kImageIsNull);
     return nullptr;
   }
-  const PinnedArray pinned_image(env, image);
-  return routine(env, handle, pinned_image.bytes(), pixel_format, width, height, stride, orientation, status);
+  const PinnedArray pinnedImage(env, image);
+  return routine(env, handle, pinnedImage.bytes(), pixelFormat, width, height, stride, orientation, status);
 }
 
 }  // namespace kyface

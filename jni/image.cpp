@@ -29,7 +29,7 @@ enum ColorConversion : jint {
 
 /// Converts the pixels of an RGBA bitmap into `out`. Rows are taken as packed, whatever the bitmap's stride.
 /// Both methods over it write the messages of the first (C11 in docs/compatibility.md).
-void read_bitmap(JNIEnv* env, jobject bitmap, jbyteArray out, decltype(BGR2RGB)* convert) {
+void readBitmap(JNIEnv* env, jobject bitmap, jbyteArray out, decltype(BGR2RGB)* convert) {
   if (bitmap == nullptr) {
     FACE_LOG(ANDROID_LOG_ERROR, "getBGRADataFromBitmap image is null ");
     return;
@@ -45,9 +45,9 @@ void read_bitmap(JNIEnv* env, jobject bitmap, jbyteArray out, decltype(BGR2RGB)*
   if (pixels == nullptr) {
     return;
   }
-  if (kyface::PinnedArray pinned_out(env, out); pinned_out) {
+  if (kyface::PinnedArray pinnedOut(env, out); pinnedOut) {
     convert(static_cast<unsigned char*>(pixels), static_cast<int>(info.width), static_cast<int>(info.height),
-            pinned_out.bytes());
+            pinnedOut.bytes());
   }
   AndroidBitmap_unlockPixels(env, bitmap);
 }
@@ -105,13 +105,13 @@ JNIEXPORT void JNICALL Java_com_vantrel_faceapi_FaceLibrary_getBGRADataFromBitma
                                                                                   jclass /*type*/,
                                                                                   jobject bitmap,
                                                                                   jbyteArray out) {
-  read_bitmap(env, bitmap, out, BGR2RGB);
+  readBitmap(env, bitmap, out, BGR2RGB);
 }
 
 JNIEXPORT void JNICALL Java_com_vantrel_faceapi_FaceLibrary_getBGRDataFromBitmap(JNIEnv* env, jclass /*type*/,
                                                                                  jobject bitmap,
                                                                                  jbyteArray out) {
-  read_bitmap(env, bitmap, out, BGRA2RGB);
+  readBitmap(env, bitmap, out, BGRA2RGB);
 }
 
 JNIEXPORT void JNICALL Java_com_vantrel_faceapi_FaceLibrary_cropNv21Data(JNIEnv* env, jclass /*type*/,

@@ -16,20 +16,20 @@
 
 namespace kyface {
 
-template <jint value, jint in_java>
+template <jint value, jint inJava>
 struct JavaConstant {
-  static_assert(value == in_java);
+  static_assert(value == inJava);
   static constexpr jint kValue = value;
 };
 
 }  // namespace kyface
 
 /// `value`, which is that of the Java class's constant.
-#define JAVA_CONSTANT(java_class, name, value) \
-  kyface::JavaConstant<value, com_vantrel_faceapi_##java_class##_##name>::kValue
+#define JAVA_CONSTANT(javaClass, name, value) \
+  kyface::JavaConstant<value, com_vantrel_faceapi_##javaClass##_##name>::kValue
 
 #else
 
-#define JAVA_CONSTANT(java_class, name, value) (value)
+#define JAVA_CONSTANT(javaClass, name, value) (value)
 
 #endif

@@ -46,13 +46,13 @@ Registry registry;
 
 /// One Java field and where its ID is kept.
 struct field {
-  const char* class_name;
+  const char* className;
   const char* name;
   const char* signature;
   jfieldID* id;
 };
 
-const field fields[] = {
+const field kFields[] = {
     {kRectClass, "left", "I", &registry.rect.left},
     {kRectClass, "top", "I", &registry.rect.top},
     {kRectClass, "right", "I", &registry.rect.right},
@@ -74,14 +74,14 @@ const field fields[] = {
 int find_fields(JNIEnv* env, const field* table, int count) {
   for (int i = 0; i < count; ++i) {
     const field& entry = table[i];
-    jclass owner = env->FindClass(entry.class_name);
+    jclass owner = env->FindClass(entry.className);
     if (owner == nullptr) {
-      FACE_LOG_ALWAYS(ANDROID_LOG_ERROR, "Can't find %s", entry.class_name);
+      FACE_LOG_ALWAYS(ANDROID_LOG_ERROR, "Can't find %s", entry.className);
       return -1;
     }
     jfieldID id = env->GetFieldID(owner, entry.name, entry.signature);
     if (id == nullptr) {
-      FACE_LOG_ALWAYS(ANDROID_LOG_ERROR, "Can't find %s.%s", entry.class_name, entry.name);
+      FACE_LOG_ALWAYS(ANDROID_LOG_ERROR, "Can't find %s.%s", entry.className, entry.name);
       return -1;
     }
     *entry.id = id;
@@ -91,7 +91,7 @@ int find_fields(JNIEnv* env, const field* table, int count) {
 
 /// Keeps a global reference to a class and looks up its constructor without arguments. The class is not
 /// tested by itself: a missing one shows as a missing constructor.
-bool register_class(JNIEnv* env, const char* name, jclass* global, jmethodID* constructor) {
+bool registerClass(JNIEnv* env, const char* name, jclass* global, jmethodID* constructor) {
   jclass local = env->FindClass(name);
   *global = static_cast<jclass>(env->NewGlobalRef(local));
   *constructor = env->GetMethodID(local, "<init>", "()V");
@@ -113,7 +113,7 @@ class LocalRef {
 
   explicit operator bool() const { return object_ != nullptr; }
   Object get() const { return object_; }
-  Object hand_on() { return std::exchange(object_, nullptr); }
+  Object handOn() { return std::exchange(object_, nullptr); }
 
  private:
   JNIEnv* env_;
@@ -123,9 +123,9 @@ class LocalRef {
 /// Makes an object array of `count` elements, each converted from its record and deleted from the local frame
 /// at once.
 template <typename Record, typename Convert>
-jobjectArray to_java_array(JNIEnv* env, jclass element_class, const Record* records, int count,
-                           Convert convert) {
-  LocalRef array(env, env->NewObjectArray(count, element_class, nullptr));
+jobjectArray toJavaArray(JNIEnv* env, jclass elementClass, const Record* records, int count,
+                         Convert convert) {
+  LocalRef array(env, env->NewObjectArray(count, elementClass, nullptr));
   if (!array) {
     return nullptr;
   }
@@ -136,33 +136,33 @@ jobjectArray to_java_array(JNIEnv* env, jclass element_class, const Record* reco
     }
     env->SetObjectArrayElement(array.get(), i, element.get());
   }
-  return array.hand_on();
+  return array.handOn();
 }
 
 jobject ky_pointf_t_to_java_pointf(JNIEnv* env, const ky_pointf_t* point) {
-  jobject java_point = env->NewObject(registry.mPointFClass, registry.newPointF);
-  if (java_point != nullptr) {
-    env->SetFloatField(java_point, registry.point.x, point->x);
-    env->SetFloatField(java_point, registry.point.y, point->y);
+  jobject javaPoint = env->NewObject(registry.mPointFClass, registry.newPointF);
+  if (javaPoint != nullptr) {
+    env->SetFloatField(javaPoint, registry.point.x, point->x);
+    env->SetFloatField(javaPoint, registry.point.y, point->y);
   }
-  return java_point;
+  return javaPoint;
 }
 
 }  // namespace
 
 int register_face_fields(JNIEnv* env) {
-  if (find_fields(env, fields, static_cast<int>(std::size(fields))) < 0) {
+  if (find_fields(env, kFields, static_cast<int>(std::size(kFields))) < 0) {
     return -1;
   }
-  if (!register_class(env, kPointFClass, &registry.mPointFClass, &registry.newPointF)) {
+  if (!registerClass(env, kPointFClass, &registry.mPointFClass, &registry.newPointF)) {
     FACE_LOG_ALWAYS(ANDROID_LOG_ERROR, "Can't find android/graphics/PointF.PointF()");
     return -1;
   }
-  if (!register_class(env, kRectClass, &registry.mRectClass, &registry.newRect)) {
+  if (!registerClass(env, kRectClass, &registry.mRectClass, &registry.newRect)) {
     FACE_LOG_ALWAYS(ANDROID_LOG_ERROR, "Can't find android/graphics/Rect.Rect()");
     return -1;
   }
-  if (!register_class(env, kFaceInfoClass, &registry.mFaceClass, &registry.newFaceInfo)) {
+  if (!registerClass(env, kFaceInfoClass, &registry.mFaceClass, &registry.newFaceInfo)) {
     FACE_LOG_ALWAYS(ANDROID_LOG_ERROR, "Can't find com/vantrel/faceapi/model/FaceInfo");
     return -1;
   }
@@ -170,7 +170,7 @@ int register_face_fields(JNIEnv* env) {
 }
 
 jobjectArray ky_pointf_t_array_to_java_pointf(JNIEnv* env, const ky_pointf_t* points, int count) {
-  return to_java_array(env, registry.mPointFClass, points, count, ky_pointf_t_to_java_pointf);
+  return toJavaArray(env, registry.mPointFClass, points, count, ky_pointf_t_to_java_pointf);
 }
 
 jobject ky_face_t_to_java_face(JNIEnv* env, const ky_face_t* record) {
@@ -201,11 +201,11 @@ jobject ky_face_t_to_java_face(JNIEnv* env, const ky_face_t* record) {
   env->SetFloatField(face.get(), registry.face.roll, record->roll);
   env->SetFloatField(face.get(), registry.face.eyeDist, record->eye_dist);
   env->SetIntField(face.get(), registry.face.id, record->id);
-  return face.hand_on();
+  return face.handOn();
 }
 
 jobjectArray ky_face_t_array_to_java_face(JNIEnv* env, const ky_face_t* records, int count) {
-  return to_java_array(env, registry.mFaceClass, records, count, ky_face_t_to_java_face);
+  return toJavaArray(env, registry.mFaceClass, records, count, ky_face_t_to_java_face);
 }
 
 ky_face_t java_face_to_ky_face_t(JNIEnv* env, jobject face) {
@@ -250,7 +250,7 @@ extern "C" {
 
 JNIEXPORT void JNICALL Java_com_vantrel_faceapi_FaceLibrary_setDebug(JNIEnv* /*env*/, jclass /*type*/,
                                                                      jboolean debug) {
-  kyface::debug_switch.store(debug != JNI_FALSE ? 1 : 0, std::memory_order_relaxed);
+  kyface::debugSwitch.store(debug != JNI_FALSE ? 1 : 0, std::memory_order_relaxed);
 }
 
 }  // extern "C"

@@ -30,7 +30,7 @@ enum BrightnessMetric : jint {
 };
 
 /// The metric of a `format`, null for one that has none.
-Metric* metric_of(jint format) {
+Metric* metricOf(jint format) {
   switch (format) {
     case kLightnessRgba:
       return calcLuminance_RGBA;
@@ -48,7 +48,7 @@ Metric* metric_of(jint format) {
 }
 
 /// The sum of `rows` by `columns` bytes, the rows `stride` bytes apart.
-std::uint32_t sum_bytes(const unsigned char* first, std::int64_t stride, int columns, int rows) {
+std::uint32_t sumBytes(const unsigned char* first, std::int64_t stride, int columns, int rows) {
   std::uint32_t sum = 0;
   for (int y = 0; y < rows; ++y) {
     const unsigned char* row = first + y * stride;
@@ -73,7 +73,7 @@ JNIEXPORT jint JNICALL Java_com_vantrel_faceapi_FaceLibrary_faceBrightEvaluate(
   // A metric answers for an image that could not be pinned.
   const kyface::PinnedArray pinned(env, image);
   jint result = -1;
-  if (Metric* metric = metric_of(format)) {
+  if (Metric* metric = metricOf(format)) {
     result = metric(pinned.bytes(), width, widthStride, height, heightStride, rectX, rectY, rectW, rectH);
   }
   FACE_LOG(ANDROID_LOG_VERBOSE,
@@ -92,7 +92,7 @@ JNIEXPORT jfloat JNICALL Java_com_vantrel_faceapi_FaceLibrary_averageBrightness(
         ANDROID_LOG_WARN,
         "averageBrightness native area is not in image frame imageFrame : %dx%d,area[x,y,w,h] : %d,%d,%d,%d",
         width, height, x, y, w, h);
-    pinned.leave_pinned();  // C4
+    pinned.leavePinned();  // C4
     return 0.0F;
   }
   if (!pinned) {
@@ -104,7 +104,7 @@ JNIEXPORT jfloat JNICALL Java_com_vantrel_faceapi_FaceLibrary_averageBrightness(
   // The height test adds to the left edge (C3): callers depend on which rectangles it cuts.
   const int rows = reachesBeyond(left, h, height) ? height - top : h;
   const std::int64_t stride = width;
-  const std::uint32_t sum = sum_bytes(pinned.bytes() + top * stride + left, stride, columns, rows);
+  const std::uint32_t sum = sumBytes(pinned.bytes() + top * stride + left, stride, columns, rows);
   pinned.release();
   // Both in 32 bits; a rectangle without an area is 0/0.
   const auto full = static_cast<std::int32_t>(static_cast<std::uint32_t>(columns) *

@@ -25,15 +25,15 @@ const char* missing() {
   unsigned ebx = 0;
   unsigned ecx = 0;
   unsigned edx = 0;
-  bool has_all = false;
+  bool hasAll = false;
   if (__get_cpuid(1, &eax, &ebx, &ecx, &edx) != 0 && (~ecx & (kFma | kXsave | kAvx)) == 0) {
     unsigned saved = 0;
     unsigned high = 0;
     __asm__("xgetbv" : "=a"(saved), "=d"(high) : "c"(0));
-    has_all = (~saved & kSavedState) == 0 && __get_cpuid_count(7, 0, &eax, &ebx, &ecx, &edx) != 0 &&
-              (ebx & kAvx2) != 0;
+    hasAll = (~saved & kSavedState) == 0 && __get_cpuid_count(7, 0, &eax, &ebx, &ecx, &edx) != 0 &&
+             (ebx & kAvx2) != 0;
   }
-  if (!has_all) {
+  if (!hasAll) {
     return "libjni_kyface_api.so for x86_64 needs a processor with AVX2 and FMA, which this one is not";
   }
 #endif

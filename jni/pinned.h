@@ -66,7 +66,7 @@ class PinnedArray {
   }
 
   /// Gives up the elements without releasing them: the array stays pinned.
-  void leave_pinned() { elements_ = nullptr; }
+  void leavePinned() { elements_ = nullptr; }
 
  private:
   JNIEnv* env_;

@@ -37,7 +37,7 @@ enum Conversion : jint {
 };
 
 /// The pixels of an image, 0 when there is no such image.
-std::int64_t pixels_of(jint width, jint height) {
+std::int64_t pixelsOf(jint width, jint height) {
   const std::int64_t pixels = std::int64_t{width} * height;
   return width > 0 && height > 0 && pixels <= INT_MAX ? pixels : 0;
 }
@@ -48,7 +48,7 @@ bool holds(JNIEnv* env, jbyteArray array, std::int64_t bytes) {
 
 /// Calls `use` with the bytes of two arrays, the second to be written.
 template <typename Use>
-jint with_bytes(JNIEnv* env, jbyteArray src, jbyteArray dst, const Use& use) {
+jint withBytes(JNIEnv* env, jbyteArray src, jbyteArray dst, const Use& use) {
   const CriticalArray in(env, src, JNI_ABORT);
   if (in.refused()) {
     return kNoElements;
@@ -71,7 +71,7 @@ void rotate(const Image<channels>& src, jint degrees, unsigned char* out) {
 
 /// Calls `sum` with the first byte of the rectangle at (`x`, `y`) of an image of `channels` bytes a pixel.
 template <int channels, typename Sum>
-jlong sum_of(JNIEnv* env, jbyteArray image, jint stride, jint x, jint y, jint w, jint h, const Sum& sum) {
+jlong sumOf(JNIEnv* env, jbyteArray image, jint stride, jint x, jint y, jint w, jint h, const Sum& sum) {
   if (image == nullptr || stride < 1 || x < 0 || y < 0 || w < 1 || h < 1 || h > INT_MAX - y) {
     return kSizes;
   }
@@ -93,16 +93,16 @@ JNIEXPORT jint JNICALL Java_com_vantrel_faceapi_PixelConversion_convert(JNIEnv* 
                                                                         jbyteArray src, jint width,
                                                                         jint height, jbyteArray dst,
                                                                         jint conversion) {
-  const std::int64_t pixels = pixels_of(width, height);
-  const bool to_frame = conversion != kSwapRedAndBlue;
-  if ((to_frame && (width % 2 != 0 || height % 2 != 0)) || !holds(env, src, pixels * 4) ||
-      !holds(env, dst, to_frame ? pixels + pixels / 2 : pixels * 4)) {
+  const std::int64_t pixels = pixelsOf(width, height);
+  const bool toFrame = conversion != kSwapRedAndBlue;
+  if ((toFrame && (width % 2 != 0 || height % 2 != 0)) || !holds(env, src, pixels * 4) ||
+      !holds(env, dst, toFrame ? pixels + pixels / 2 : pixels * 4)) {
     return kSizes;
   }
-  return with_bytes(env, src, dst, [&](unsigned char* in, unsigned char* out) {
+  return withBytes(env, src, dst, [&](unsigned char* in, unsigned char* out) {
     const Image<4> rgba(width, height, in);
     Image<4> swapped(width, height, out);
-    Image<1> frame = kyface::view_420(out, width, height);
+    Image<1> frame = kyface::view420(out, width, height);
     switch (conversion) {
       case kRgbaToNv21:
         return kyface::convert<HPC::fastcv::CVT_RGB2NV21>(rgba, &frame);
@@ -118,13 +118,13 @@ JNIEXPORT jint JNICALL Java_com_vantrel_faceapi_PixelConversion_rotate(JNIEnv* e
                                                                        jbyteArray src, jint width,
                                                                        jint height, jint bytesPerPixel,
                                                                        jint degrees, jbyteArray dst) {
-  const std::int64_t bytes = pixels_of(width, height) * bytesPerPixel;
+  const std::int64_t bytes = pixelsOf(width, height) * bytesPerPixel;
   if ((bytesPerPixel != 1 && bytesPerPixel != 3 && bytesPerPixel != 4) ||
       (degrees != 90 && degrees != 180 && degrees != 270) || !holds(env, src, bytes) ||
       !holds(env, dst, bytes)) {
     return kSizes;
   }
-  return with_bytes(env, src, dst, [&](unsigned char* in, unsigned char* out) {
+  return withBytes(env, src, dst, [&](unsigned char* in, unsigned char* out) {
     if (bytesPerPixel == 1) {
       rotate(Image<1>(width, height, in), degrees, out);
     } else if (bytesPerPixel == 3) {
@@ -139,7 +139,7 @@ JNIEXPORT jint JNICALL Java_com_vantrel_faceapi_PixelConversion_read(JNIEnv* env
                                                                      jobject bitmap, jint width, jint height,
                                                                      jint bytesPerPixel, jbyteArray dst) {
   if (bitmap == nullptr || (bytesPerPixel != 3 && bytesPerPixel != 4) ||
-      !holds(env, dst, pixels_of(width, height) * bytesPerPixel)) {
+      !holds(env, dst, pixelsOf(width, height) * bytesPerPixel)) {
     return kSizes;
   }
   AndroidBitmapInfo info = {};
@@ -177,7 +177,7 @@ JNIEXPORT jint JNICALL Java_com_vantrel_faceapi_PixelConversion_read(JNIEnv* env
 JNIEXPORT jlong JNICALL Java_com_vantrel_faceapi_PixelConversion_sumBytes(JNIEnv* env, jclass /*type*/,
                                                                           jbyteArray image, jint stride,
                                                                           jint x, jint y, jint w, jint h) {
-  return sum_of<1>(env, image, stride, x, y, w, h, [&](const unsigned char* first) {
+  return sumOf<1>(env, image, stride, x, y, w, h, [&](const unsigned char* first) {
     std::uint64_t sum = 0;
     for (std::int64_t row = 0; row < h; ++row) {
       for (std::int64_t column = 0; column < w; ++column) {
@@ -192,8 +192,8 @@ JNIEXPORT jlong JNICALL Java_com_vantrel_faceapi_PixelConversion_sumLightness(JN
                                                                               jbyteArray image, jint stride,
                                                                               jboolean rgba, jint x, jint y,
                                                                               jint w, jint h) {
-  return sum_of<4>(env, image, stride, x, y, w, h, [&](const unsigned char* first) {
-    return kyface::brightness::total_lightness(first, stride, w, h, rgba != JNI_FALSE);
+  return sumOf<4>(env, image, stride, x, y, w, h, [&](const unsigned char* first) {
+    return kyface::brightness::totalLightness(first, stride, w, h, rgba != JNI_FALSE);
   });
 }
 

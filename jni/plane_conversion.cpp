@@ -1,7 +1,7 @@
 // SPDX-FileCopyrightText: the libjni_kyface_api authors
 // SPDX-License-Identifier: Apache-2.0
 
-// Native methods of PlaneConversion: Java's memory as the planes and the target of `convert_planes`.
+// Native methods of PlaneConversion: Java's memory as the planes and the target of `convertPlanes`.
 #include <android/bitmap.h>
 #include <jni.h>
 
@@ -34,7 +34,7 @@ enum BridgeStatus : jint {
   kNoElements = 20,  ///< the JVM does not give an array's elements; its exception is pending
 };
 
-// Java's numbers of layouts and statuses are those of `convert_planes`.
+// Java's numbers of layouts and statuses are those of `convertPlanes`.
 #define SAME_IN_JAVA(value, name) \
   static_assert(static_cast<jint>(value) == JAVA_CONSTANT(PlaneConversion, name, static_cast<jint>(value)))
 SAME_IN_JAVA(PixelLayout::kRgba, RGBA);
@@ -73,7 +73,7 @@ struct Bytes {
   std::int64_t size = 0;
 };
 
-Bytes direct_bytes(JNIEnv* env, jobject buffer, jint from, jint to) {
+Bytes directBytes(JNIEnv* env, jobject buffer, jint from, jint to) {
   if (buffer == nullptr || from < 0 || from > to || to > env->GetDirectBufferCapacity(buffer)) {
     return {};
   }
@@ -95,12 +95,12 @@ class JavaPlanes {
     picture_.height = n[kHeight];
     const std::array<jobject, 3> memory = {y, u, v};
     for (int i = 0; i < 3; ++i) {
-      const jint* const of_plane = &n[kPlanes + i * kPlaneNumbers];
-      if (!find(env, i, memory[i], (n[kDirect] >> i & 1) != 0, of_plane[kFrom], of_plane[kTo])) {
+      const jint* const ofPlane = &n[kPlanes + i * kPlaneNumbers];
+      if (!find(env, i, memory[i], (n[kDirect] >> i & 1) != 0, ofPlane[kFrom], ofPlane[kTo])) {
         return false;
       }
-      plane(i).row_stride = of_plane[kRowStride];
-      plane(i).pixel_stride = of_plane[kPixelStride];
+      plane(i).rowStride = ofPlane[kRowStride];
+      plane(i).pixelStride = ofPlane[kPixelStride];
     }
     // Planes in one array are borrowed once: each borrow may be of a copy, and views of the same pairs would
     // not be known for that.
@@ -116,9 +116,9 @@ class JavaPlanes {
   }
 
   /// Whether one of the planes is in `array`.
-  bool are_in(JNIEnv* env, jarray array) const {
-    for (jarray of_plane : arrays_) {
-      if (of_plane != nullptr && env->IsSameObject(of_plane, array) != JNI_FALSE) {
+  bool areIn(JNIEnv* env, jarray array) const {
+    for (jarray ofPlane : arrays_) {
+      if (ofPlane != nullptr && env->IsSameObject(ofPlane, array) != JNI_FALSE) {
         return true;
       }
     }
@@ -128,11 +128,11 @@ class JavaPlanes {
   /// Calls `use` with the picture, for which it borrows the arrays that hold planes: until it is done no
   /// other function of the JVM may be called. Its result, or kNoElements.
   template <typename Use>
-  jint with_picture(JNIEnv* env, const Use& use) {
+  jint withPicture(JNIEnv* env, const Use& use) {
     CriticalArray y(env, arrays_[0], JNI_ABORT);
     CriticalArray u(env, arrays_[1] == arrays_[0] ? nullptr : arrays_[1], JNI_ABORT);
-    const bool v_is_borrowed = arrays_[2] == arrays_[0] || arrays_[2] == arrays_[1];
-    CriticalArray v(env, v_is_borrowed ? nullptr : arrays_[2], JNI_ABORT);
+    const bool vIsBorrowed = arrays_[2] == arrays_[0] || arrays_[2] == arrays_[1];
+    CriticalArray v(env, vIsBorrowed ? nullptr : arrays_[2], JNI_ABORT);
     if (y.refused() || u.refused() || v.refused()) {
       return kNoElements;
     }
@@ -150,7 +150,7 @@ class JavaPlanes {
  private:
   bool find(JNIEnv* env, int index, jobject memory, bool direct, jint from, jint to) {
     if (direct) {
-      const Bytes bytes = direct_bytes(env, memory, from, to);
+      const Bytes bytes = directBytes(env, memory, from, to);
       plane(index).data = bytes.data;
       plane(index).size = bytes.size;
       return bytes.data != nullptr;
@@ -174,25 +174,25 @@ struct View {
   kyface::Orientation orientation;
 };
 
-View view_of(jint left, jint top, jint width, jint height, jint degrees, jboolean mirrored) {
+View viewOf(jint left, jint top, jint width, jint height, jint degrees, jboolean mirrored) {
   return {{left, top, width, height}, {degrees, mirrored != JNI_FALSE}};
 }
 
 jint convert(const PlanarPicture& picture, const View& view, const Target& target) {
-  return static_cast<jint>(kyface::convert_planes(picture, view.part, view.orientation, target));
+  return static_cast<jint>(kyface::convertPlanes(picture, view.part, view.orientation, target));
 }
 
 /// Into the elements of an array, of `element` bytes each.
-jint convert_to_array(JNIEnv* env, JavaPlanes& planes, const View& view, jint layout, jarray out, jint from,
-                      jint stride, int element) {
+jint convertToArray(JNIEnv* env, JavaPlanes& planes, const View& view, jint layout, jarray out, jint from,
+                    jint stride, int element) {
   if (out == nullptr || from < 0 || from > env->GetArrayLength(out)) {
     return kMemory;
   }
-  if (planes.are_in(env, out)) {
+  if (planes.areIn(env, out)) {
     return static_cast<jint>(PlanesStatus::kOverlap);
   }
   const std::int64_t size = (std::int64_t{env->GetArrayLength(out)} - from) * element;
-  return planes.with_picture(env, [&](const PlanarPicture& picture) {
+  return planes.withPicture(env, [&](const PlanarPicture& picture) {
     CriticalArray elements(env, out, 0);
     if (elements.refused()) {
       return jint{kNoElements};
@@ -218,8 +218,8 @@ PLANE_CONVERSION(toBytes, jint layout, jbyteArray out, jint from, jint stride) {
   if (!planes.find(env, y, u, v, numbers)) {
     return kMemory;
   }
-  return convert_to_array(env, planes, view_of(left, top, width, height, degrees, mirrored), layout, out,
-                          from, stride, sizeof(jbyte));
+  return convertToArray(env, planes, viewOf(left, top, width, height, degrees, mirrored), layout, out, from,
+                        stride, sizeof(jbyte));
 }
 
 PLANE_CONVERSION(toInts, jint layout, jintArray out, jint from, jint stride) {
@@ -227,8 +227,8 @@ PLANE_CONVERSION(toInts, jint layout, jintArray out, jint from, jint stride) {
   if (!planes.find(env, y, u, v, numbers)) {
     return kMemory;
   }
-  return convert_to_array(env, planes, view_of(left, top, width, height, degrees, mirrored), layout, out,
-                          from, stride, sizeof(jint));
+  return convertToArray(env, planes, viewOf(left, top, width, height, degrees, mirrored), layout, out, from,
+                        stride, sizeof(jint));
 }
 
 PLANE_CONVERSION(toBuffer, jint layout, jobject out, jint from, jint to, jint stride) {
@@ -236,12 +236,12 @@ PLANE_CONVERSION(toBuffer, jint layout, jobject out, jint from, jint to, jint st
   if (!planes.find(env, y, u, v, numbers)) {
     return kMemory;
   }
-  const Bytes bytes = direct_bytes(env, out, from, to);
+  const Bytes bytes = directBytes(env, out, from, to);
   if (bytes.data == nullptr) {
     return kMemory;
   }
-  return planes.with_picture(env, [&](const PlanarPicture& picture) {
-    return convert(picture, view_of(left, top, width, height, degrees, mirrored),
+  return planes.withPicture(env, [&](const PlanarPicture& picture) {
+    return convert(picture, viewOf(left, top, width, height, degrees, mirrored),
                    {bytes.data, bytes.size, stride, PixelLayout{layout}});
   });
 }
@@ -258,8 +258,8 @@ PLANE_CONVERSION(toBitmap, jobject bitmap) {
   if (info.format != ANDROID_BITMAP_FORMAT_RGBA_8888) {
     return kNotRgba;
   }
-  const View view = view_of(left, top, width, height, degrees, mirrored);
-  const kyface::Size size = kyface::size_of_view(view.part, view.orientation);
+  const View view = viewOf(left, top, width, height, degrees, mirrored);
+  const kyface::Size size = kyface::sizeOfView(view.part, view.orientation);
   if (size.width > static_cast<std::int64_t>(info.width) ||
       size.height > static_cast<std::int64_t>(info.height)) {
     return kSmall;
@@ -269,7 +269,7 @@ PLANE_CONVERSION(toBitmap, jobject bitmap) {
     return kNotLocked;
   }
   const std::int64_t bytes = pixels == nullptr ? 0 : std::int64_t{info.stride} * info.height;
-  const jint status = planes.with_picture(env, [&](const PlanarPicture& picture) {
+  const jint status = planes.withPicture(env, [&](const PlanarPicture& picture) {
     return convert(picture, view,
                    {static_cast<unsigned char*>(pixels), bytes, info.stride, PixelLayout::kRgba});
   });

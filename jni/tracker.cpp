@@ -22,15 +22,15 @@ struct Tracker {
 
 jobjectArray kyFaceTrack(JNIEnv* env, long long handle, const unsigned char* image, int pixelFormat,
                          int width, int height, int stride, int orientation, jintArray status) {
-  return kyface::analyse_faces<Tracker>(env, handle, image, pixelFormat, width, height, stride, orientation,
-                                        status);
+  return kyface::analyseFaces<Tracker>(env, handle, image, pixelFormat, width, height, stride, orientation,
+                                       status);
 }
 
 /// Calls one of the engine's setters. What it reports through its third argument is of no use to Java.
 template <typename Setter>
-jint set_tracker_value(Setter* setter, jlong handle, jint value) {
+jint setTrackerValue(Setter* setter, jlong handle, jint value) {
   int previous = 0;
-  return setter(kyface::to_handle(handle), value, &previous);
+  return setter(kyface::toHandle(handle), value, &previous);
 }
 
 }  // namespace
@@ -56,7 +56,7 @@ JNIEXPORT jlong JNICALL Java_com_vantrel_faceapi_FaceLibrary_kyFaceCreateTracker
   // Once more (C7): the second tracker takes the place of the first, which is never destroyed.
   result = ky_face_create_tracker(&handle, path.get(), config);
   path.release();
-  return result == 0 ? kyface::to_java(handle) : 0;
+  return result == 0 ? kyface::toJava(handle) : 0;
 }
 
 JNIEXPORT void JNICALL Java_com_vantrel_faceapi_FaceLibrary_kyFaceDestroyTracker(JNIEnv* /*env*/,
@@ -66,28 +66,28 @@ JNIEXPORT void JNICALL Java_com_vantrel_faceapi_FaceLibrary_kyFaceDestroyTracker
     FACE_LOG(ANDROID_LOG_ERROR, "kyFaceDestroyTracker destroy handle is null");
     return;
   }
-  ky_face_destroy_tracker(kyface::to_handle(handle));
+  ky_face_destroy_tracker(kyface::toHandle(handle));
   FACE_LOG(ANDROID_LOG_VERBOSE, "ky_face_destroy_tracker");
 }
 
 JNIEXPORT jobjectArray JNICALL Java_com_vantrel_faceapi_FaceLibrary_kyFaceTrackBytes(
     JNIEnv* env, jclass /*type*/, jlong handle, jbyteArray image, jint pixelFormat, jint width, jint height,
     jint stride, jint orientation, jintArray status) {
-  return kyface::analyse_array<Tracker>(kyFaceTrack, env, handle, image, pixelFormat, width, height, stride,
-                                        orientation, status);
+  return kyface::analyseArray<Tracker>(kyFaceTrack, env, handle, image, pixelFormat, width, height, stride,
+                                       orientation, status);
 }
 
 JNIEXPORT jobjectArray JNICALL Java_com_vantrel_faceapi_FaceLibrary_kyFaceTrackInts(
     JNIEnv* env, jclass /*type*/, jlong handle, jintArray image, jint pixelFormat, jint width, jint height,
     jint stride, jint orientation, jintArray status) {
-  return kyface::analyse_array<Tracker>(kyFaceTrack, env, handle, image, pixelFormat, width, height, stride,
-                                        orientation, status);
+  return kyface::analyseArray<Tracker>(kyFaceTrack, env, handle, image, pixelFormat, width, height, stride,
+                                       orientation, status);
 }
 
 JNIEXPORT void JNICALL Java_com_vantrel_faceapi_FaceLibrary_kyFaceResetTracker(JNIEnv* /*env*/,
                                                                                jclass /*type*/,
                                                                                jlong handle) {
-  ky_face_reset_tracker(kyface::to_handle(handle));
+  ky_face_reset_tracker(kyface::toHandle(handle));
   FACE_LOG(ANDROID_LOG_VERBOSE, "ky_face_reset_tracker");
 }
 
@@ -95,21 +95,21 @@ JNIEXPORT jint JNICALL Java_com_vantrel_faceapi_FaceLibrary_kyFaceTrackSetDetect
                                                                                              jclass /*type*/,
                                                                                              jlong handle,
                                                                                              jint limit) {
-  return set_tracker_value(ky_face_track_set_detect_face_cnt_limit, handle, limit);
+  return setTrackerValue(ky_face_track_set_detect_face_cnt_limit, handle, limit);
 }
 
 JNIEXPORT jint JNICALL Java_com_vantrel_faceapi_FaceLibrary_kyFaceTrackSetDetectInterval(JNIEnv* /*env*/,
                                                                                          jclass /*type*/,
                                                                                          jlong handle,
                                                                                          jint interval) {
-  return set_tracker_value(ky_face_track_set_detect_interval, handle, interval);
+  return setTrackerValue(ky_face_track_set_detect_interval, handle, interval);
 }
 
 JNIEXPORT jint JNICALL Java_com_vantrel_faceapi_FaceLibrary_kyFaceTrackSetAlignmentThreshold(JNIEnv* /*env*/,
                                                                                              jclass /*type*/,
                                                                                              jlong handle,
                                                                                              jint threshold) {
-  return set_tracker_value(ky_face_track_set_alignment_threshold, handle, threshold);
+  return setTrackerValue(ky_face_track_set_alignment_threshold, handle, threshold);
 }
 
 }  // extern "C"

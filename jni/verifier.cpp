@@ -17,7 +17,7 @@ namespace {
 
 /// Bytes of the text of a feature of `length` bytes: base64 and a terminating zero, in unsigned 32-bit
 /// arithmetic whatever the engine says the length is.
-jsize serialized_size(int length) {
+jsize serializedSize(int length) {
   return static_cast<jsize>((static_cast<std::uint32_t>(length) + 2) / 3 * 4 + 1);
 }
 
@@ -36,7 +36,7 @@ jbyteArray kyFaceVerify(JNIEnv* env, jclass /*type*/, long long handle, const un
   const ky_face_t record = java_face_to_ky_face_t(env, face);
   ky_feature_t feature = nullptr;
   int length = 0;
-  const int result = ky_verify_get_feature(kyface::to_handle(handle), image, pixelFormat, width, height,
+  const int result = ky_verify_get_feature(kyface::toHandle(handle), image, pixelFormat, width, height,
                                            stride, &record, &feature, &length);
   if (result != 0) {
     FACE_LOG(ANDROID_LOG_ERROR, "kyFaceVerify get feature fail result : %d", result);
@@ -46,39 +46,39 @@ jbyteArray kyFaceVerify(JNIEnv* env, jclass /*type*/, long long handle, const un
     FACE_LOG(ANDROID_LOG_ERROR, "kyFaceVerify ky_verify_get_feature is null");
     return nullptr;
   }
-  kyface::PinnedArray pinned_status(env, status);
-  if (!pinned_status) {
+  kyface::PinnedArray pinnedStatus(env, status);
+  if (!pinnedStatus) {
     ky_verify_release_feature(feature);
     return nullptr;
   }
-  pinned_status[0] = result;
-  jbyteArray text = env->NewByteArray(serialized_size(length));
+  pinnedStatus[0] = result;
+  jbyteArray text = env->NewByteArray(serializedSize(length));
   if (text == nullptr) {
     // The feature is not released on this path (C8).
     FACE_LOG(ANDROID_LOG_ERROR, "kyFaceVerify new Feature Failed !! maybe out of memory!!");
     return nullptr;
   }
-  kyface::PinnedArray pinned_text(env, text);
-  if (!pinned_text) {
+  kyface::PinnedArray pinnedText(env, text);
+  if (!pinnedText) {
     ky_verify_release_feature(feature);
     return nullptr;
   }
-  ky_verify_serialize_feature(feature, pinned_text.chars());
+  ky_verify_serialize_feature(feature, pinnedText.chars());
   ky_verify_release_feature(feature);
-  pinned_status.release();
-  pinned_text.release();
+  pinnedStatus.release();
+  pinnedText.release();
   return text;
 }
 
 /// Extracts a feature from an image that is held in a Java array, of bytes or of 32-bit pixels alike.
 template <typename Array>
-jbyteArray get_feature(JNIEnv* env, jclass type, jlong handle, Array image, jint pixelFormat, jint width,
-                       jint height, jint stride, jobject face, jintArray status) {
+jbyteArray getFeature(JNIEnv* env, jclass type, jlong handle, Array image, jint pixelFormat, jint width,
+                      jint height, jint stride, jobject face, jintArray status) {
   if (image == nullptr) {  // refused below, like a null face: a JVM need not survive pinning it
     return kyFaceVerify(env, type, handle, nullptr, pixelFormat, width, height, stride, face, status);
   }
-  const kyface::PinnedArray pinned_image(env, image);
-  return kyFaceVerify(env, type, handle, pinned_image.bytes(), pixelFormat, width, height, stride, face,
+  const kyface::PinnedArray pinnedImage(env, image);
+  return kyFaceVerify(env, type, handle, pinnedImage.bytes(), pixelFormat, width, height, stride, face,
                       status);
 }
 
@@ -103,31 +103,31 @@ JNIEXPORT jlong JNICALL Java_com_vantrel_faceapi_FaceLibrary_kyFaceCreateVerify(
     return 0;
   }
   path.release();
-  return kyface::to_java(handle);
+  return kyface::toJava(handle);
 }
 
 JNIEXPORT jint JNICALL Java_com_vantrel_faceapi_FaceLibrary_kyFaceGetVerifyVersion(JNIEnv* /*env*/,
                                                                                    jclass /*type*/,
                                                                                    jlong handle) {
-  return ky_verify_get_version(kyface::to_handle(handle));
+  return ky_verify_get_version(kyface::toHandle(handle));
 }
 
 JNIEXPORT jint JNICALL Java_com_vantrel_faceapi_FaceLibrary_kyFaceGetVerifyLength(JNIEnv* /*env*/,
                                                                                   jclass /*type*/,
                                                                                   jlong handle) {
-  return ky_verify_get_feature_length(kyface::to_handle(handle));
+  return ky_verify_get_feature_length(kyface::toHandle(handle));
 }
 
 JNIEXPORT jbyteArray JNICALL Java_com_vantrel_faceapi_FaceLibrary_kyFaceGetFeatureBytes(
     JNIEnv* env, jclass type, jlong handle, jbyteArray image, jint pixelFormat, jint width, jint height,
     jint stride, jobject face, jintArray status) {
-  return get_feature(env, type, handle, image, pixelFormat, width, height, stride, face, status);
+  return getFeature(env, type, handle, image, pixelFormat, width, height, stride, face, status);
 }
 
 JNIEXPORT jbyteArray JNICALL Java_com_vantrel_faceapi_FaceLibrary_kyFaceGetFeatureInts(
     JNIEnv* env, jclass type, jlong handle, jintArray image, jint pixelFormat, jint width, jint height,
     jint stride, jobject face, jintArray status) {
-  return get_feature(env, type, handle, image, pixelFormat, width, height, stride, face, status);
+  return getFeature(env, type, handle, image, pixelFormat, width, height, stride, face, status);
 }
 
 JNIEXPORT jfloat JNICALL Java_com_vantrel_faceapi_FaceLibrary_kyFaceCompareFeature(
@@ -140,21 +140,21 @@ JNIEXPORT jfloat JNICALL Java_com_vantrel_faceapi_FaceLibrary_kyFaceCompareFeatu
   kyface::PinnedArray text2(env, feature2);
   if (!text1 || !text2) {
     // Where one of the two is pinned it stays so (C9).
-    text1.leave_pinned();
-    text2.leave_pinned();
+    text1.leavePinned();
+    text2.leavePinned();
     FACE_LOG(ANDROID_LOG_ERROR, "ky_faceapi_KyFaceLibrary_kyFacCompareFeature feature is null");
     return 0.0F;
   }
-  ky_feature_t engine_feature1 = ky_verify_deserialize_feature(text1.chars());
-  ky_feature_t engine_feature2 = ky_verify_deserialize_feature(text2.chars());
+  ky_feature_t engineFeature1 = ky_verify_deserialize_feature(text1.chars());
+  ky_feature_t engineFeature2 = ky_verify_deserialize_feature(text2.chars());
   float score;  // the engine's alone (C10): after a failure it means nothing, and the status says so
   const int result =
-      ky_verify_compare_feature(kyface::to_handle(handle), engine_feature1, engine_feature2, &score);
+      ky_verify_compare_feature(kyface::toHandle(handle), engineFeature1, engineFeature2, &score);
   text1.release();
   text2.release();
-  ky_verify_release_feature(engine_feature1);
-  ky_verify_release_feature(engine_feature2);
-  return kyface::write_status(env, status, result) ? score : 0.0F;
+  ky_verify_release_feature(engineFeature1);
+  ky_verify_release_feature(engineFeature2);
+  return kyface::writeStatus(env, status, result) ? score : 0.0F;
 }
 
 JNIEXPORT jlong JNICALL Java_com_vantrel_faceapi_FaceLibrary_kyFaceDeserialize(JNIEnv* env, jclass /*type*/,
@@ -163,7 +163,7 @@ JNIEXPORT jlong JNICALL Java_com_vantrel_faceapi_FaceLibrary_kyFaceDeserialize(J
   if (!text) {
     return 0;
   }
-  return kyface::to_java(ky_verify_deserialize_feature(text.chars()));
+  return kyface::toJava(ky_verify_deserialize_feature(text.chars()));
 }
 
 JNIEXPORT void JNICALL Java_com_vantrel_faceapi_FaceLibrary_kyFaceDestroyVerify(JNIEnv* /*env*/,
@@ -173,7 +173,7 @@ JNIEXPORT void JNICALL Java_com_vantrel_faceapi_FaceLibrary_kyFaceDestroyVerify(
     FACE_LOG(ANDROID_LOG_ERROR, "kyFaceVerify DestroyVerify handle is NULL!!");
     return;
   }
-  ky_verify_destroy_handle(kyface::to_handle(handle));
+  ky_verify_destroy_handle(kyface::toHandle(handle));
   FACE_LOG(ANDROID_LOG_DEBUG, "ky_verify_destroy_handle");
 }
 

@@ -43,8 +43,8 @@ std::uint64_t total(const unsigned char* first, std::ptrdiff_t stride, std::ptrd
 
 }  // namespace
 
-std::uint64_t total_lightness(const unsigned char* first, std::ptrdiff_t stride, int columns, int rows,
-                              bool rgba) {
+std::uint64_t totalLightness(const unsigned char* first, std::ptrdiff_t stride, int columns, int rows,
+                             bool rgba) {
   initLuminanceTables();
   return rgba ? total<2>(first, stride, columns, rows) : total<0>(first, stride, columns, rows);
 }

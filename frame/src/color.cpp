@@ -7,13 +7,13 @@
 #include "frame/image_view.h"
 
 using kyface::Image;
-using kyface::view_420;
+using kyface::view420;
 
 namespace {
 
 /// The conversion for the chroma order that `format` names.
-template <HPC::fastcv::ColorCvtType nv21, HPC::fastcv::ColorCvtType nv12, int src_channels, int dst_channels>
-void convert_420(int format, const Image<src_channels>& src, Image<dst_channels>* dst) {
+template <HPC::fastcv::ColorCvtType nv21, HPC::fastcv::ColorCvtType nv12, int srcChannels, int dstChannels>
+void convert420(int format, const Image<srcChannels>& src, Image<dstChannels>* dst) {
   if (format == kyface::kFormatNv21) {
     kyface::convert<nv21>(src, dst);
   } else {
@@ -26,38 +26,33 @@ void convert_420(int format, const Image<src_channels>& src, Image<dst_channels>
 void nv2RGB(unsigned char* nv, int format, int width, int height, unsigned char* out) {
   FACE_LOG_ALWAYS(ANDROID_LOG_INFO, "nv2RGB ");
   Image<4> dst(width, height, out);
-  convert_420<HPC::fastcv::CVT_NV212RGB, HPC::fastcv::CVT_NV122RGB>(format, view_420(nv, width, height),
-                                                                    &dst);
+  convert420<HPC::fastcv::CVT_NV212RGB, HPC::fastcv::CVT_NV122RGB>(format, view420(nv, width, height), &dst);
 }
 
 void RGB2nv(unsigned char* in, int format, int width, int height, unsigned char* nv) {
   FACE_LOG_ALWAYS(ANDROID_LOG_INFO, "RGB2nv ");
-  Image<1> dst = view_420(nv, width, height);
-  convert_420<HPC::fastcv::CVT_RGB2NV21, HPC::fastcv::CVT_RGB2NV12>(format, Image<4>(width, height, in),
-                                                                    &dst);
+  Image<1> dst = view420(nv, width, height);
+  convert420<HPC::fastcv::CVT_RGB2NV21, HPC::fastcv::CVT_RGB2NV12>(format, Image<4>(width, height, in), &dst);
 }
 
 void nv2BGR(unsigned char* nv, int format, int width, int height, unsigned char* out) {
   FACE_LOG_ALWAYS(ANDROID_LOG_INFO, "nv2BGR start");
   Image<4> dst(width, height, out);
-  convert_420<HPC::fastcv::CVT_NV212BGR, HPC::fastcv::CVT_NV122BGR>(format, view_420(nv, width, height),
-                                                                    &dst);
+  convert420<HPC::fastcv::CVT_NV212BGR, HPC::fastcv::CVT_NV122BGR>(format, view420(nv, width, height), &dst);
   FACE_LOG_ALWAYS(ANDROID_LOG_INFO, "nv2BGR end");
 }
 
 void nv212BGR(unsigned char* nv, int format, int width, int height, unsigned char* out) {
   FACE_LOG_ALWAYS(ANDROID_LOG_INFO, "nv212BGR start");
   Image<3> dst(width, height, out);
-  convert_420<HPC::fastcv::CVT_NV212BGR, HPC::fastcv::CVT_NV122BGR>(format, view_420(nv, width, height),
-                                                                    &dst);
+  convert420<HPC::fastcv::CVT_NV212BGR, HPC::fastcv::CVT_NV122BGR>(format, view420(nv, width, height), &dst);
   FACE_LOG_ALWAYS(ANDROID_LOG_INFO, "nv212BGR end");
 }
 
 void BGR2nv(unsigned char* in, int format, int width, int height, unsigned char* nv) {
   FACE_LOG_ALWAYS(ANDROID_LOG_INFO, "BGR2nv start");
-  Image<1> dst = view_420(nv, width, height);
-  convert_420<HPC::fastcv::CVT_BGR2NV21, HPC::fastcv::CVT_BGR2NV12>(format, Image<4>(width, height, in),
-                                                                    &dst);
+  Image<1> dst = view420(nv, width, height);
+  convert420<HPC::fastcv::CVT_BGR2NV21, HPC::fastcv::CVT_BGR2NV12>(format, Image<4>(width, height, in), &dst);
   FACE_LOG_ALWAYS(ANDROID_LOG_INFO, "BGR2nv end");
 }
 

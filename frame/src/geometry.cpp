@@ -13,7 +13,7 @@ using kyface::Image;
 namespace {
 
 /// Copies the rectangle of `dst`'s size at (`x`, `y`); one that leaves `src` is not copied.
-void copy_rectangle(const Image<1>& src, int x, std::int64_t y, Image<1>* dst) {
+void copyRectangle(const Image<1>& src, int x, std::int64_t y, Image<1>* dst) {
   constexpr unsigned char kAsItIs = 1;
   HPC::fastcv::crop<unsigned char, 1, unsigned char, 1, 1, HPC::fastcv::ECO_ENV_ARM>(
       src, {x, static_cast<int>(y)}, kAsItIs, dst);
@@ -23,16 +23,16 @@ void copy_rectangle(const Image<1>& src, int x, std::int64_t y, Image<1>* dst) {
 
 void cropNv21(unsigned char* nv21, int imageWidth, int imageHeight, int x, int y, int w, int h,
               unsigned char* out) {
-  const Image<1> frame = kyface::view_420(nv21, imageWidth, imageHeight);
-  const Image<1> cropped = Image<1>::allocate(w, kyface::rows_420(h));
+  const Image<1> frame = kyface::view420(nv21, imageWidth, imageHeight);
+  const Image<1> cropped = Image<1>::allocate(w, kyface::rows420(h));
   if (cropped.data == nullptr) {
     return;
   }
   Image<1> luma(w, h, cropped.data);
   Image<1> chroma(w, h / 2, cropped.data + std::int64_t{w} * h);
-  copy_rectangle(frame, x, y, &luma);
+  copyRectangle(frame, x, y, &luma);
   // The column is that of the luma: a chroma row holds as many bytes as a luma row.
-  copy_rectangle(frame, x, std::int64_t{imageHeight} + y / 2, &chroma);
+  copyRectangle(frame, x, std::int64_t{imageHeight} + y / 2, &chroma);
   Image<4> dst(w, h, out);
   kyface::convert<HPC::fastcv::CVT_NV212RGB>(cropped, &dst);
 }

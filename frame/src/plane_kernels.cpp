@@ -29,7 +29,7 @@ static_assert(kBlock == kKernelSide);
 /// Calls `block(x)` for blocks of `size` that cover `length`, which is at least that; the last is flush with
 /// the end.
 template <typename Block>
-inline void for_each_block(ptrdiff_t length, ptrdiff_t size, const Block& block) {
+inline void forEachBlock(ptrdiff_t length, ptrdiff_t size, const Block& block) {
   ptrdiff_t x = 0;
   for (; x <= length - size; x += size) {
     block(x);
@@ -42,12 +42,12 @@ inline void for_each_block(ptrdiff_t length, ptrdiff_t size, const Block& block)
 // ---- rows
 
 template <int nc, bool swapped, bool pairs, bool mirrored>
-void decode_rows(const PlanesView& view, const PixelRows& to) {
-  const ColourDecoder<nc, swapped> decoder(view.first_is_v);
+void decodeRows(const PlanesView& view, const PixelRows& to) {
+  const ColourDecoder<nc, swapped> decoder(view.firstIsV);
   for (ptrdiff_t row = 0; row < view.height; row += 2) {
-    const Byte* const luma = view.luma + row * view.luma_stride;
-    const RowPair from = {luma, luma + view.luma_stride, view.first + row / 2 * view.first_stride,
-                          pairs ? nullptr : view.second + row / 2 * view.second_stride};
+    const Byte* const luma = view.luma + row * view.lumaStride;
+    const RowPair from = {luma, luma + view.lumaStride, view.first + row / 2 * view.firstStride,
+                          pairs ? nullptr : view.second + row / 2 * view.secondStride};
     Byte* const out = to.data + row * to.stride;
     decodeRowPair<pairs, mirrored>(decoder, from, view.width, out, out + to.stride);
   }
@@ -58,7 +58,7 @@ void decode_rows(const PlanesView& view, const PixelRows& to) {
 /// Transposes a tile of 16 bytes by as many rows as pixels of `bytes` bytes are in them: `store(r, v)` is
 /// given row r of the result.
 template <int bytes, typename Store>
-TILE_INLINE void transpose_tile(const Byte* src, const RowOffsets<16 / bytes>& rows, const Store& store) {
+TILE_INLINE void transposeTile(const Byte* src, const RowOffsets<16 / bytes>& rows, const Store& store) {
   constexpr int kSide = 16 / bytes;
   detail::Registers<bytes, 16, kSide, 1> in;
   detail::unrolled<kSide>([&](auto r) TILE_LAMBDA { in.v[r] = vld1q_u8(src + rows.at[r]); });
@@ -85,11 +85,11 @@ struct Scratch {
 /// Transposes `count` tiles, one behind the other along source rows that are `stride` apart, to rows of which
 /// `at(dst, r)` says where row r of a tile is. The next tile's are `next` bytes behind.
 template <int bytes, typename At>
-TILE_INLINE void transpose_tiles(const Byte* src, const RowOffsets<16 / bytes>& rows, ptrdiff_t count,
-                                 Byte* dst, ptrdiff_t next, const At& at) {
+TILE_INLINE void transposeTiles(const Byte* src, const RowOffsets<16 / bytes>& rows, ptrdiff_t count,
+                                Byte* dst, ptrdiff_t next, const At& at) {
   KERNEL_ROLLED_LOOP
   for (; count != 0; --count) {
-    transpose_tile<bytes>(src, rows, [&](auto r, uint8x16_t v) TILE_LAMBDA { vst1q_u8(at(dst, r), v); });
+    transposeTile<bytes>(src, rows, [&](auto r, uint8x16_t v) TILE_LAMBDA { vst1q_u8(at(dst, r), v); });
     src += 16;
     keepInRegister(src);
     dst += next;
@@ -99,40 +99,40 @@ TILE_INLINE void transpose_tiles(const Byte* src, const RowOffsets<16 / bytes>& 
 
 /// Fills the luma of a scratch block: `rows` rows of the result, a multiple of 32, from row `row` and column
 /// `column` on, both even.
-inline void transpose_luma_block(const PlanesView& view, ptrdiff_t row, ptrdiff_t column, ptrdiff_t rows,
-                                 Scratch& scratch) {
-  const RowOffsets<16> offsets(view.luma_stride);
-  const Byte* src = view.luma + column * view.luma_stride + row;
+inline void transposeLumaBlock(const PlanesView& view, ptrdiff_t row, ptrdiff_t column, ptrdiff_t rows,
+                               Scratch& scratch) {
+  const RowOffsets<16> offsets(view.lumaStride);
+  const Byte* src = view.luma + column * view.lumaStride + row;
   KERNEL_ROLLED_LOOP
   for (int side = 0; side < 2; ++side) {
-    transpose_tiles<1>(src, offsets, rows / 16, scratch.luma[0][side][0], 8 * 64,
-                       [](Byte* dst, int r) TILE_LAMBDA { return dst + r / 2 * 64 + r % 2 * 16; });
-    src += 16 * view.luma_stride;
+    transposeTiles<1>(src, offsets, rows / 16, scratch.luma[0][side][0], 8 * 64,
+                      [](Byte* dst, int r) TILE_LAMBDA { return dst + r / 2 * 64 + r % 2 * 16; });
+    src += 16 * view.lumaStride;
   }
 }
 
 /// The same of the chroma.
 template <bool pairs>
-inline void transpose_chroma_block(const PlanesView& view, ptrdiff_t row, ptrdiff_t column, ptrdiff_t rows,
-                                   Scratch& scratch) {
+inline void transposeChromaBlock(const PlanesView& view, ptrdiff_t row, ptrdiff_t column, ptrdiff_t rows,
+                                 Scratch& scratch) {
   const auto at = [](Byte* dst, int r) TILE_LAMBDA { return dst + r * kBlock; };
   if constexpr (pairs) {
-    const RowOffsets<8> offsets(view.first_stride);
-    const Byte* src = view.first + column / 2 * view.first_stride + row;
+    const RowOffsets<8> offsets(view.firstStride);
+    const Byte* src = view.first + column / 2 * view.firstStride + row;
     KERNEL_ROLLED_LOOP
     for (int side = 0; side < 2; ++side) {
-      transpose_tiles<2>(src, offsets, rows / 16, scratch.chroma[0] + 16 * side, 8 * kBlock, at);
-      src += 8 * view.first_stride;
+      transposeTiles<2>(src, offsets, rows / 16, scratch.chroma[0] + 16 * side, 8 * kBlock, at);
+      src += 8 * view.firstStride;
     }
   } else {
-    const Byte* src = view.first + column / 2 * view.first_stride + row / 2;
-    ptrdiff_t stride = view.first_stride;
+    const Byte* src = view.first + column / 2 * view.firstStride + row / 2;
+    ptrdiff_t stride = view.firstStride;
     KERNEL_ROLLED_LOOP
     for (int side = 0; side < 2; ++side) {
       const RowOffsets<16> offsets(stride);
-      transpose_tiles<1>(src, offsets, rows / 32, scratch.chroma[0] + 16 * side, 16 * kBlock, at);
-      src = view.second + column / 2 * view.second_stride + row / 2;
-      stride = view.second_stride;
+      transposeTiles<1>(src, offsets, rows / 32, scratch.chroma[0] + 16 * side, 16 * kBlock, at);
+      src = view.second + column / 2 * view.secondStride + row / 2;
+      stride = view.secondStride;
     }
   }
 }
@@ -140,12 +140,12 @@ inline void transpose_chroma_block(const PlanesView& view, ptrdiff_t row, ptrdif
 /// Calls `block(row, rows, column)` for blocks that cover the transposed view: up to 128 rows, a multiple of
 /// 32, and 32 columns.
 template <typename Block>
-inline void for_each_transposed_block(const PlanesView& view, const Block& block) {
+inline void forEachTransposedBlock(const PlanesView& view, const Block& block) {
   const ptrdiff_t height = view.width;
   for (ptrdiff_t row = 0; row < height;) {
     const ptrdiff_t rows = std::clamp<ptrdiff_t>((height - row) / kBlock * kBlock, kBlock, Scratch::kRows);
     row = std::min(row, height - rows);
-    for_each_block(view.height, kBlock, [&](ptrdiff_t column) { block(row, rows, column); });
+    forEachBlock(view.height, kBlock, [&](ptrdiff_t column) { block(row, rows, column); });
     row += rows;
   }
 }
@@ -153,37 +153,37 @@ inline void for_each_transposed_block(const PlanesView& view, const Block& block
 /// Decodes the first `rows` rows of a scratch block. What is constant belongs to the function: kept elsewhere
 /// it would be loaded again after every store.
 template <int nc, bool swapped, bool pairs>
-inline void decode_block(const Scratch& scratch, ptrdiff_t rows, bool first_is_v, const PixelRows& to) {
-  const ColourDecoder<nc, swapped> decoder(first_is_v);
+inline void decodeBlock(const Scratch& scratch, ptrdiff_t rows, bool firstIsV, const PixelRows& to) {
+  const ColourDecoder<nc, swapped> decoder(firstIsV);
   Byte* out[2] = {to.data, to.data + to.stride};
   const ptrdiff_t step = 2 * to.stride - 16 * nc;
-  const Byte* luma_at = scratch.luma[0][0][0];
-  const Byte* chroma_at = scratch.chroma[0];
+  const Byte* lumaAt = scratch.luma[0][0][0];
+  const Byte* chromaAt = scratch.chroma[0];
   KERNEL_ROLLED_LOOP
   for (ptrdiff_t n = rows / 2; n != 0; --n) {
     ChromaBlock chroma;
     if constexpr (pairs) {
-      loadSamplePairs(chroma_at, chroma.first, chroma.second);
+      loadSamplePairs(chromaAt, chroma.first, chroma.second);
     } else {
-      chroma = {loadSamples(chroma_at), loadSamples(chroma_at + 16)};
+      chroma = {loadSamples(chromaAt), loadSamples(chromaAt + 16)};
     }
-    chroma_at += kBlock;
-    keepInRegister(chroma_at);
-    decoder.decode([=](int row, int part) TILE_LAMBDA { return loadParts(luma_at + 16 * row, 32, part); },
+    chromaAt += kBlock;
+    keepInRegister(chromaAt);
+    decoder.decode([=](int row, int part) TILE_LAMBDA { return loadParts(lumaAt + 16 * row, 32, part); },
                    chroma, out, step);
-    luma_at += 64;
-    keepInRegister(luma_at);
+    lumaAt += 64;
+    keepInRegister(lumaAt);
   }
 }
 
 template <int nc, bool swapped, bool pairs>
-void decode_transposed(const PlanesView& view, const PixelRows& to) {
+void decodeTransposed(const PlanesView& view, const PixelRows& to) {
   Scratch scratch;
-  for_each_transposed_block(view, [&](ptrdiff_t row, ptrdiff_t rows, ptrdiff_t column) {
-    transpose_luma_block(view, row, column, rows, scratch);
-    transpose_chroma_block<pairs>(view, row, column, rows, scratch);
-    decode_block<nc, swapped, pairs>(scratch, rows, view.first_is_v,
-                                     {to.data + row * to.stride + column * nc, to.stride});
+  forEachTransposedBlock(view, [&](ptrdiff_t row, ptrdiff_t rows, ptrdiff_t column) {
+    transposeLumaBlock(view, row, column, rows, scratch);
+    transposeChromaBlock<pairs>(view, row, column, rows, scratch);
+    decodeBlock<nc, swapped, pairs>(scratch, rows, view.firstIsV,
+                                    {to.data + row * to.stride + column * nc, to.stride});
   });
 }
 
@@ -192,7 +192,7 @@ void decode_transposed(const PlanesView& view, const PixelRows& to) {
 /// Copies a row of at least 16 bytes in registers, each rearranged by `order`, and their order reversed where
 /// `mirrored`.
 template <bool mirrored>
-void rearrange_row(const Byte* src, Byte* dst, ptrdiff_t size, uint8x16_t order) {
+void rearrangeRow(const Byte* src, Byte* dst, ptrdiff_t size, uint8x16_t order) {
   const auto move = [=](ptrdiff_t x, auto registers) {
     constexpr int kCount = registers;
     const Byte* from = src + (mirrored ? size - x - 16 * kCount : x);
@@ -218,7 +218,7 @@ void rearrange_row(const Byte* src, Byte* dst, ptrdiff_t size, uint8x16_t order)
 
 /// The places of a register's bytes: from its end where mirrored, in units of 1 or 2 bytes; with the bytes of
 /// each pair exchanged where `swapped`.
-uint8x16_t order_of(int bytes, bool mirrored, bool swapped) {
+uint8x16_t orderOf(int bytes, bool mirrored, bool swapped) {
   std::array<Byte, 16> order;
   for (int i = 0; i < 16; ++i) {
     const int unit = mirrored ? 16 / bytes - 1 - i / bytes : i / bytes;
@@ -227,16 +227,16 @@ uint8x16_t order_of(int bytes, bool mirrored, bool swapped) {
   return vld1q_u8(order.data());
 }
 
-void copy_pixels(int bytes, ptrdiff_t height, ptrdiff_t size, const Byte* src, ptrdiff_t stride,
-                 bool mirrored, bool swapped, const PixelRows& to) {
+void copyPixels(int bytes, ptrdiff_t height, ptrdiff_t size, const Byte* src, ptrdiff_t stride, bool mirrored,
+                bool swapped, const PixelRows& to) {
   if (!mirrored && !swapped) {
     copyRows(height, size, src, stride, to.data, to.stride);
     return;
   }
-  const uint8x16_t order = order_of(bytes, mirrored, swapped);
+  const uint8x16_t order = orderOf(bytes, mirrored, swapped);
   for (ptrdiff_t row = 0; row < height; ++row) {
-    (mirrored ? rearrange_row<true> : rearrange_row<false>)(src + row * stride, to.data + row * to.stride,
-                                                            size, order);
+    (mirrored ? rearrangeRow<true> : rearrangeRow<false>)(src + row * stride, to.data + row * to.stride, size,
+                                                          order);
   }
 }
 
@@ -247,7 +247,7 @@ inline uint8x16_t reversedBytes(uint8x16_t v) {
 
 /// Interleaves rows of samples of two planes.
 template <bool mirrored>
-void interleave_row(const Byte* first, const Byte* second, Byte* dst, ptrdiff_t samples) {
+void interleaveRow(const Byte* first, const Byte* second, Byte* dst, ptrdiff_t samples) {
   const auto move = [=](ptrdiff_t x) {
     const ptrdiff_t from = mirrored ? samples - x - 16 : x;
     const uint8x16_t a = vld1q_u8(first + from);
@@ -255,11 +255,11 @@ void interleave_row(const Byte* first, const Byte* second, Byte* dst, ptrdiff_t 
     const uint8x16x2_t both = {{mirrored ? reversedBytes(a) : a, mirrored ? reversedBytes(b) : b}};
     vst2q_u8(dst + 2 * x, both);
   };
-  for_each_block(samples, 16, move);
+  forEachBlock(samples, 16, move);
 }
 
 /// Copies `pairs` row pairs of a scratch block's luma.
-inline void copy_luma_block(const Scratch& scratch, ptrdiff_t pairs, Byte* to, ptrdiff_t stride) {
+inline void copyLumaBlock(const Scratch& scratch, ptrdiff_t pairs, Byte* to, ptrdiff_t stride) {
   const Byte* from = scratch.luma[0][0][0];
   KERNEL_ROLLED_LOOP
   for (; pairs != 0; --pairs) {
@@ -274,19 +274,19 @@ inline void copy_luma_block(const Scratch& scratch, ptrdiff_t pairs, Byte* to, p
   }
 }
 
-/// Copies rows of a scratch block's chroma as pairs, their bytes in the order of `pair_order` where they are
+/// Copies rows of a scratch block's chroma as pairs, their bytes in the order of `pairOrder` where they are
 /// pairs already.
 template <bool pairs>
-inline void copy_chroma_block(const Scratch& scratch, ptrdiff_t rows, uint8x16_t pair_order, Byte* to,
-                              ptrdiff_t stride) {
+inline void copyChromaBlock(const Scratch& scratch, ptrdiff_t rows, uint8x16_t pairOrder, Byte* to,
+                            ptrdiff_t stride) {
   const Byte* from = scratch.chroma[0];
   KERNEL_ROLLED_LOOP
   for (; rows != 0; --rows) {
     const uint8x16x2_t both = {{vld1q_u8(from), vld1q_u8(from + 16)}};
     from += kBlock;
     if constexpr (pairs) {
-      vst1q_u8(to, vqtbl1q_u8(both.val[0], pair_order));
-      vst1q_u8(to + 16, vqtbl1q_u8(both.val[1], pair_order));
+      vst1q_u8(to, vqtbl1q_u8(both.val[0], pairOrder));
+      vst1q_u8(to + 16, vqtbl1q_u8(both.val[1], pairOrder));
     } else {
       vst2q_u8(to, both);
     }
@@ -298,85 +298,85 @@ inline void copy_chroma_block(const Scratch& scratch, ptrdiff_t rows, uint8x16_t
 /// Calls one of the instances of a kernel for what varies: `kernel` is given the bytes of a pixel, whether
 /// the chroma samples change places, and whether they are pairs, as types.
 template <typename Kernel>
-void with_instance(const PlanesView& view, ColourOrder order, const Kernel& kernel) {
-  const auto with_layout = [&](auto nc) {
+void withInstance(const PlanesView& view, ColourOrder order, const Kernel& kernel) {
+  const auto withLayout = [&](auto nc) {
     if (view.second != nullptr) {
       kernel(nc, std::false_type{}, std::false_type{});
-    } else if (view.first_is_v == order.red_first) {
+    } else if (view.firstIsV == order.redFirst) {
       kernel(nc, std::false_type{}, std::true_type{});
     } else {
       kernel(nc, std::true_type{}, std::true_type{});
     }
   };
   if (order.alpha) {
-    with_layout(std::integral_constant<int, 4>{});
+    withLayout(std::integral_constant<int, 4>{});
   } else {
-    with_layout(std::integral_constant<int, 3>{});
+    withLayout(std::integral_constant<int, 3>{});
   }
 }
 
 /// The view with the samples first that are V, or U. Pairs stay as they are.
-PlanesView with_first(const PlanesView& view, bool v_first) {
+PlanesView withFirst(const PlanesView& view, bool vFirst) {
   PlanesView ordered = view;
-  if (view.second != nullptr && view.first_is_v != v_first) {
+  if (view.second != nullptr && view.firstIsV != vFirst) {
     std::swap(ordered.first, ordered.second);
-    std::swap(ordered.first_stride, ordered.second_stride);
-    ordered.first_is_v = v_first;
+    std::swap(ordered.firstStride, ordered.secondStride);
+    ordered.firstIsV = vFirst;
   }
   return ordered;
 }
 
 }  // namespace
 
-void decode_rows(const PlanesView& view, bool mirrored, ColourOrder order, const PixelRows& out) {
-  const PlanesView ordered = with_first(view, order.red_first);
-  with_instance(ordered, order, [&](auto nc, auto swapped, auto pairs) {
-    (mirrored ? decode_rows<nc, swapped, pairs, true> : decode_rows<nc, swapped, pairs, false>)(ordered, out);
+void decodeRows(const PlanesView& view, bool mirrored, ColourOrder order, const PixelRows& out) {
+  const PlanesView ordered = withFirst(view, order.redFirst);
+  withInstance(ordered, order, [&](auto nc, auto swapped, auto pairs) {
+    (mirrored ? decodeRows<nc, swapped, pairs, true> : decodeRows<nc, swapped, pairs, false>)(ordered, out);
   });
 }
 
-void decode_transposed(const PlanesView& view, ColourOrder order, const PixelRows& out) {
-  const PlanesView ordered = with_first(view, order.red_first);
-  with_instance(ordered, order, [&](auto nc, auto swapped, auto pairs) {
-    decode_transposed<nc, swapped, pairs>(ordered, out);
+void decodeTransposed(const PlanesView& view, ColourOrder order, const PixelRows& out) {
+  const PlanesView ordered = withFirst(view, order.redFirst);
+  withInstance(ordered, order, [&](auto nc, auto swapped, auto pairs) {
+    decodeTransposed<nc, swapped, pairs>(ordered, out);
   });
 }
 
-void copy_luma(const PlanesView& view, bool mirrored, const PixelRows& out) {
-  copy_pixels(1, view.height, view.width, view.luma, view.luma_stride, mirrored, false, out);
+void copyLuma(const PlanesView& view, bool mirrored, const PixelRows& out) {
+  copyPixels(1, view.height, view.width, view.luma, view.lumaStride, mirrored, false, out);
 }
 
-void transpose_luma(const PlanesView& view, const PixelRows& out) {
+void transposeLuma(const PlanesView& view, const PixelRows& out) {
   Scratch scratch;
-  for_each_transposed_block(view, [&](ptrdiff_t row, ptrdiff_t rows, ptrdiff_t column) {
-    transpose_luma_block(view, row, column, rows, scratch);
-    copy_luma_block(scratch, rows / 2, out.data + row * out.stride + column, out.stride);
+  forEachTransposedBlock(view, [&](ptrdiff_t row, ptrdiff_t rows, ptrdiff_t column) {
+    transposeLumaBlock(view, row, column, rows, scratch);
+    copyLumaBlock(scratch, rows / 2, out.data + row * out.stride + column, out.stride);
   });
 }
 
-void copy_chroma(const PlanesView& view, bool mirrored, bool v_first, const PixelRows& out) {
-  const PlanesView ordered = with_first(view, v_first);
+void copyChroma(const PlanesView& view, bool mirrored, bool vFirst, const PixelRows& out) {
+  const PlanesView ordered = withFirst(view, vFirst);
   if (ordered.second == nullptr) {
-    copy_pixels(2, view.height / 2, view.width, view.first, view.first_stride, mirrored,
-                view.first_is_v != v_first, out);
+    copyPixels(2, view.height / 2, view.width, view.first, view.firstStride, mirrored,
+               view.firstIsV != vFirst, out);
     return;
   }
   for (ptrdiff_t row = 0; row < view.height / 2; ++row) {
-    (mirrored ? interleave_row<true> : interleave_row<false>)(ordered.first + row * ordered.first_stride,
-                                                              ordered.second + row * ordered.second_stride,
-                                                              out.data + row * out.stride, view.width / 2);
+    (mirrored ? interleaveRow<true> : interleaveRow<false>)(ordered.first + row * ordered.firstStride,
+                                                            ordered.second + row * ordered.secondStride,
+                                                            out.data + row * out.stride, view.width / 2);
   }
 }
 
-void transpose_chroma(const PlanesView& view, bool v_first, const PixelRows& out) {
-  const PlanesView ordered = with_first(view, v_first);
-  const uint8x16_t pair_order = order_of(2, false, view.first_is_v != v_first);
+void transposeChroma(const PlanesView& view, bool vFirst, const PixelRows& out) {
+  const PlanesView ordered = withFirst(view, vFirst);
+  const uint8x16_t pairOrder = orderOf(2, false, view.firstIsV != vFirst);
   const auto transpose = [&](auto pairs) {
     Scratch scratch;
-    for_each_transposed_block(ordered, [&](ptrdiff_t row, ptrdiff_t rows, ptrdiff_t column) {
-      transpose_chroma_block<pairs>(ordered, row, column, rows, scratch);
-      copy_chroma_block<pairs>(scratch, rows / 2, pair_order, out.data + row / 2 * out.stride + column,
-                               out.stride);
+    forEachTransposedBlock(ordered, [&](ptrdiff_t row, ptrdiff_t rows, ptrdiff_t column) {
+      transposeChromaBlock<pairs>(ordered, row, column, rows, scratch);
+      copyChromaBlock<pairs>(scratch, rows / 2, pairOrder, out.data + row / 2 * out.stride + column,
+                             out.stride);
     });
   };
   if (ordered.second != nullptr) {

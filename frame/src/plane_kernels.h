@@ -1,6 +1,6 @@
 // SPDX-FileCopyrightText: the libjni_kyface_api authors
 // SPDX-License-Identifier: Apache-2.0
-/// The pixel work behind `convert_planes`. Everything is trusted here, and pictures are not small.
+/// The pixel work behind `convertPlanes`. Everything is trusted here, and pictures are not small.
 #pragma once
 
 #include <cstddef>
@@ -16,12 +16,12 @@ struct PlanesView {
   int width;   ///< even, at least kKernelSide
   int height;  ///< even; at least kKernelSide where the view is turned
   const unsigned char* luma;
-  std::ptrdiff_t luma_stride;
+  std::ptrdiff_t lumaStride;
   const unsigned char* first;  ///< the pairs, or the plane of the samples that are called first
-  std::ptrdiff_t first_stride;
+  std::ptrdiff_t firstStride;
   const unsigned char* second;  ///< null with pairs
-  std::ptrdiff_t second_stride;
-  bool first_is_v;  ///< whether the pairs' or planes' first samples are V, not U
+  std::ptrdiff_t secondStride;
+  bool firstIsV;  ///< whether the pairs' or planes' first samples are V, not U
 };
 
 /// Rows to write; signed as well.
@@ -32,22 +32,22 @@ struct PixelRows {
 
 /// How a colour is written.
 struct ColourOrder {
-  bool red_first;
+  bool redFirst;
   bool alpha;  ///< a fourth byte of 255
 };
 
 /// Decodes a view, with its rows as they are or mirrored left to right.
-void decode_rows(const PlanesView& view, bool mirrored, ColourOrder order, const PixelRows& out);
+void decodeRows(const PlanesView& view, bool mirrored, ColourOrder order, const PixelRows& out);
 
 /// Decodes a view transposed: its columns become rows.
-void decode_transposed(const PlanesView& view, ColourOrder order, const PixelRows& out);
+void decodeTransposed(const PlanesView& view, ColourOrder order, const PixelRows& out);
 
 /// Copies a view's luma.
-void copy_luma(const PlanesView& view, bool mirrored, const PixelRows& out);
-void transpose_luma(const PlanesView& view, const PixelRows& out);
+void copyLuma(const PlanesView& view, bool mirrored, const PixelRows& out);
+void transposeLuma(const PlanesView& view, const PixelRows& out);
 
 /// Copies a view's chroma as pairs, V first or U first.
-void copy_chroma(const PlanesView& view, bool mirrored, bool v_first, const PixelRows& out);
-void transpose_chroma(const PlanesView& view, bool v_first, const PixelRows& out);
+void copyChroma(const PlanesView& view, bool mirrored, bool vFirst, const PixelRows& out);
+void transposeChroma(const PlanesView& view, bool vFirst, const PixelRows& out);
 
 }  // namespace kyface

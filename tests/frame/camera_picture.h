@@ -11,6 +11,7 @@
 #include "frame/planes.h"
 #include "tests/support/frame_reference.h"
 #include "tests/support/guarded_image.h"
+#include "tests/support/pixel_layout.h"
 
 namespace kyface::test {
 
@@ -69,23 +70,6 @@ inline constexpr std::array kLayouts = {PixelLayout::kRgba, PixelLayout::kBgra, 
                                         PixelLayout::kBgr,  PixelLayout::kNv21, PixelLayout::kNv12,
                                         PixelLayout::kGray};
 
-inline int pixel_bytes_of(PixelLayout layout) {
-  switch (layout) {
-    case PixelLayout::kRgba:
-    case PixelLayout::kBgra:
-      return 4;
-    case PixelLayout::kRgb:
-    case PixelLayout::kBgr:
-      return 3;
-    default:
-      return 1;
-  }
-}
-
-inline bool is_semi_planar(PixelLayout layout) {
-  return layout == PixelLayout::kNv21 || layout == PixelLayout::kNv12;
-}
-
 /// Rows of a result of `height` pixels, those of chroma pairs among them.
 inline int rows_of(PixelLayout layout, int height) {
   return is_semi_planar(layout) ? height * 3 / 2 : height;
@@ -108,8 +92,8 @@ class CameraPicture {
       planes_.back()->fill(source);
       return planes_.back().get();
     };
-    const auto spread = [&](int pixel_stride) {
-      return plane(*chroma_plane((pairs - 1) * pixel_stride + 1), 0, pixel_stride);
+    const auto spread = [&](int pixelStride) {
+      return plane(*chroma_plane((pairs - 1) * pixelStride + 1), 0, pixelStride);
     };
     switch (chroma) {
       case Chroma::kPairsVu:
@@ -143,7 +127,7 @@ class CameraPicture {
     const Rectangle chroma = {part.left / 2, part.top / 2, part.width / 2, part.height / 2};
     const auto samples = [](const Plane& plane, int width, int height) {
       return grid_of(width, height, [&](int x, int y) {
-        return plane.data[static_cast<ptrdiff_t>(y) * plane.row_stride + x * plane.pixel_stride];
+        return plane.data[static_cast<ptrdiff_t>(y) * plane.rowStride + x * plane.pixelStride];
       });
     };
     const int width = picture_.width;
@@ -169,9 +153,9 @@ class CameraPicture {
   }
 
  private:
-  static Plane plane(const GuardedImage<unsigned char>& image, int from, int pixel_stride) {
+  static Plane plane(const GuardedImage<unsigned char>& image, int from, int pixelStride) {
     const std::int64_t size = std::int64_t{image.rows() - 1} * image.stride() + image.rowElements() - from;
-    return {image.data() + from, size, image.stride(), pixel_stride};
+    return {image.data() + from, size, image.stride(), pixelStride};
   }
 
   GuardedImage<unsigned char> luma_;

@@ -28,7 +28,7 @@ Rectangle all_of(const PlanarPicture& picture) { return {0, 0, picture.width, pi
 class Result : public GuardedImage<unsigned char> {
  public:
   Result(const Rectangle& part, const Orientation& orientation, PixelLayout layout, int padding)
-      : Result(size_of_view(part, orientation), layout, padding) {}
+      : Result(sizeOfView(part, orientation), layout, padding) {}
 
   Target target() { return {data(), std::int64_t{rows() - 1} * stride() + rowElements(), stride(), layout_}; }
 
@@ -57,7 +57,7 @@ Rectangle made_even(const Rectangle& part) {
 std::string difference(const CameraPicture& picture, const Rectangle& part, const Orientation& orientation,
                        PixelLayout layout, int padding) {
   Result out(part, orientation, layout, padding);
-  const PlanesStatus status = convert_planes(picture.planes(), part, orientation, out.target());
+  const PlanesStatus status = convertPlanes(picture.planes(), part, orientation, out.target());
   if (status != PlanesStatus::kSuccess) {
     return "status " + std::to_string(static_cast<int>(status));
   }
@@ -164,7 +164,7 @@ TEST(Planes, EveryColour) {
     const Bytes now = luma.contents();
     std::copy(now.begin(), now.end(), frame.begin());
     Result out(all_of(picture), {}, PixelLayout::kRgba, 0);
-    ASSERT_EQ(convert_planes(picture, all_of(picture), {}, out.target()), PlanesStatus::kSuccess);
+    ASSERT_EQ(convertPlanes(picture, all_of(picture), {}, out.target()), PlanesStatus::kSuccess);
     ASSERT_TRUE(out.holds(reference::to_pixels(frame, kWidth, kHeight, reference::kNv21, reference::kRgba)))
         << turn;
   }
@@ -173,16 +173,16 @@ TEST(Planes, EveryColour) {
 TEST(Planes, PairsAreMadeWhole) {
   for (int left = 0; left < 4; ++left) {
     for (int width = 1; width < 6; ++width) {
-      const Rectangle whole = whole_pairs({left, left, width, width});
+      const Rectangle whole = wholePairs({left, left, width, width});
       const Rectangle expected = made_even({left, left, width, width});
       EXPECT_EQ(whole.left, expected.left);
       EXPECT_EQ(whole.top, expected.top);
       EXPECT_EQ(whole.width, expected.width);
       EXPECT_EQ(whole.height, expected.height);
-      const Size upright = size_of_view({left, 0, width, 2}, {180, true});
+      const Size upright = sizeOfView({left, 0, width, 2}, {180, true});
       EXPECT_EQ(upright.width, expected.width);
       EXPECT_EQ(upright.height, 2);
-      const Size sideways = size_of_view({left, 0, width, 2}, {270, false});
+      const Size sideways = sizeOfView({left, 0, width, 2}, {270, false});
       EXPECT_EQ(sideways.width, 2);
       EXPECT_EQ(sideways.height, expected.width);
     }
@@ -206,7 +206,7 @@ class Refusal : public testing::Test {
     target.layout = layout_;
     target.data = target_is_null_ ? nullptr : target.data;
     const Bytes before = out.contents();
-    EXPECT_EQ(convert_planes(picture_, part_, orientation_, target), status);
+    EXPECT_EQ(convertPlanes(picture_, part_, orientation_, target), status);
     EXPECT_TRUE(out.holds(before));
     picture_ = camera_.planes();
     part_ = all_of(picture_);
@@ -243,32 +243,32 @@ TEST_F(Refusal, PlanesThatDoNotHoldThePicture) {
   expect(PlanesStatus::kLuma);
   picture_.y.size = -1;
   expect(PlanesStatus::kLuma);
-  picture_.y.row_stride = kWidth - 1;
+  picture_.y.rowStride = kWidth - 1;
   expect(PlanesStatus::kLuma);
-  picture_.y.row_stride += 1;
+  picture_.y.rowStride += 1;
   expect(PlanesStatus::kLuma);
-  picture_.y.row_stride = INT64_MAX;
+  picture_.y.rowStride = INT64_MAX;
   expect(PlanesStatus::kLuma);
-  picture_.y.row_stride = INT64_MIN;
+  picture_.y.rowStride = INT64_MIN;
   expect(PlanesStatus::kLuma);
-  picture_.y.pixel_stride = 2;
+  picture_.y.pixelStride = 2;
   expect(PlanesStatus::kLuma);
   for (Plane PlanarPicture::* plane : {&PlanarPicture::u, &PlanarPicture::v}) {
     (picture_.*plane).data = nullptr;
     expect(PlanesStatus::kChroma);
     (picture_.*plane).size -= 1;
     expect(PlanesStatus::kChroma);
-    (picture_.*plane).row_stride = kWidth / 2 - 1;
+    (picture_.*plane).rowStride = kWidth / 2 - 1;
     expect(PlanesStatus::kChroma);
-    (picture_.*plane).row_stride += 1;
+    (picture_.*plane).rowStride += 1;
     expect(PlanesStatus::kChroma);
-    (picture_.*plane).pixel_stride = 2;
+    (picture_.*plane).pixelStride = 2;
     expect(PlanesStatus::kChroma);
-    (picture_.*plane).pixel_stride = INT_MAX;
+    (picture_.*plane).pixelStride = INT_MAX;
     expect(PlanesStatus::kChroma);
-    (picture_.*plane).pixel_stride = 0;
+    (picture_.*plane).pixelStride = 0;
     expect(PlanesStatus::kChroma);
-    (picture_.*plane).pixel_stride = -1;
+    (picture_.*plane).pixelStride = -1;
     expect(PlanesStatus::kChroma);
   }
 }
@@ -339,14 +339,14 @@ TEST(Planes, ATargetOverAPlaneIsRefused) {
       (picture.*plane) = {memory.data() + from, 400 - from, 10, 1};
       // The target is bytes 100 to 147; what lies beside it is no overlap.
       const Target target = {memory.data() + 100, 48, 8, PixelLayout::kGray};
-      EXPECT_EQ(convert_planes(picture, {0, 0, 8, 6}, {}, target), PlanesStatus::kOverlap) << from;
+      EXPECT_EQ(convertPlanes(picture, {0, 0, 8, 6}, {}, target), PlanesStatus::kOverlap) << from;
       EXPECT_EQ(memory, Bytes(400, 7));
     }
     for (const std::int64_t from : {100 - in_plane, std::int64_t{148}}) {
       PlanarPicture picture = camera.planes();
       (picture.*plane) = {memory.data() + from, 400 - from, 10, 1};
       const Target target = {memory.data() + 100, 48, 8, PixelLayout::kGray};
-      EXPECT_EQ(convert_planes(picture, {0, 0, 8, 6}, {}, target), PlanesStatus::kSuccess) << from;
+      EXPECT_EQ(convertPlanes(picture, {0, 0, 8, 6}, {}, target), PlanesStatus::kSuccess) << from;
     }
   }
 }

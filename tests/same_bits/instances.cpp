@@ -241,7 +241,7 @@ void addTotalLightness(std::vector<Instance>& all) {
     const auto run = [rgba](Size size, Checksum& sum) {
       const int stride = size.width * 4 + 3;
       const Bytes in = pixels<unsigned char>(area(size.height, stride) + kSlack, 1, "BGR");
-      sum.add(kyface::brightness::total_lightness(in.data(), stride, size.width, size.height, rgba));
+      sum.add(kyface::brightness::totalLightness(in.data(), stride, size.width, size.height, rgba));
     };
     all.push_back({rgba ? "total_lightness RGBA" : "total_lightness BGRA", run});
   }
@@ -339,12 +339,12 @@ void addPlanes(std::vector<Instance>& all) {
           for (const Chroma chroma : {Chroma::kVu, Chroma::kUv, Chroma::kPlanes, Chroma::kApart}) {
             for (const kyface::Rectangle& part : rectangles(size)) {
               const kyface::Orientation orientation = {degrees, mirrored};
-              const kyface::Size to = size_of_view(part, orientation);
+              const kyface::Size to = sizeOfView(part, orientation);
               const int stride = to.width * layout.bytes + 7;
               Bytes out = destination<unsigned char>(area(to.height * 2, stride) + kSlack);
               const auto room = static_cast<std::int64_t>(out.size());
-              sum.add(static_cast<int>(convert_planes(planarPicture(size, chroma, in), part, orientation,
-                                                      {out.data(), room, stride, layout.layout})));
+              sum.add(static_cast<int>(convertPlanes(planarPicture(size, chroma, in), part, orientation,
+                                                     {out.data(), room, stride, layout.layout})));
               sum.add(out);
             }
           }

@@ -1,6 +1,6 @@
 // SPDX-FileCopyrightText: the libjni_kyface_api authors
 // SPDX-License-Identifier: Apache-2.0
-/// What a layout of `convert_planes` means for the size of a result.
+/// What a layout of `convertPlanes` means for the size of a result.
 #pragma once
 
 #include "frame/planes.h"

@@ -18,7 +18,7 @@
 /// Writes a message of a native method, error messages included, while the debug switch is on.
 #define FACE_LOG(priority, ...)               \
   do {                                        \
-    if (kyface::debug_enabled()) {            \
+    if (kyface::debugEnabled()) {             \
       FACE_LOG_ALWAYS(priority, __VA_ARGS__); \
     }                                         \
   } while (false)
@@ -28,8 +28,8 @@ namespace kyface {
 /// The debug switch: on from load, changed by `FaceLibrary.setDebug` alone. It orders nothing between
 /// threads; a change takes effect for later reads. A relaxed byte costs what a plain one does, without the
 /// data race.
-inline std::atomic<unsigned char> debug_switch{1};
+inline std::atomic<unsigned char> debugSwitch{1};
 
-inline bool debug_enabled() { return debug_switch.load(std::memory_order_relaxed) != 0; }
+inline bool debugEnabled() { return debugSwitch.load(std::memory_order_relaxed) != 0; }
 
 }  // namespace kyface

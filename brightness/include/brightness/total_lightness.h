@@ -11,7 +11,7 @@ namespace kyface::brightness {
 /// The lightness (L* of CIE Lab scaled to 0..255, as calcLuminance_RGBA and calcLuminance_BGRA have it) of
 /// `columns` by `rows` 4-byte pixels, summed up. `first` is the first pixel's first byte, `stride` the bytes
 /// from one row to the next. With `rgba` red is a pixel's first byte, else blue.
-std::uint64_t total_lightness(const unsigned char* first, std::ptrdiff_t stride, int columns, int rows,
-                              bool rgba);
+std::uint64_t totalLightness(const unsigned char* first, std::ptrdiff_t stride, int columns, int rows,
+                             bool rgba);
 
 }  // namespace kyface::brightness

@@ -18,20 +18,20 @@ using Image = HPC::fastcv::Mat<unsigned char, channels, HPC::fastcv::ECO_ENV_ARM
 /// Rows of a semi-planar 4:2:0 frame, luma and chroma together, for a picture of `height` rows. More than
 /// there can be are as many as there can be, which no height agrees with; wrapped, a negative height would
 /// have rows.
-inline int rows_420(int height) {
+inline int rows420(int height) {
   return static_cast<int>(std::clamp<std::int64_t>(std::int64_t{3} * height / 2, INT_MIN, INT_MAX));
 }
 
 /// A semi-planar 4:2:0 frame.
-inline Image<1> view_420(unsigned char* frame, int width, int height) {
-  return Image<1>(width, rows_420(height), frame);
+inline Image<1> view420(unsigned char* frame, int width, int height) {
+  return Image<1>(width, rows420(height), frame);
 }
 
 /// The 8-bit conversion of the image library. What it refuses it leaves unwritten; the helpers report
 /// nothing.
-template <HPC::fastcv::ColorCvtType type, int src_channels, int dst_channels>
-void convert(const Image<src_channels>& src, Image<dst_channels>* dst) {
-  HPC::fastcv::cvtColor<type, unsigned char, src_channels, unsigned char, dst_channels,
+template <HPC::fastcv::ColorCvtType type, int srcChannels, int dstChannels>
+void convert(const Image<srcChannels>& src, Image<dstChannels>* dst) {
+  HPC::fastcv::cvtColor<type, unsigned char, srcChannels, unsigned char, dstChannels,
                         HPC::fastcv::ECO_ENV_ARM>(src, dst);
 }
 

@@ -13,9 +13,9 @@ namespace kyface {
 /// end with its last sample, however long the row stride is.
 struct Plane {
   const unsigned char* data = nullptr;
-  std::int64_t size = 0;        ///< bytes from `data` on
-  std::int64_t row_stride = 0;  ///< bytes from one row to the next; at least a row's samples
-  int pixel_stride = 1;         ///< bytes from one sample to the next, at least 1
+  std::int64_t size = 0;       ///< bytes from `data` on
+  std::int64_t rowStride = 0;  ///< bytes from one row to the next; at least a row's samples
+  int pixelStride = 1;         ///< bytes from one sample to the next, at least 1
 };
 
 /// A picture in three planes; chroma samples belong to 2 x 2 pixels. Planes with the same row stride and a
@@ -39,7 +39,7 @@ struct Rectangle {
 /// The smallest rectangle of whole chroma samples around `part`: left and top edge move to the even position
 /// before, right and bottom edge to the one behind. Sizes that wrap are those of a rectangle inside no
 /// picture.
-Rectangle whole_pairs(const Rectangle& part);
+Rectangle wholePairs(const Rectangle& part);
 
 /// How a picture is shown: first turned clockwise, then mirrored left to right.
 struct Orientation {
@@ -53,9 +53,9 @@ struct Size {
   int height = 0;
 };
 
-/// The size of what `convert_planes` makes of `part`: that of `whole_pairs(part)`, with the sides exchanged
+/// The size of what `convertPlanes` makes of `part`: that of `wholePairs(part)`, with the sides exchanged
 /// by 90 and 270 degrees.
-Size size_of_view(const Rectangle& part, const Orientation& orientation);
+Size sizeOfView(const Rectangle& part, const Orientation& orientation);
 
 /// Layouts of a result. A fourth byte is opaque alpha, 255.
 enum class PixelLayout : int {
@@ -77,7 +77,7 @@ struct Target {
   PixelLayout layout = PixelLayout::kRgba;
 };
 
-/// What `convert_planes` answers. On anything but success nothing is written.
+/// What `convertPlanes` answers. On anything but success nothing is written.
 enum class PlanesStatus : int {
   kSuccess = 0,
   kPicture = 1,      ///< a width or height that is odd or below 1
@@ -90,12 +90,12 @@ enum class PlanesStatus : int {
   kOverlap = 8,      ///< the result would overwrite what it is made of
 };
 
-/// Converts the rectangle `whole_pairs(part)` of `picture` to pixels of `size_of_view(part, orientation)`.
+/// Converts the rectangle `wholePairs(part)` of `picture` to pixels of `sizeOfView(part, orientation)`.
 /// Colours are, bit for bit, those of the NV21 and NV12 conversions of the image library.
 ///
 /// Takes no memory but some kilobytes of the stack, and keeps no state; threads may call it on distinct
 /// targets.
-PlanesStatus convert_planes(const PlanarPicture& picture, const Rectangle& part,
-                            const Orientation& orientation, const Target& target);
+PlanesStatus convertPlanes(const PlanarPicture& picture, const Rectangle& part,
+                           const Orientation& orientation, const Target& target);
 
 }  // namespace kyface
