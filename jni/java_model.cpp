@@ -188,8 +188,8 @@ jobject ky_face_t_to_java_face(JNIEnv* env, const ky_face_t* record) {
   env->SetIntField(rect.get(), registry.rect.bottom, record->rect.bottom);
   env->SetObjectField(face.get(), registry.face.faceRect, rect.get());
 
-  const int points_count = std::clamp(record->points_count, 0, KY_FACE_MAX_POINTS);
-  LocalRef points(env, ky_pointf_t_array_to_java_pointf(env, record->points_array, points_count));
+  const int pointsCount = std::clamp(record->points_count, 0, KY_FACE_MAX_POINTS);
+  LocalRef points(env, ky_pointf_t_array_to_java_pointf(env, record->points_array, pointsCount));
   if (!points) {
     return nullptr;
   }

@@ -50,6 +50,7 @@ packages_android_java=(
 packages_lint=(
   "${packages_aarch64[@]}"
   clang-format-LLVM clang-tidy-LLVM
+  shellcheck                   # the scripts
 )
 packages_fuzz=(
   "${packages_host[@]}"
