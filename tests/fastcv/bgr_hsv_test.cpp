@@ -212,7 +212,7 @@ std::vector<float> floatColours() {
   return colours;
 }
 
-// Of floats too, the groups are within 4 units in the last place of true division: relative to 1 for S, to
+// Of floats too, the groups are within 4 ulp of true division: relative to 1 for S, to
 // the circle for H.
 TEST(HsvBound, Floats) {
   const std::vector<float> in = floatColours();

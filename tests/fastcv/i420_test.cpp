@@ -365,12 +365,12 @@ TEST_P(I420Death, Zeroes) {
 }
 
 TEST_P(I420Death, OddSizes) {
-  const char* const worker =
+  const char* const kernel =
       GetParam().kernel == kDecoders[0].kernel || GetParam().kernel == kDecoders[1].kernel ? "YUV420ptoRGB"
                                                                                            : "RGBtoYUV420p";
-  expect(worker, kEven, 4, 5, 96, true, 96, true);
-  expect(worker, kEven, 5, 4, 96, true, 96, true);
-  expect(worker, kEven, 1, 1, 96, true, 96, true);
+  expect(kernel, kEven, 4, 5, 96, true, 96, true);
+  expect(kernel, kEven, 5, 4, 96, true, 96, true);
+  expect(kernel, kEven, 1, 1, 96, true, 96, true);
 }
 
 TEST_P(I420Death, Order) {

@@ -52,10 +52,10 @@ struct Instance {
 
   static void work(int degree, int inHeight, int inWidth, int inStride, const T* in, int outHeight,
                    int outWidth, int outStride, T* out) {
-    const auto worker = degree == 90    ? imgRotate90degree<T, channels, 64, 64>
+    const auto kernel = degree == 90    ? imgRotate90degree<T, channels, 64, 64>
                         : degree == 180 ? imgRotate180degree<T, channels, 64, 64>
                                         : imgRotate270degree<T, channels, 64, 64>;
-    worker(inHeight, inWidth, inStride, in, outHeight, outWidth, outStride, out);
+    kernel(inHeight, inWidth, inStride, in, outHeight, outWidth, outStride, out);
   }
   static void dispatch(int degree, int inHeight, int inWidth, int inStride, const T* in, int outHeight,
                        int outWidth, int outStride, T* out) {
