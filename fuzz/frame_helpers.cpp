@@ -88,7 +88,7 @@ void fuzzConversion(Input& input) {
   const Bytes before = contentsOf(in);
   Bytes want = contentsOf(out);
   if (isConverted(size) && !size.isEmpty()) {
-    const auto convert = decodes ? reference::to_pixels : reference::to_frame;
+    const auto convert = decodes ? reference::toPixels : reference::toFrame;
     want = convert(before, size.width, size.height, chromaOf(format), helper.layout);
   }
   helper.convert(in.data(), format, size.width, size.height, out.data());
@@ -165,7 +165,7 @@ void fuzzCrop(Input& input) {
     Bytes cropped;
     cut(before, image.width, luma, &cropped);
     cut(before, image.width, chroma, &cropped);
-    want = reference::to_pixels(cropped, size.width, size.height, reference::kNv21, reference::kRgba);
+    want = reference::toPixels(cropped, size.width, size.height, reference::kNv21, reference::kRgba);
   } else if (isWritten) {
     want = contentsOf(out);  // undefined, but for the fourth channel
     for (size_t i = 3; i < want.size(); i += 4) {

@@ -27,8 +27,8 @@ using kyface::Rectangle;
 using kyface::Target;
 using kyface::fuzz::Input;
 using kyface::test::GuardedImage;
-using kyface::test::is_semi_planar;
-using kyface::test::pixel_bytes_of;
+using kyface::test::isSemiPlanar;
+using kyface::test::pixelBytesOf;
 using Bytes = std::vector<unsigned char>;
 
 /// Bytes that end at a protected page.
@@ -37,14 +37,14 @@ class Memory : public GuardedImage<unsigned char> {
   explicit Memory(int bytes) : GuardedImage(1, bytes, bytes) {}
 };
 
-int64_t bytes_of(int64_t rows, int64_t stride, int64_t row) { return (rows - 1) * stride + row; }
+int64_t bytesOf(int64_t rows, int64_t stride, int64_t row) { return (rows - 1) * stride + row; }
 
 /// The column and row of the picture that pixel (`x`, `y`) of the view shows. `part` is even.
 struct Place {
   int column;
   int row;
 };
-Place source_of(const Rectangle& part, const Orientation& orientation, int x, int y) {
+Place sourceOf(const Rectangle& part, const Orientation& orientation, int x, int y) {
   const bool sideways = orientation.degrees % 180 != 0;
   const int width = sideways ? part.height : part.width;
   x = orientation.mirrored ? width - 1 - x : x;
@@ -73,7 +73,7 @@ Bytes expected(const PlanarPicture& picture, const Rectangle& part, const Orient
   Bytes frame;
   for (int y = 0; y < height; ++y) {
     for (int x = 0; x < width; ++x) {
-      const Place at = source_of(part, orientation, x, y);
+      const Place at = sourceOf(part, orientation, x, y);
       frame.push_back(sample(picture.y, at.column, at.row));
     }
   }
@@ -82,19 +82,19 @@ Bytes expected(const PlanarPicture& picture, const Rectangle& part, const Orient
   }
   for (int y = 0; y < height; y += 2) {
     for (int x = 0; x < width; x += 2) {
-      const Place at = source_of(part, orientation, x, y);
+      const Place at = sourceOf(part, orientation, x, y);
       const unsigned char u = sample(picture.u, at.column / 2, at.row / 2);
       const unsigned char v = sample(picture.v, at.column / 2, at.row / 2);
       frame.push_back(layout == PixelLayout::kNv12 ? u : v);
       frame.push_back(layout == PixelLayout::kNv12 ? v : u);
     }
   }
-  if (is_semi_planar(layout)) {
+  if (isSemiPlanar(layout)) {
     return frame;
   }
   const bool rgb = layout == PixelLayout::kRgba || layout == PixelLayout::kRgb;
-  return reference::to_pixels(frame, width, height, reference::kNv21,
-                              {rgb ? 2 : 0, rgb ? 0 : 2, pixel_bytes_of(layout)});
+  return reference::toPixels(frame, width, height, reference::kNv21,
+                             {rgb ? 2 : 0, rgb ? 0 : 2, pixelBytesOf(layout)});
 }
 
 int even(int value) { return value & ~1; }
@@ -158,15 +158,15 @@ bool fits(const PlanarPicture& picture, const Rectangle& part, const Orientation
   const auto holds = [](const void* data, Wide size, Wide stride, Wide rows, Wide row) {
     return data != nullptr && stride >= row && (rows - 1) * stride + row <= size;
   };
-  const auto plane_holds = [&](const Plane& plane, Wide width, Wide height) {
+  const auto planeHolds = [&](const Plane& plane, Wide width, Wide height) {
     return plane.pixelStride >= 1 &&
            holds(plane.data, plane.size, plane.rowStride, height, (width - 1) * plane.pixelStride + 1);
   };
   const Wide width = picture.width;
   const Wide height = picture.height;
   if (width < 1 || height < 1 || width % 2 != 0 || height % 2 != 0 || picture.y.pixelStride != 1 ||
-      !plane_holds(picture.y, width, height) || !plane_holds(picture.u, width / 2, height / 2) ||
-      !plane_holds(picture.v, width / 2, height / 2)) {
+      !planeHolds(picture.y, width, height) || !planeHolds(picture.u, width / 2, height / 2) ||
+      !planeHolds(picture.v, width / 2, height / 2)) {
     return false;
   }
   const Wide right = Wide{part.left} + part.width;
@@ -187,8 +187,8 @@ bool fits(const PlanarPicture& picture, const Rectangle& part, const Orientation
   const Wide down = (bottom + 1) / 2 * 2 - even(part.top);
   const bool sideways = degrees % 180 != 0;
   const Wide rows = sideways ? across : down;
-  return holds(target.data, target.size, target.stride, is_semi_planar(target.layout) ? rows * 3 / 2 : rows,
-               (sideways ? down : across) * pixel_bytes_of(target.layout));
+  return holds(target.data, target.size, target.stride, isSemiPlanar(target.layout) ? rows * 3 / 2 : rows,
+               (sideways ? down : across) * pixelBytesOf(target.layout));
 }
 
 }  // namespace
@@ -202,20 +202,20 @@ extern "C" int LLVMFuzzerTestOneInput(const uint8_t* data, size_t size) {
   // Planes, or pairs that both chroma planes are views of.
   const int pairs = input.in(0, 2);
   const int pixelStride = pairs > 0 ? 2 : input.in(1, 3);
-  const int luma_stride = width + input.in(0, 5);
-  const int chroma_row = (width / 2 - 1) * pixelStride + 1;
-  const int chroma_stride = chroma_row + (pairs > 0 ? 1 : 0) + input.in(0, 5);
-  const auto luma_bytes = static_cast<int>(bytes_of(height, luma_stride, width));
-  const auto chroma_bytes = static_cast<int>(bytes_of(height / 2, chroma_stride, chroma_row));
-  Memory luma(luma_bytes);
-  Memory first(chroma_bytes + (pairs > 0 ? 1 : 0));
-  Memory second(chroma_bytes);
+  const int lumaStride = width + input.in(0, 5);
+  const int chromaRow = (width / 2 - 1) * pixelStride + 1;
+  const int chromaStride = chromaRow + (pairs > 0 ? 1 : 0) + input.in(0, 5);
+  const auto lumaBytes = static_cast<int>(bytesOf(height, lumaStride, width));
+  const auto chromaBytes = static_cast<int>(bytesOf(height / 2, chromaStride, chromaRow));
+  Memory luma(lumaBytes);
+  Memory first(chromaBytes + (pairs > 0 ? 1 : 0));
+  Memory second(chromaBytes);
 
   PlanarPicture picture = {width,
                            height,
-                           {luma.data(), luma_bytes, luma_stride, 1},
-                           {first.data(), chroma_bytes, chroma_stride, pixelStride},
-                           {second.data(), chroma_bytes, chroma_stride, pixelStride}};
+                           {luma.data(), lumaBytes, lumaStride, 1},
+                           {first.data(), chromaBytes, chromaStride, pixelStride},
+                           {second.data(), chromaBytes, chromaStride, pixelStride}};
   if (pairs > 0) {
     picture.u.data = first.data() + (pairs - 1);
     picture.v.data = first.data() + (2 - pairs);
@@ -232,10 +232,10 @@ extern "C" int LLVMFuzzerTestOneInput(const uint8_t* data, size_t size) {
   const Orientation chosen = {90 * input.in(0, 3), input.seldom(2)};
   const auto layout = PixelLayout{input.in(0, static_cast<int>(PixelLayout::kGray))};
   const kyface::Size shown = kyface::sizeOfView(part, chosen);
-  const int row = shown.width * pixel_bytes_of(layout);
-  const int rows = is_semi_planar(layout) ? shown.height * 3 / 2 : shown.height;
+  const int row = shown.width * pixelBytesOf(layout);
+  const int rows = isSemiPlanar(layout) ? shown.height * 3 / 2 : shown.height;
   GuardedImage<unsigned char> out(rows, row, row + input.in(0, 9));
-  Target target = {out.data(), bytes_of(rows, out.stride(), row), out.stride(), layout};
+  Target target = {out.data(), bytesOf(rows, out.stride(), row), out.stride(), layout};
 
   Orientation orientation = chosen;
   const bool disturbed = input.seldom(3);
@@ -246,7 +246,7 @@ extern "C" int LLVMFuzzerTestOneInput(const uint8_t* data, size_t size) {
   first.fill(pixel);
   second.fill(pixel);
 
-  const Bytes before(target.data, target.data + bytes_of(rows, out.stride(), row));
+  const Bytes before(target.data, target.data + bytesOf(rows, out.stride(), row));
   const PlanesStatus status = kyface::convertPlanes(picture, part, orientation, target);
   const bool fit = fits(picture, part, orientation, target);
   FUZZ_CHECK((status == PlanesStatus::kSuccess) == fit);
@@ -255,11 +255,11 @@ extern "C" int LLVMFuzzerTestOneInput(const uint8_t* data, size_t size) {
     const Rectangle whole = kyface::wholePairs(part);
     FUZZ_CHECK(whole.left == even(part.left) && whole.top == even(part.top));
     const Bytes view = expected(picture, whole, orientation, target.layout);
-    const kyface::Size view_size = kyface::sizeOfView(part, orientation);
-    const int64_t view_row = int64_t{view_size.width} * pixel_bytes_of(target.layout);
+    const kyface::Size viewSize = kyface::sizeOfView(part, orientation);
+    const int64_t viewRow = int64_t{viewSize.width} * pixelBytesOf(target.layout);
     for (size_t i = 0; i < view.size(); ++i) {
       const auto at = static_cast<int64_t>(i);
-      want[static_cast<size_t>(at / view_row * target.stride + at % view_row)] = view[i];
+      want[static_cast<size_t>(at / viewRow * target.stride + at % viewRow)] = view[i];
     }
   }
   FUZZ_CHECK(std::equal(want.begin(), want.end(), out.data()));

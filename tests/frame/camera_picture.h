@@ -71,9 +71,7 @@ inline constexpr std::array kLayouts = {PixelLayout::kRgba, PixelLayout::kBgra, 
                                         PixelLayout::kGray};
 
 /// Rows of a result of `height` pixels, those of chroma pairs among them.
-inline int rows_of(PixelLayout layout, int height) {
-  return is_semi_planar(layout) ? height * 3 / 2 : height;
-}
+inline int rows_of(PixelLayout layout, int height) { return isSemiPlanar(layout) ? height * 3 / 2 : height; }
 
 /// A picture of random samples, with `padding` bytes between the rows of each plane and none behind the last.
 class CameraPicture {
@@ -144,12 +142,12 @@ class CameraPicture {
       frame.push_back(v_first ? v.samples[i] : u.samples[i]);
       frame.push_back(v_first ? u.samples[i] : v.samples[i]);
     }
-    if (is_semi_planar(layout)) {
+    if (isSemiPlanar(layout)) {
       return frame;
     }
     const bool rgb = layout == PixelLayout::kRgba || layout == PixelLayout::kRgb;
-    const reference::Layout colours = {rgb ? 2 : 0, rgb ? 0 : 2, pixel_bytes_of(layout)};
-    return reference::to_pixels(frame, luma.width, luma.height, reference::kNv21, colours);
+    const reference::Layout colours = {rgb ? 2 : 0, rgb ? 0 : 2, pixelBytesOf(layout)};
+    return reference::toPixels(frame, luma.width, luma.height, reference::kNv21, colours);
   }
 
  private:

@@ -34,8 +34,8 @@ class Result : public GuardedImage<unsigned char> {
 
  private:
   Result(const Size& size, PixelLayout layout, int padding)
-      : GuardedImage(rows_of(layout, size.height), size.width * pixel_bytes_of(layout),
-                     size.width * pixel_bytes_of(layout) + padding),
+      : GuardedImage(rows_of(layout, size.height), size.width * pixelBytesOf(layout),
+                     size.width * pixelBytesOf(layout) + padding),
         layout_(layout) {}
 
   PixelLayout layout_;
@@ -165,7 +165,7 @@ TEST(Planes, EveryColour) {
     std::copy(now.begin(), now.end(), frame.begin());
     Result out(all_of(picture), {}, PixelLayout::kRgba, 0);
     ASSERT_EQ(convertPlanes(picture, all_of(picture), {}, out.target()), PlanesStatus::kSuccess);
-    ASSERT_TRUE(out.holds(reference::to_pixels(frame, kWidth, kHeight, reference::kNv21, reference::kRgba)))
+    ASSERT_TRUE(out.holds(reference::toPixels(frame, kWidth, kHeight, reference::kNv21, reference::kRgba)))
         << turn;
   }
 }

@@ -33,10 +33,10 @@ extern "C" void* memalign(size_t alignment, size_t size) noexcept(noexcept(memal
 namespace {
 
 using reference::Bytes;
-using reference::frame_size;
-using reference::random_bytes;
-using reference::to_frame;
-using reference::to_pixels;
+using reference::frameSize;
+using reference::randomBytes;
+using reference::toFrame;
+using reference::toPixels;
 using testing::ElementsAre;
 
 constexpr unsigned char kUntouched = 0xA5;
@@ -79,8 +79,8 @@ class ImageTest : public BridgeTest {
     expect_journal(lines);
   }
 
-  const Bytes frame = random_bytes(frame_size(kWidth, kHeight), 1);
-  const Bytes colours = random_bytes(pixels(kWidth, kHeight) * 4, 2);
+  const Bytes frame = randomBytes(frameSize(kWidth, kHeight), 1);
+  const Bytes colours = randomBytes(pixels(kWidth, kHeight) * 4, 2);
 };
 
 // ---- convertColorSpace
@@ -98,7 +98,7 @@ TEST_F(ImageTest, ConvertsFramesToPixels) {
       {1001, reference::kNv21, reference::kBgr, {"nv212BGR start", "nv212BGR end"}},
   };
   for (const auto& one : cases) {
-    const Bytes expected = to_pixels(frame, kWidth, kHeight, one.chroma, one.layout);
+    const Bytes expected = toPixels(frame, kWidth, kHeight, one.chroma, one.layout);
     EXPECT_EQ(convert(frame, kWidth, kHeight, expected.size(), one.code), expected) << one.code;
     expect_conversion(one.messages);
   }
@@ -106,10 +106,10 @@ TEST_F(ImageTest, ConvertsFramesToPixels) {
 
 TEST_F(ImageTest, ConvertsPixelsToFrames) {
   EXPECT_EQ(convert(colours, kWidth, kHeight, frame.size(), 3),
-            to_frame(colours, kWidth, kHeight, reference::kNv21, reference::kRgba));
+            toFrame(colours, kWidth, kHeight, reference::kNv21, reference::kRgba));
   expect_conversion({"RGB2nv "});
   EXPECT_EQ(convert(colours, kWidth, kHeight, frame.size(), 20),
-            to_frame(colours, kWidth, kHeight, reference::kNv12, reference::kRgba));
+            toFrame(colours, kWidth, kHeight, reference::kNv12, reference::kRgba));
   expect_conversion({"RGB2nv "});
 }
 
@@ -158,22 +158,22 @@ TEST_F(ImageTest, HelpersTakeEveryFormatButThreeForNv12) {
     Bytes three(pixels(kWidth, kHeight) * 3);
     begin();
     nv2RGB(in.data(), format, kWidth, kHeight, four.data());
-    EXPECT_EQ(four, to_pixels(frame, kWidth, kHeight, chroma, reference::kRgba));
+    EXPECT_EQ(four, toPixels(frame, kWidth, kHeight, chroma, reference::kRgba));
     expect_journal({"log 4 FaceAPI: nv2RGB "});
     nv2BGR(in.data(), format, kWidth, kHeight, four.data());
-    EXPECT_EQ(four, to_pixels(frame, kWidth, kHeight, chroma, reference::kBgra));
+    EXPECT_EQ(four, toPixels(frame, kWidth, kHeight, chroma, reference::kBgra));
     expect_journal({"log 4 FaceAPI: nv2BGR start", "log 4 FaceAPI: nv2BGR end"});
     nv212BGR(in.data(), format, kWidth, kHeight, three.data());
-    EXPECT_EQ(three, to_pixels(frame, kWidth, kHeight, chroma, reference::kBgr));
+    EXPECT_EQ(three, toPixels(frame, kWidth, kHeight, chroma, reference::kBgr));
     expect_journal({"log 4 FaceAPI: nv212BGR start", "log 4 FaceAPI: nv212BGR end"});
 
     in = colours;
     Bytes out(frame.size());
     RGB2nv(in.data(), format, kWidth, kHeight, out.data());
-    EXPECT_EQ(out, to_frame(colours, kWidth, kHeight, chroma, reference::kRgba));
+    EXPECT_EQ(out, toFrame(colours, kWidth, kHeight, chroma, reference::kRgba));
     expect_journal({"log 4 FaceAPI: RGB2nv "});
     BGR2nv(in.data(), format, kWidth, kHeight, out.data());
-    EXPECT_EQ(out, to_frame(colours, kWidth, kHeight, chroma, reference::kBgra));
+    EXPECT_EQ(out, toFrame(colours, kWidth, kHeight, chroma, reference::kBgra));
     expect_journal({"log 4 FaceAPI: BGR2nv start", "log 4 FaceAPI: BGR2nv end"});
   }
 }
@@ -185,7 +185,7 @@ TEST_F(ImageTest, HelpersLogWithTheDebugSwitchOff) {
 }
 
 TEST_F(ImageTest, HelpersWriteNothingForAnOddPictureHeight) {
-  Bytes in(frame_size(kWidth, 482));
+  Bytes in(frameSize(kWidth, 482));
   Bytes out(pixels(kWidth, 481) * 4, kUntouched);
   nv2BGR(in.data(), 3, kWidth, 481, out.data());
   EXPECT_EQ(out, Bytes(out.size(), kUntouched));
@@ -334,12 +334,12 @@ class CropTest : public ImageTest {
       const auto start = frame.begin() + static_cast<ptrdiff_t>(from) * kWidth + r.x;
       cut.insert(cut.end(), start, start + r.w);
     }
-    return to_pixels(cut, r.w, r.h, reference::kNv21, reference::kRgba);
+    return toPixels(cut, r.w, r.h, reference::kNv21, reference::kRgba);
   }
 
   static constexpr int kWidth = 40;
   static constexpr int kHeight = 12;
-  const Bytes frame = random_bytes(frame_size(kWidth, kHeight), 3);
+  const Bytes frame = randomBytes(frameSize(kWidth, kHeight), 3);
 };
 
 TEST_F(CropTest, CutsRectangles) {
@@ -354,7 +354,7 @@ TEST_F(CropTest, CutsRectangles) {
 
 TEST_F(CropTest, TheWholeFrameIsItsConversion) {
   EXPECT_EQ(crop({0, 0, kWidth, kHeight}),
-            to_pixels(frame, kWidth, kHeight, reference::kNv21, reference::kRgba));
+            toPixels(frame, kWidth, kHeight, reference::kNv21, reference::kRgba));
 }
 
 TEST_F(CropTest, LeavesTheOutputOfOddSizes) {
@@ -465,7 +465,7 @@ class RotationTest : public ImageTest {
     return out;
   }
 
-  const Bytes picture = random_bytes(pixels(kWidth, kHeight) * 3, 4);
+  const Bytes picture = randomBytes(pixels(kWidth, kHeight) * 3, 4);
 };
 
 TEST_F(RotationTest, TurnsClockwise) {

@@ -27,9 +27,9 @@ enum Chroma { kNv21 = 0, kNv12 = 1 };
 
 inline unsigned char clamp(int value) { return static_cast<unsigned char>(std::clamp(value, 0, 255)); }
 
-inline size_t frame_size(int width, int height) { return static_cast<size_t>(width) * height * 3 / 2; }
+inline size_t frameSize(int width, int height) { return static_cast<size_t>(width) * height * 3 / 2; }
 
-inline Bytes random_bytes(size_t size, unsigned seed) {
+inline Bytes randomBytes(size_t size, unsigned seed) {
   std::mt19937 generator(seed);
   Bytes bytes(size);
   for (unsigned char& byte : bytes) {
@@ -39,7 +39,7 @@ inline Bytes random_bytes(size_t size, unsigned seed) {
 }
 
 /// A frame as pixels; a fourth channel is opaque.
-inline Bytes to_pixels(const Bytes& frame, int width, int height, Chroma chroma, Layout layout) {
+inline Bytes toPixels(const Bytes& frame, int width, int height, Chroma chroma, Layout layout) {
   Bytes pixels(static_cast<size_t>(width) * height * layout.channels, 255);
   for (int y = 0; y < height; ++y) {
     for (int x = 0; x < width; ++x) {
@@ -57,8 +57,8 @@ inline Bytes to_pixels(const Bytes& frame, int width, int height, Chroma chroma,
 }
 
 /// Pixels as a frame; the chroma of a 2 x 2 block is that of its top-left pixel.
-inline Bytes to_frame(const Bytes& pixels, int width, int height, Chroma chroma, Layout layout) {
-  Bytes frame(frame_size(width, height));
+inline Bytes toFrame(const Bytes& pixels, int width, int height, Chroma chroma, Layout layout) {
+  Bytes frame(frameSize(width, height));
   for (int y = 0; y < height; ++y) {
     for (int x = 0; x < width; ++x) {
       const unsigned char* pixel = &pixels[(static_cast<size_t>(width) * y + x) * layout.channels];

@@ -8,7 +8,7 @@
 namespace kyface::test {
 
 /// Bytes of a pixel; of a pixel's luma in the 4:2:0 layouts.
-inline int pixel_bytes_of(PixelLayout layout) {
+inline int pixelBytesOf(PixelLayout layout) {
   switch (layout) {
     case PixelLayout::kRgba:
     case PixelLayout::kBgra:
@@ -21,7 +21,7 @@ inline int pixel_bytes_of(PixelLayout layout) {
   }
 }
 
-inline bool is_semi_planar(PixelLayout layout) {
+inline bool isSemiPlanar(PixelLayout layout) {
   return layout == PixelLayout::kNv21 || layout == PixelLayout::kNv12;
 }
 

@@ -11,7 +11,7 @@ namespace threads {
 
 namespace {
 
-using reference::random_bytes;
+using reference::randomBytes;
 
 constexpr int kWidth = 22;
 constexpr int kHeight = 6;
@@ -22,8 +22,8 @@ constexpr jlong kHandle = 0x77;
 /// feature.
 struct Machine {
   fake::Vm vm;
-  jbyteArray frame = vm.byte_array("frame", random_bytes(reference::frame_size(kWidth, kHeight), 1));
-  jbyteArray pixels = vm.byte_array("pixels", random_bytes(kPixels * 4, 2));
+  jbyteArray frame = vm.byte_array("frame", randomBytes(reference::frameSize(kWidth, kHeight), 1));
+  jbyteArray pixels = vm.byte_array("pixels", randomBytes(kPixels * 4, 2));
   jbyteArray out = vm.byte_array("out", Bytes(kPixels * 4));
   jintArray ints = vm.int_array("ints", {5, 6, 7});
   jintArray status = vm.int_array("status", {-77, 5});
@@ -42,7 +42,7 @@ struct Machine {
     engine.feature_length = 3;
     fake::bitmap() = {};
     fake::bitmap().info = {kWidth, kHeight, kWidth * 4, ANDROID_BITMAP_FORMAT_RGBA_8888, 0};
-    fake::bitmap().pixels = random_bytes(kPixels * 4, 3);
+    fake::bitmap().pixels = randomBytes(kPixels * 4, 3);
     fake::journal().clear();
   }
   ~Machine() { fake::engine().vm = nullptr; }
