@@ -8,10 +8,10 @@
 #include <algorithm>
 #include <cmath>
 #include <cstdlib>
+#include <limits>
 #include <vector>
 
 #include "fastcv/kernels.h"
-#include "simd/neon.h"
 #include "tests/support/packed_kernel.h"
 
 namespace {
@@ -30,13 +30,28 @@ using u8 = unsigned char;
 constexpr float kEpsilon = 1.1920929e-7f;
 constexpr float kPerByte = 0.003921569f;
 
-// 1 / x as the groups have it: an estimate and two Newton-Raphson steps.
+// 1 / x as the groups have it: the estimate that Arm's processors make of 8 bits of the mantissa, and two
+// Newton-Raphson steps. Not for subnormal numbers.
 float reciprocal(float x) {
-  const float32x4_t v = vdupq_n_f32(x);
-  float32x4_t y = vrecpeq_f32(v);
-  y = vmulq_f32(y, vrecpsq_f32(v, y));
-  y = vmulq_f32(y, vrecpsq_f32(v, y));
-  return vgetq_lane_f32(y, 0);
+  const auto estimate = [=] {
+    if (std::isnan(x)) {
+      return x;
+    }
+    if (std::isinf(x) || x == 0) {
+      return std::copysign(x == 0 ? std::numeric_limits<float>::infinity() : 0.0f, x);
+    }
+    int exponent = 0;
+    const int mantissa = static_cast<int>(std::abs(std::frexp(x, &exponent)) * 512);
+    const int inverse = ((1 << 19) / (2 * mantissa + 1) + 1) / 2;
+    return std::copysign(std::ldexp(static_cast<float>(inverse), -8 - exponent), x);
+  };
+  const auto step = [=](float y) {
+    const bool special = (std::isinf(x) && y == 0) || (x == 0 && std::isinf(y));
+    return special ? 2.0f : std::fma(-x, y, 2.0f);
+  };
+  float y = estimate();
+  y = y * step(y);
+  return y * step(y);
 }
 
 // Rounded to a byte: in single precision and saturated in the groups, in double precision after them.

@@ -19,8 +19,8 @@
 //
 // A row's whole groups of 8 pixels and the pixels after them are not computed alike. To HSV, groups multiply
 // by a refined reciprocal estimate where single pixels divide: no byte differs by more than 1 (around the
-// circle), and of all 2^24 colours no more than 1 in 2000 do at all, on Arm and on x86-64, whose estimates
-// differ. 8-bit hues back get their sector by a multiplication in groups.
+// circle), and of all 2^24 colours no more than 1 in 2000 do at all. 8-bit hues back get their sector by a
+// multiplication in groups.
 
 #include <algorithm>
 #include <cmath>
@@ -36,38 +36,7 @@ using namespace arm;
 constexpr float kEpsilon = 1.1920929e-7f;
 constexpr float kPerByte = 0.003921569f;  // 1 / 255
 
-// 1 / v: the estimate of 8 bits, and two Newton-Raphson steps, each of which doubles the bits.
-inline float32x4_t reciprocal(float32x4_t v) {
-  float32x4_t estimate = vrecpeq_f32(v);
-  estimate = vmulq_f32(estimate, vrecpsq_f32(v, estimate));
-  return vmulq_f32(estimate, vrecpsq_f32(v, estimate));
-}
-
-// Quarters of a block of 16 bytes as floats.
-struct Quarters {
-  float32x4_t q[4];
-};
-
-// Four bytes of a block, from `first` on, one a lane.
-inline float32x4_t widened(uint8x16_t bytes, unsigned first) {
-  // A look-up gives 0 for indices beyond the table.
-  static constexpr uint32_t kIndex[] = {0xffffff00, 0xffffff01, 0xffffff02, 0xffffff03};
-  const uint8x16_t index = vreinterpretq_u8_u32(vaddq_u32(vld1q_u32(kIndex), vdupq_n_u32(first)));
-  return vcvtq_f32_u32(vreinterpretq_u32_u8(vqtbl1q_u8(bytes, index)));
-}
-
-// Rounded to bytes, halves up, saturated.
-inline uint8x16_t bytesOf(const Quarters& v) {
-  const auto half = [](float32x4_t low, float32x4_t high) {
-    const auto rounded = [](float32x4_t x) {
-      return vmovn_s32(vcvtq_s32_f32(vaddq_f32(x, vdupq_n_f32(0.5f))));
-    };
-    return vqmovun_s16(vcombine_s16(rounded(low), rounded(high)));
-  };
-  return vcombine_u8(half(v.q[0], v.q[1]), half(v.q[2], v.q[3]));
-}
-
-// The same of one value, in double precision.
+// A value rounded to a byte, halves up, in double precision, and limited.
 inline unsigned char byteOf(float value) {
   const double rounded = static_cast<double>(value) + 0.5;
   return rounded > 0 ? static_cast<unsigned char>(static_cast<unsigned>(rounded)) : 0;
@@ -75,7 +44,6 @@ inline unsigned char byteOf(float value) {
 
 template <int ncSrc>
 struct BgrToHsv8 {
-  using Vector = uint8x16_t;
   using Src = unsigned char;
   using Dst = unsigned char;
   static constexpr int kSrcChannels = ncSrc;
@@ -84,30 +52,26 @@ struct BgrToHsv8 {
   static constexpr bool kUniform = false;
 
   // The compiler finds it too long to inline; called, it would keep nothing in registers from block to block.
-  [[gnu::always_inline]] Pixels<uint8x16_t, 3> vector(const Pixels<uint8x16_t, ncSrc>& p) const {
+  [[gnu::always_inline]] Pixels<Bytes, 3> vector(const Pixels<Bytes, ncSrc>& p) const {
     // Scaling keeps order and equality: which channel is what is settled among the bytes.
-    const uint8x16_t b = p.c[0], g = p.c[1], r = p.c[2];
-    const uint8x16_t max = vmaxq_u8(vmaxq_u8(b, g), r);
-    const uint8x16_t min = vminq_u8(vminq_u8(b, g), r);
-    const uint8x16_t isRed = vceqq_u8(max, r);
-    const uint8x16_t isGreen = vceqq_u8(max, g);
-    const uint8x16_t minuend = vbslq_u8(isRed, g, vbslq_u8(isGreen, b, r));
-    const uint8x16_t subtrahend = vbslq_u8(isRed, b, vbslq_u8(isGreen, r, g));
-    const uint8x16_t offset = vbicq_u8(vbslq_u8(isGreen, vdupq_n_u8(60), vdupq_n_u8(120)), isRed);
-    Quarters hue, saturation;
+    const Bytes b = p.c[0], g = p.c[1], r = p.c[2];
+    const Bytes max = arm::max(arm::max(b, g), r);
+    const Bytes min = arm::min(arm::min(b, g), r);
+    const auto isRed = max == r;
+    const auto isGreen = max == g;
+    const Bytes minuend = select(isRed, g, select(isGreen, b, r));
+    const Bytes subtrahend = select(isRed, b, select(isGreen, r, g));
+    const Bytes offset = select(isGreen, splat<Bytes>(60), splat<Bytes>(120)) & ~(Bytes)isRed;
+    Floats hue[4], saturation[4];
     for (unsigned i = 0; i < 4; ++i) {
-      const unsigned first = 4 * i;
-      const auto scaled = [&](uint8x16_t bytes) { return vmulq_n_f32(widened(bytes, first), kPerByte); };
-      const float32x4_t vmax = scaled(max);
-      const float32x4_t diff = vsubq_f32(vmax, scaled(min));
-      const float32x4_t s = vmulq_f32(diff, reciprocal(vaddq_f32(vmax, vdupq_n_f32(kEpsilon))));
-      saturation.q[i] = vmulq_n_f32(s, 255.0f);
-      const float32x4_t k = vmulq_n_f32(reciprocal(vaddq_f32(diff, vdupq_n_f32(kEpsilon))), 30.0f);
-      const float32x4_t h =
-          vfmaq_f32(widened(offset, first), vsubq_f32(scaled(minuend), scaled(subtrahend)), k);
-      const uint32x4_t wraps = vcltq_f32(h, vdupq_n_f32(-0.5f));
-      const uint32x4_t circle = vreinterpretq_u32_f32(vdupq_n_f32(180.0f));
-      hue.q[i] = vaddq_f32(h, vreinterpretq_f32_u32(vandq_u32(wraps, circle)));
+      const auto scaled = [&](Bytes bytes) { return quarterOf(bytes, i) * splat<Floats>(kPerByte); };
+      const Floats vmax = scaled(max);
+      const Floats diff = vmax - scaled(min);
+      const Floats s = diff * reciprocal(vmax + splat<Floats>(kEpsilon));
+      saturation[i] = s * splat<Floats>(255.0f);
+      const Floats k = reciprocal(diff + splat<Floats>(kEpsilon)) * splat<Floats>(30.0f);
+      const Floats h = multiplyAdd(quarterOf(offset, i), scaled(minuend) - scaled(subtrahend), k);
+      hue[i] = h + masked(h < splat<Floats>(-0.5f), splat<Floats>(180.0f));
     }
     // V, scaled to 1 and back to a byte, is the byte.
     return {{bytesOf(hue), bytesOf(saturation), max}};
@@ -131,7 +95,6 @@ struct BgrToHsv8 {
 
 template <int ncSrc>
 struct BgrToHsvFloat {
-  using Vector = float32x4_t;
   using Src = float;
   using Dst = float;
   static constexpr int kSrcChannels = ncSrc;
@@ -144,20 +107,19 @@ struct BgrToHsvFloat {
   // With lo the lesser of B and G, the hue of a blue pixel, (R - G) k + 240, is |(lo - R) k - 240|, and that
   // of a green one, (B - R) k + 120, is |(lo - R) k + 120|; red ones are |(G - B) k + 360| or |(G - B) k|.
   // The sums are rounded alike, and one subtraction to an absolute value serves all.
-  Pixels<float32x4_t, 3> vector(const Pixels<float32x4_t, ncSrc>& p) const {
-    const float32x4_t b = p.c[0], g = p.c[1], r = p.c[2];
-    const float32x4_t lo = vminq_f32(b, g);
-    const float32x4_t vmax = vmaxq_f32(vmaxq_f32(b, g), r);
-    const float32x4_t diff = vsubq_f32(vmax, vminq_f32(lo, r));
-    const float32x4_t s = vmulq_f32(diff, reciprocal(vaddq_f32(vmax, vdupq_n_f32(kEpsilon))));
-    const float32x4_t k = vmulq_n_f32(reciprocal(vaddq_f32(diff, vdupq_n_f32(kEpsilon))), 60.0f);
-    const uint32x4_t isRed = vceqq_f32(vmax, r);
-    const float32x4_t h = vmulq_f32(vbslq_f32(isRed, vsubq_f32(g, b), vsubq_f32(lo, r)), k);
-    const uint32x4_t circle = vreinterpretq_u32_f32(vdupq_n_f32(-360.0f));
-    float32x4_t red = vreinterpretq_f32_u32(vandq_u32(vcltzq_f32(h), circle));
+  Pixels<Floats, 3> vector(const Pixels<Floats, ncSrc>& p) const {
+    const Floats b = p.c[0], g = p.c[1], r = p.c[2];
+    const Floats lo = min(b, g);
+    const Floats vmax = max(max(b, g), r);
+    const Floats diff = vmax - min(lo, r);
+    const Floats s = diff * reciprocal(vmax + splat<Floats>(kEpsilon));
+    const Floats k = reciprocal(diff + splat<Floats>(kEpsilon)) * splat<Floats>(60.0f);
+    const auto isRed = vmax == r;
+    const Floats h = select(isRed, g - b, lo - r) * k;
+    Floats red = masked(h < splat<Floats>(0.0f), splat<Floats>(-360.0f));
     forget(red);  // the selection below would become four bitwise operations
-    const float32x4_t other = vbslq_f32(vcgtq_f32(b, g), vdupq_n_f32(240.0f), vdupq_n_f32(-120.0f));
-    return {{vabdq_f32(h, vbslq_f32(isRed, red, other)), s, vmax}};
+    const Floats other = select(b > g, splat<Floats>(240.0f), splat<Floats>(-120.0f));
+    return {{distance(h, select(isRed, red, other)), s, vmax}};
   }
 
   void scalar(const float* in, float* out) const {
@@ -177,10 +139,10 @@ struct BgrToHsvFloat {
 // The fraction of c that the channel between V and m has above m: in every sector the distance of h to the
 // nearest of 0, 2, 4 and 6, but for h beyond 6, where it is negative. All four differences are exact where
 // they are the least.
-inline float32x4_t fractionOf(float32x4_t h) {
-  const float32x4_t low = vminq_f32(h, vabdq_f32(h, vdupq_n_f32(2.0f)));
-  const float32x4_t high = vminq_f32(vabdq_f32(h, vdupq_n_f32(4.0f)), vsubq_f32(vdupq_n_f32(6.0f), h));
-  return vminq_f32(low, high);
+inline Floats fractionOf(Floats h) {
+  const Floats low = min(h, distance(h, splat<Floats>(2.0f)));
+  const Floats high = min(distance(h, splat<Floats>(4.0f)), splat<Floats>(6.0f) - h);
+  return min(low, high);
 }
 
 struct Bgr {
@@ -210,7 +172,6 @@ inline Bgr bgrOf(float h, float v, float c) {
 
 template <int ncDst>
 struct HsvToBgr8 {
-  using Vector = uint8x16_t;
   using Src = unsigned char;
   using Dst = unsigned char;
   static constexpr int kSrcChannels = 3;
@@ -218,28 +179,26 @@ struct HsvToBgr8 {
   static constexpr int kInFlight = 1;
   static constexpr bool kUniform = false;
 
-  Pixels<uint8x16_t, 3> vector(const Pixels<uint8x16_t, 3>& p) const {
-    Quarters least, between;
+  Pixels<Bytes, 3> vector(const Pixels<Bytes, 3>& p) const {
+    Floats least[4], between[4];
     for (unsigned i = 0; i < 4; ++i) {
-      const unsigned first = 4 * i;
-      const float32x4_t h = vmulq_n_f32(widened(p.c[0], first), 2.0f * 0.016666668f);
-      const float32x4_t v = vmulq_n_f32(widened(p.c[2], first), kPerByte);
-      const float32x4_t c = vmulq_f32(vmulq_n_f32(widened(p.c[1], first), kPerByte), v);
-      const float32x4_t m = vsubq_f32(v, c);
-      least.q[i] = vmulq_n_f32(m, 255.0f);
-      between.q[i] = vmulq_n_f32(vaddq_f32(m, vmulq_f32(fractionOf(h), c)), 255.0f);
+      const Floats h = quarterOf(p.c[0], i) * splat<Floats>(2.0f * 0.016666668f);
+      const Floats v = quarterOf(p.c[2], i) * splat<Floats>(kPerByte);
+      const Floats c = quarterOf(p.c[1], i) * splat<Floats>(kPerByte) * v;
+      const Floats m = v - c;
+      least[i] = m * splat<Floats>(255.0f);
+      between[i] = (m + fractionOf(h) * c) * splat<Floats>(255.0f);
     }
-    const uint8x16_t m = bytesOf(least);
-    const uint8x16_t mid = bytesOf(between);
+    const Bytes m = bytesOf(least);
+    const Bytes mid = bytesOf(between);
     // V, scaled to 1 and back to a byte, is the byte; and a sector starts at 30 half degrees exactly.
-    const uint8x16_t v = p.c[2];
+    const Bytes v = p.c[2];
     const auto below = [&](int sector) {
-      return vcltq_u8(p.c[0], vdupq_n_u8(static_cast<unsigned char>(30 * sector)));
+      return p.c[0] < splat<Bytes>(static_cast<unsigned char>(30 * sector));
     };
-    const uint8x16_t b = vbslq_u8(below(2), m, vbslq_u8(below(3), mid, vbslq_u8(below(5), v, mid)));
-    const uint8x16_t g = vbslq_u8(below(1), mid, vbslq_u8(below(3), v, vbslq_u8(below(4), mid, m)));
-    const uint8x16_t r =
-        vbslq_u8(below(1), v, vbslq_u8(below(2), mid, vbslq_u8(below(4), m, vbslq_u8(below(5), mid, v))));
+    const Bytes b = select(below(2), m, select(below(3), mid, select(below(5), v, mid)));
+    const Bytes g = select(below(1), mid, select(below(3), v, select(below(4), mid, m)));
+    const Bytes r = select(below(1), v, select(below(2), mid, select(below(4), m, select(below(5), mid, v))));
     return {{b, g, r}};
   }
 
@@ -253,7 +212,6 @@ struct HsvToBgr8 {
 
 template <int ncDst>
 struct HsvToBgrFloat {
-  using Vector = float32x4_t;
   using Src = float;
   using Dst = float;
   static constexpr int kSrcChannels = 3;
@@ -261,17 +219,17 @@ struct HsvToBgrFloat {
   static constexpr int kInFlight = ncDst == 3 ? 2 : 1;  // two blocks and their alphas exceed the registers
   static constexpr bool kUniform = true;
 
-  Pixels<float32x4_t, 3> vector(const Pixels<float32x4_t, 3>& p) const {
-    const float32x4_t h = vdivq_f32(p.c[0], vdupq_n_f32(60.0f));
-    const float32x4_t v = p.c[2];
-    const float32x4_t c = vmulq_f32(v, p.c[1]);
-    const float32x4_t m = vsubq_f32(v, c);
-    const float32x4_t mid = vaddq_f32(m, vmulq_f32(fractionOf(h), c));
-    const auto below = [&](float sector) { return vcltq_f32(h, vdupq_n_f32(sector)); };
-    const float32x4_t b = vbslq_f32(below(2), m, vbslq_f32(below(3), mid, vbslq_f32(below(5), v, mid)));
-    const float32x4_t g = vbslq_f32(below(1), mid, vbslq_f32(below(3), v, vbslq_f32(below(4), mid, m)));
-    const float32x4_t r =
-        vbslq_f32(below(1), v, vbslq_f32(below(2), mid, vbslq_f32(below(4), m, vbslq_f32(below(5), mid, v))));
+  Pixels<Floats, 3> vector(const Pixels<Floats, 3>& p) const {
+    const Floats h = p.c[0] / splat<Floats>(60.0f);
+    const Floats v = p.c[2];
+    const Floats c = v * p.c[1];
+    const Floats m = v - c;
+    const Floats mid = m + fractionOf(h) * c;
+    const auto below = [&](float sector) { return h < splat<Floats>(sector); };
+    const Floats b = select(below(2), m, select(below(3), mid, select(below(5), v, mid)));
+    const Floats g = select(below(1), mid, select(below(3), v, select(below(4), mid, m)));
+    const Floats r =
+        select(below(1), v, select(below(2), mid, select(below(4), m, select(below(5), mid, v))));
     return {{b, g, r}};
   }
 

@@ -103,6 +103,7 @@ inline void storeRow(float* p, const Floats (&v)[4]) {
 
 inline Bytes min(Bytes a, Bytes b) { return vminq_u8(a, b); }
 inline Bytes max(Bytes a, Bytes b) { return vmaxq_u8(a, b); }
+/// Of a NaN in `a` these make one.
 inline Floats min(Floats a, Floats b) { return vminq_f32(a, b); }
 inline Floats max(Floats a, Floats b) { return vmaxq_f32(a, b); }
 
@@ -339,6 +340,31 @@ inline Bytes subtractNarrowed(const EvenOdd& luma, const Two<SignedWords>& chrom
   return detail::narrowedColumns<n>(
       vsubhn_s32(luma.even.low, chroma.low), vsubhn_s32(luma.even.high, chroma.high),
       vsubhn_s32(luma.odd.low, chroma.low), vsubhn_s32(luma.odd.high, chroma.high));
+}
+
+// ---- bytes as floats
+
+/// Number `i` of the four quarters of a block of bytes, as floats.
+inline Floats quarterOf(Bytes v, unsigned i) {
+  // A look-up gives 0 for indices beyond the table.
+  static constexpr uint32_t kIndex[] = {0xffffff00, 0xffffff01, 0xffffff02, 0xffffff03};
+  const uint8x16_t index = vreinterpretq_u8_u32(vaddq_u32(vld1q_u32(kIndex), vdupq_n_u32(4 * i)));
+  return vcvtq_f32_u32(vreinterpretq_u32_u8(vqtbl1q_u8(v, index)));
+}
+/// Four quarters rounded to bytes, halves up, and limited.
+inline Bytes bytesOf(const Floats (&q)[4]) {
+  const auto half = [](Floats low, Floats high) {
+    const auto rounded = [](Floats x) { return vmovn_s32(vcvtq_s32_f32(vaddq_f32(x, vdupq_n_f32(0.5f)))); };
+    return vqmovun_s16(vcombine_s16(rounded(low), rounded(high)));
+  };
+  return vcombine_u8(half(q[0], q[1]), half(q[2], q[3]));
+}
+
+/// 1 / v: the estimate of 8 bits, and two Newton-Raphson steps, each of which doubles the bits.
+inline Floats reciprocal(Floats v) {
+  Floats estimate = vrecpeq_f32(v);
+  estimate = vmulq_f32(estimate, vrecpsq_f32(v, estimate));
+  return vmulq_f32(estimate, vrecpsq_f32(v, estimate));
 }
 
 }  // namespace HPC::fastcv::arm

@@ -241,6 +241,10 @@ inline void storeRow(T* p, const V (&v)[4]) {
 inline Bytes min(Bytes a, Bytes b) { return x86::as<Bytes>(_mm256_min_epu8(x86::m(a), x86::m(b))); }
 inline Bytes max(Bytes a, Bytes b) { return x86::as<Bytes>(_mm256_max_epu8(x86::m(a), x86::m(b))); }
 
+/// Of a NaN in `a` these make one.
+inline Floats min(Floats a, Floats b) { return std::bit_cast<Floats>(_mm256_min_ps(x86::m(b), x86::m(a))); }
+inline Floats max(Floats a, Floats b) { return std::bit_cast<Floats>(_mm256_max_ps(x86::m(b), x86::m(a))); }
+
 /// `a` where the mask is set, `b` elsewhere.
 template <typename Mask, typename V>
 inline V select(Mask mask, V a, V b) {
@@ -595,6 +599,40 @@ inline void storeSamples(unsigned char* p, Halves first, unsigned char* q, Halve
 /// (a factor) >> 16, without signs.
 inline Halves multiplyHigh(Halves a, uint16_t factor) {
   return x86::as<Halves>(_mm256_mulhi_epu16(x86::m(a), _mm256_set1_epi16(static_cast<int16_t>(factor))));
+}
+
+// ---- bytes as floats
+
+/// Number `i` of the four quarters of a block of bytes, as floats.
+inline Floats quarterOf(Bytes v, unsigned i) {
+  // A shuffle gives 0 for indices whose highest bit is set.
+  const __m256i first = _mm256_setr_epi32(-256, -255, -254, -253, -256, -255, -254, -253);
+  const __m256i index = _mm256_add_epi32(first, _mm256_set1_epi32(static_cast<int>(4 * i)));
+  return std::bit_cast<Floats>(_mm256_cvtepi32_ps(_mm256_shuffle_epi8(x86::m(v), index)));
+}
+/// Four quarters rounded to bytes, halves up, and limited.
+inline Bytes bytesOf(const Floats (&q)[4]) {
+  const auto rounded = [](Floats x) { return _mm256_cvttps_epi32(x86::m(x + 0.5f)); };
+  return x86::as<Bytes>(_mm256_packus_epi16(_mm256_packs_epi32(rounded(q[0]), rounded(q[1])),
+                                            _mm256_packs_epi32(rounded(q[2]), rounded(q[3]))));
+}
+
+/// 1 / v: the estimate of 8 bits that Arm's processors make, and two Newton-Raphson steps, each of which
+/// doubles the bits.
+inline Floats reciprocal(Floats v) {
+  // The estimate is the inverse of the middle of the numbers with the same 8 bits of mantissa, rounded to 8
+  // bits. That of a large number has fewer bits than a mantissa: all are taken 16 times as large first.
+  const auto middle = std::bit_cast<Floats>((std::bit_cast<Words>(v) & 0xffff8000u) | 0x4000u);
+  const auto inverse = std::bit_cast<Words>(0x1p4f / middle);
+  auto estimate = std::bit_cast<Floats>((inverse + 0x4000u) & 0xffff8000u) * 0x1p-4f;
+  estimate = masked(distance(v, Floats{}) != splat<Floats>(__builtin_inff()), estimate);
+  // A step is about 1; that of 0 and infinity is 2 on Arm.
+  const auto step = [=](Floats e) {
+    const __m256 two = _mm256_set1_ps(2.0f);
+    return std::bit_cast<Floats>(_mm256_min_ps(_mm256_fnmadd_ps(x86::m(v), x86::m(e), two), two));
+  };
+  estimate = estimate * step(estimate);
+  return estimate * step(estimate);
 }
 
 }  // namespace HPC::fastcv::arm
