@@ -6,8 +6,8 @@
 //
 //   same_bits_test --print
 //
-// of the 64-bit Arm build prints. Who means to change a result makes it anew, and sees in the difference what
-// else has changed.
+// of any build prints. Who means to change a result makes it anew, and sees in the difference what else has
+// changed.
 
 #include <gtest/gtest.h>
 
