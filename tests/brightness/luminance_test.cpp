@@ -124,15 +124,14 @@ TEST(TotalLightness, IsWholeBeyond32Bits) {
   unsigned char* const pixels = memory.as<unsigned char>();
   std::fill_n(pixels, kBlock, 255);
   std::fill_n(pixels + 1028 * kBlock, kBlock, 255);
-  for (const bool rgba : {false, true}) {
-    const auto total = [&](int columns, int rows) {
-      return kyface::brightness::total_lightness(pixels, 0, columns, rows, rgba);
-    };
-    EXPECT_EQ(total(kColumns, 1), uint64_t{255} * kColumns);
-    EXPECT_EQ(total(kColumns - 5, 2), uint64_t{255} * 2 * (kColumns - 5)) << "a row that is parted twice";
-    EXPECT_EQ(total(kColumns / 3, 4), uint64_t{255} * 4 * (kColumns / 3))
-        << "rows of which some fit together";
-  }
+  const auto total = [&](int columns, int rows, bool rgba) {
+    return kyface::brightness::total_lightness(pixels, 0, columns, rows, rgba);
+  };
+  // Each only once: they are many pixels for an emulator.
+  EXPECT_EQ(total(kColumns, 1, true), uint64_t{255} * kColumns);
+  EXPECT_EQ(total(kColumns - 5, 2, false), uint64_t{255} * 2 * (kColumns - 5)) << "rows that are parted";
+  EXPECT_EQ(total(kColumns / 3, 4, false), uint64_t{255} * 4 * (kColumns / 3))
+      << "of which some fit together";
 }
 
 }  // namespace
