@@ -14,16 +14,17 @@
 // Y, Z are R c + (B c + G c), from the bracket outward; blue, green, red are sums of X c, Y c, Z c from left
 // to right.
 
+#include <bit>
 #include <cstddef>
 #include <cstdint>
 #include <cstring>
 
 #include "entry.h"
 #include "roots.h"
-#include "simd/factors.h"
 #include "simd/gamma_planes.h"
 #include "simd/lab_tables.h"
 #include "simd/loop.h"
+#include "simd/registers.h"
 
 namespace HPC::fastcv {
 namespace {
@@ -47,20 +48,19 @@ constexpr GammaPlanes gammaPlanes() {
 }
 constexpr GammaPlanes kGammaPlanes = gammaPlanes();
 
-// Entries of a table by pairs of indices, as they come out of a vector. Indices are small enough that the
-// shift for the high one brings no bit of the low one.
+#if !defined(__ARM_NEON)
+// The halves of a vector of indices, as they come out of it.
 template <typename Entry>
 inline const Entry* lowEntry(const Entry* table, uint64_t pair) {
   return table + static_cast<uint32_t>(pair);
 }
 template <typename Entry>
 inline const Entry* highEntry(const Entry* table, uint64_t pair) {
-  constexpr int kSizeShift = std::countr_zero(sizeof(Entry));
-  return reinterpret_cast<const Entry*>(reinterpret_cast<const char*>(table) + (pair >> (32 - kSizeShift)));
+  return table + (pair >> 32);
 }
-
 inline uint64_t lowPair(uint32x4_t index) { return vgetq_lane_u64(vreinterpretq_u64_u32(index), 0); }
 inline uint64_t highPair(uint32x4_t index) { return vgetq_lane_u64(vreinterpretq_u64_u32(index), 1); }
+#endif
 
 inline uint16x8_t gather(const CubeRootTable& table, uint32x4_t low, uint32x4_t high) {
   const uint16_t* entries = table.data();
@@ -168,48 +168,29 @@ static_assert(kCubeRootTable[0] == 4520 && kCubeRootTable[kLinearUnit] == 32768)
 
 // ---- what the float kernels share
 
-// Four rows of four floats, by columns.
-inline float32x4x4_t columns(const float* row0, const float* row1, const float* row2, const float* row3) {
-#if defined(__ARM_NEON)
-  float32x4x4_t v = vld4q_dup_f32(row0);
-  v = vld4q_lane_f32(row1, v, 1);
-  v = vld4q_lane_f32(row2, v, 2);
-  return vld4q_lane_f32(row3, v, 3);
-#else
-  const float32x4_t r0 = vld1q_f32(row0), r1 = vld1q_f32(row1), r2 = vld1q_f32(row2), r3 = vld1q_f32(row3);
-  const float32x4_t even01 = vtrn1q_f32(r0, r1), odd01 = vtrn2q_f32(r0, r1);
-  const float32x4_t even23 = vtrn1q_f32(r2, r3), odd23 = vtrn2q_f32(r2, r3);
-  return {{vcombine_f32(vget_low_f32(even01), vget_low_f32(even23)),
-           vcombine_f32(vget_low_f32(odd01), vget_low_f32(odd23)),
-           vcombine_f32(vget_high_f32(even01), vget_high_f32(even23)),
-           vcombine_f32(vget_high_f32(odd01), vget_high_f32(odd23))}};
-#endif
-}
-
 // The spline's value at t / 1024, in piece k.
-inline float32x4_t valueIn(const Spline& spline, float32x4_t t, uint32x4_t k) {
-  const float32x4x4_t a =
-      columns(*lowEntry(spline.piece, lowPair(k)), *highEntry(spline.piece, lowPair(k)),
-              *lowEntry(spline.piece, highPair(k)), *highEntry(spline.piece, highPair(k)));
-  const float32x4_t u = vsubq_f32(t, vcvtq_f32_u32(k));
-  return vfmaq_f32(a.val[0], u, vfmaq_f32(a.val[1], u, vfmaq_f32(a.val[2], u, a.val[3])));
+inline Floats valueIn(const Spline& spline, Floats t, Words k) {
+  Floats a[4];
+  lookUpRows(spline.piece, k, a);
+  const Floats u = t - floatsOf(k);
+  return multiplyAdd(a[0], u, multiplyAdd(a[1], u, multiplyAdd(a[2], u, a[3])));
 }
 
 // v0 w0 + v1 w1 + v2 w2, from left to right.
-inline float32x4_t weighted(float32x4_t v0, float32x4_t v1, float32x4_t v2, const Factors& w) {
-  return vfmaq_f32(vfmaq_f32(vmulq_f32(v0, w.at<0>()), v1, w.at<1>()), v2, w.at<2>());
+inline Floats weighted(Floats v0, Floats v1, Floats v2, const Factors& w) {
+  return multiplyAdd(multiplyAdd(v0 * w.at<0>(), v1, w.at<1>()), v2, w.at<2>());
 }
 
 // One pixel through the vector form of `op`.
 template <typename Op>
 inline void pixelByVector(const Op& op, const typename Op::Src* in, typename Op::Dst* out) {
-  constexpr int kBlock = kLanes<typename Op::Vector>;
+  constexpr int kBlock = kBlockPixels<typename Op::Src>;
   typename Op::Src src[kBlock * Op::kSrcChannels] = {};
   typename Op::Dst dst[kBlock * Op::kDstChannels];
   for (int i = 0; i < Op::kSrcChannels; ++i) {
     src[i] = in[i];
   }
-  storePixels(dst, op.vector(loadPixels<typename Op::Vector, Op::kSrcChannels>(src)));
+  storePixels(dst, op.vector(loadPixels<BlockOf<typename Op::Src>, Op::kSrcChannels>(src)));
   for (int i = 0; i < Op::kDstChannels; ++i) {
     out[i] = dst[i];
   }
@@ -225,14 +206,13 @@ constexpr float kToeOffset = 0.13793103f;
 
 // The roots with powf where it is needed. What has been computed of them is computed again: it would cost
 // more to keep it ready, every time, for the few calls.
-[[gnu::noinline, gnu::cold]] Pixels<float32x4_t, 3> settledRoots(float32x4_t x, float32x4_t y, float32x4_t z,
-                                                                 const RootFactors& factors) {
+[[gnu::noinline, gnu::cold]] Pixels<Floats, 3> settledRoots(Floats x, Floats y, Floats z,
+                                                            const RootFactors& factors) {
   return {{Roots(x, factors).settled(), Roots(y, factors).settled(), Roots(z, factors).settled()}};
 }
 
 template <int nc>
 struct BgrToLabF32 {
-  using Vector = float32x4_t;
   using Src = float;
   using Dst = float;
   static constexpr int kSrcChannels = nc;
@@ -240,45 +220,42 @@ struct BgrToLabF32 {
   static constexpr int kInFlight = 1;
   static constexpr bool kUniform = true;
 
-  Pixels<float32x4_t, 3> vector(const Pixels<float32x4_t, nc>& p) const {
-    const float32x4_t b = linear(p.c[0]);
-    const float32x4_t g = linear(p.c[1]);
-    const float32x4_t r = linear(p.c[2]);
-    const float32x4_t x = weighted(g, b, r, x_);
-    const float32x4_t y = weighted(g, b, r, y_);
-    const float32x4_t z = weighted(g, b, r, z_);
-    const uint32x4_t aboveX = aboveToe(x), aboveY = aboveToe(y), aboveZ = aboveToe(z);
+  Pixels<Floats, 3> vector(const Pixels<Floats, nc>& p) const {
+    const Floats b = linear(p.c[0]);
+    const Floats g = linear(p.c[1]);
+    const Floats r = linear(p.c[2]);
+    const Floats x = weighted(g, b, r, x_);
+    const Floats y = weighted(g, b, r, y_);
+    const Floats z = weighted(g, b, r, z_);
+    const Words aboveX = aboveToe(x), aboveY = aboveToe(y), aboveZ = aboveToe(z);
     const Roots rootX(x, root_), rootY(y, root_), rootZ(z, root_);
-    Pixels<float32x4_t, 3> roots = {{rootX.rounded(), rootY.rounded(), rootZ.rounded()}};
-    const uint32x4_t unclear =
-        vorrq_u32(vorrq_u32(vbicq_u32(aboveX, rootX.clear()), vbicq_u32(aboveY, rootY.clear())),
-                  vbicq_u32(aboveZ, rootZ.clear()));
-    if (vmaxvq_u32(unclear) != 0) {
+    Pixels<Floats, 3> roots = {{rootX.rounded(), rootY.rounded(), rootZ.rounded()}};
+    const Words unclear = (aboveX & ~rootX.clear()) | (aboveY & ~rootY.clear()) | (aboveZ & ~rootZ.clear());
+    if (anySet(unclear)) {
       roots = settledRoots(x, y, z, root_);
     }
-    const float32x4_t fx = rootOrToe(aboveX, x, roots.c[0]);
-    const float32x4_t fy = rootOrToe(aboveY, y, roots.c[1]);
-    const float32x4_t fz = rootOrToe(aboveZ, z, roots.c[2]);
-    const float32x4_t l = vbslq_f32(aboveY, vfmaq_f32(splat<float32x4_t>(-16.0f), fy, lab_.at<0>()),
-                                    vmulq_f32(y, lab_.at<1>()));
-    return {{l, vmulq_f32(vsubq_f32(fx, fy), lab_.at<2>()), vmulq_f32(vsubq_f32(fy, fz), lab_.at<3>())}};
+    const Floats fx = rootOrToe(aboveX, x, roots.c[0]);
+    const Floats fy = rootOrToe(aboveY, y, roots.c[1]);
+    const Floats fz = rootOrToe(aboveZ, z, roots.c[2]);
+    const Floats l = select(aboveY, multiplyAdd(splat<Floats>(-16.0f), fy, lab_.at<0>()), y * lab_.at<1>());
+    return {{l, (fx - fy) * lab_.at<2>(), (fy - fz) * lab_.at<3>()}};
   }
 
   void scalar(const float* in, float* out) const { pixelByVector(*this, in, out); }
 
  private:
   // Beyond 0..1 the end pieces go on; a NaN stays one.
-  static float32x4_t linear(float32x4_t v) {
-    const float32x4_t t = vmulq_f32(v, splat<float32x4_t>(static_cast<float>(kSplineIntervals)));
-    const float32x4_t piece = vminnmq_f32(vmaxnmq_f32(t, splat<float32x4_t>(0.0f)),
-                                          splat<float32x4_t>(static_cast<float>(kSplineIntervals - 1)));
-    return valueIn(kExpansionSpline, t, vcvtq_u32_f32(piece));
+  static Floats linear(Floats v) {
+    const Floats t = v * splat<Floats>(static_cast<float>(kSplineIntervals));
+    const Floats piece =
+        minNumber(maxNumber(t, splat<Floats>(0.0f)), splat<Floats>(static_cast<float>(kSplineIntervals - 1)));
+    return valueIn(kExpansionSpline, t, truncated(piece));
   }
 
-  static uint32x4_t aboveToe(float32x4_t t) { return vcgtq_f32(t, splat<float32x4_t>(kToe)); }
+  static Words aboveToe(Floats t) { return (Words)(t > splat<Floats>(kToe)); }
 
-  float32x4_t rootOrToe(uint32x4_t above, float32x4_t t, float32x4_t root) const {
-    return vbslq_f32(above, root, vfmaq_f32(splat<float32x4_t>(kToeOffset), t, x_.at<3>()));
+  Floats rootOrToe(Words above, Floats t, Floats root) const {
+    return select(above, root, multiplyAdd(splat<Floats>(kToeOffset), t, x_.at<3>()));
   }
 
   // Weights of G, B, R in X, Y and Z, and the slope of the toe.
@@ -295,31 +272,30 @@ struct BgrToLabF32 {
 // Lab to linear light, both kernels' first half.
 class LabToLinear {
  public:
-  // Linear blue, green and red of four pixels.
+  // Linear blue, green and red of a block of pixels.
   struct Linear {
-    float32x4_t c[3];
+    Floats c[3];
   };
 
-  Linear operator()(float32x4_t l, float32x4_t a, float32x4_t b) const {
-    const float32x4_t toeOffset = splat<float32x4_t>(kToeOffset);
-    const uint32x4_t dark = vcleq_f32(l, splat<float32x4_t>(7.999625f));
-    const float32x4_t darkY = vmulq_f32(l, blue_.at<3>());
-    const float32x4_t darkRoot = vfmaq_f32(toeOffset, darkY, green_.at<3>());
-    const float32x4_t brightRoot = vfmaq_f32(toeOffset, l, red_.at<3>());
-    const float32x4_t fy = vbslq_f32(dark, darkRoot, brightRoot);
-    const float32x4_t y = vbslq_f32(dark, darkY, cubed(brightRoot));
-    const float32x4_t x = unrooted(vfmaq_f32(fy, a, others_.at<0>()));
-    const float32x4_t z = unrooted(vfmaq_f32(fy, b, others_.at<1>()));
+  Linear operator()(Floats l, Floats a, Floats b) const {
+    const Floats toeOffset = splat<Floats>(kToeOffset);
+    const auto dark = l <= splat<Floats>(7.999625f);
+    const Floats darkY = l * blue_.at<3>();
+    const Floats darkRoot = multiplyAdd(toeOffset, darkY, green_.at<3>());
+    const Floats brightRoot = multiplyAdd(toeOffset, l, red_.at<3>());
+    const Floats fy = select(dark, darkRoot, brightRoot);
+    const Floats y = select(dark, darkY, cubed(brightRoot));
+    const Floats x = unrooted(multiplyAdd(fy, a, others_.at<0>()));
+    const Floats z = unrooted(multiplyAdd(fy, b, others_.at<1>()));
     return {{weighted(x, y, z, blue_), weighted(x, y, z, green_), weighted(x, y, z, red_)}};
   }
 
  private:
-  static float32x4_t cubed(float32x4_t v) { return vmulq_f32(vmulq_f32(v, v), v); }
+  static Floats cubed(Floats v) { return v * v * v; }
 
   // The inverse of f.
-  float32x4_t unrooted(float32x4_t f) const {
-    return vbslq_f32(vcgtq_f32(f, splat<float32x4_t>(kToeRoot)), cubed(f),
-                     vmulq_f32(vsubq_f32(f, splat<float32x4_t>(kToeOffset)), others_.at<2>()));
+  Floats unrooted(Floats f) const {
+    return select(f > splat<Floats>(kToeRoot), cubed(f), (f - splat<Floats>(kToeOffset)) * others_.at<2>());
   }
 
   // Weights of X, Y, Z in a colour, and one of: Y of a dark L, its root, a bright L's root.
@@ -332,7 +308,6 @@ class LabToLinear {
 
 template <int nc>
 struct LabToBgrF32 {
-  using Vector = float32x4_t;
   using Src = float;
   using Dst = float;
   static constexpr int kSrcChannels = 3;
@@ -340,7 +315,7 @@ struct LabToBgrF32 {
   static constexpr int kInFlight = 2;
   static constexpr bool kUniform = true;
 
-  Pixels<float32x4_t, nc> vector(const Pixels<float32x4_t, 3>& p) const {
+  Pixels<Floats, nc> vector(const Pixels<Floats, 3>& p) const {
     const LabToLinear::Linear linear = linear_(p.c[0], p.c[1], p.c[2]);
     return pixelsOf<nc>(compressed(linear.c[0]), compressed(linear.c[1]), compressed(linear.c[2]));
   }
@@ -349,10 +324,10 @@ struct LabToBgrF32 {
 
  private:
   // At 0 and below the curve is 0, at 1 and above the end of its last piece; a NaN stays one.
-  static float32x4_t compressed(float32x4_t v) {
-    const float32x4_t limited = vminq_f32(vmaxq_f32(v, splat<float32x4_t>(0.0f)), splat<float32x4_t>(1.0f));
-    const float32x4_t t = vmulq_f32(limited, splat<float32x4_t>(static_cast<float>(kSplineIntervals)));
-    return valueIn(kCompressionSpline, t, vminq_u32(vcvtq_u32_f32(t), vdupq_n_u32(kSplineIntervals - 1)));
+  static Floats compressed(Floats v) {
+    const Floats limited = min(max(v, splat<Floats>(0.0f)), splat<Floats>(1.0f));
+    const Floats t = limited * splat<Floats>(static_cast<float>(kSplineIntervals));
+    return valueIn(kCompressionSpline, t, min(truncated(t), splat<Words>(kSplineIntervals - 1)));
   }
 
   LabToLinear linear_;
@@ -384,17 +359,20 @@ struct LabToBgr8Row {
 
  private:
   void group(const unsigned char* src, unsigned char* dst) const {
+#if defined(__ARM_NEON)
     const uint8x8x3_t lab = vld3_u8(src);
     const uint16x8_t l = vmovl_u8(lab.val[0]);
     const int16x8_t a = vreinterpretq_s16_u16(vsubl_u8(lab.val[1], vdup_n_u8(128)));
     const int16x8_t b = vreinterpretq_s16_u16(vsubl_u8(lab.val[2], vdup_n_u8(128)));
+    const auto whole = [](int16x4_t v) { return floatsOf(vmovl_s16(v)); };
     const LabToLinear::Linear low =
-        linear(scaled(vget_low_u16(l)), whole(vget_low_s16(a)), whole(vget_low_s16(b)));
+        linear(scaled(vmovl_u16(vget_low_u16(l))), whole(vget_low_s16(a)), whole(vget_low_s16(b)));
     const LabToLinear::Linear high =
-        linear(scaled(vget_high_u16(l)), whole(vget_high_s16(a)), whole(vget_high_s16(b)));
+        linear(scaled(vmovl_u16(vget_high_u16(l))), whole(vget_high_s16(a)), whole(vget_high_s16(b)));
     uint8x8_t bgr[3];
     for (int i = 0; i < 3; ++i) {
-      bgr[i] = vmovn_u16(vcombine_u16(compressed(low.c[i]), compressed(high.c[i])));
+      bgr[i] = vmovn_u16(vcombine_u16(vshrn_n_u32(compressed(low.c[i]), ByteTable::kShift),
+                                      vshrn_n_u32(compressed(high.c[i]), ByteTable::kShift)));
     }
     if constexpr (nc == 4) {
       const uint8x8x4_t all = {{bgr[0], bgr[1], bgr[2], vdup_n_u8(255)}};
@@ -403,28 +381,29 @@ struct LabToBgr8Row {
       const uint8x8x3_t all = {{bgr[0], bgr[1], bgr[2]}};
       vst3_u8(dst, all);
     }
+#else
+    const Words lab = loadGroup(src);
+    const auto whole = [=](int channel) {
+      return floatsOf((lab >> (8 * channel)) & 0xff) - splat<Floats>(128.0f);
+    };
+    const LabToLinear::Linear light = linear(scaled(lab & 0xff), whole(1), whole(2));
+    const auto byte = [&](int i) { return compressed(light.c[i]) >> ByteTable::kShift; };
+    storeGroup<nc>(dst, byte(0) | byte(1) << 8 | byte(2) << 16 | 0xff000000u);
+#endif
   }
 
-  static float32x4_t scaled(uint16x4_t l) {
-    return vmulq_f32(vcvtq_f32_u32(vmovl_u16(l)), splat<float32x4_t>(0.39215687f));
-  }
-  static float32x4_t whole(int16x4_t v) { return vcvtq_f32_s32(vmovl_s16(v)); }
+  static Floats scaled(Words l) { return floatsOf(l) * splat<Floats>(0.39215687f); }
 
-  // The nearest byte to 255 times the curve: see ByteTable.
-  static uint16x4_t compressed(float32x4_t v) {
-    const float32x4_t limited =
-        vminq_f32(vmaxq_f32(v, splat<float32x4_t>(ByteTable::kFloor)), splat<float32x4_t>(0x1.fffffep-1f));
-    const uint32x4_t bits = vreinterpretq_u32_f32(limited);
-    const uint32x4_t index = vshrq_n_u32(bits, ByteTable::kShift);
+  // The nearest byte to 255 times the curve, in bits 16 to 23: see ByteTable.
+  static Words compressed(Floats v) {
+    const Floats limited = min(max(v, splat<Floats>(ByteTable::kFloor)), splat<Floats>(0x1.fffffep-1f));
+    const auto bits = std::bit_cast<Words>(limited);
+    const Words index = bits >> ByteTable::kShift;
     // Where entry 0 would be, outside the table: an address that is only ever added to.
     const uintptr_t zeroth =
         reinterpret_cast<uintptr_t>(kCompressedBytes.entry) - ByteTable::kFirst * sizeof(uint32_t);
     const auto* entries = reinterpret_cast<const uint32_t*>(zeroth);  // NOLINT(performance-no-int-to-ptr)
-    uint32x4_t entry = vld1q_dup_u32(lowEntry(entries, lowPair(index)));
-    entry = vld1q_lane_u32(highEntry(entries, lowPair(index)), entry, 1);
-    entry = vld1q_lane_u32(lowEntry(entries, highPair(index)), entry, 2);
-    entry = vld1q_lane_u32(highEntry(entries, highPair(index)), entry, 3);
-    return vaddhn_u32(entry, bits);
+    return lookUp(entries, index) + bits;
   }
 };
 

@@ -13,4 +13,14 @@ inline __attribute__((always_inline)) void keepInRegister(T& value) {
   asm("" : "+r"(value));
 }
 
+/// Hides how a vector was made. The compiler would make parts of it a second time where only those are used,
+/// and constants one to a register.
+template <typename V>
+inline V opaque(V v) {
+#if defined(__ARM_NEON)
+  asm("" : "+w"(v));
+#endif
+  return v;
+}
+
 }  // namespace HPC::fastcv::arm

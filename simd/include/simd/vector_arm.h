@@ -5,6 +5,7 @@
 
 #include <arm_neon.h>
 
+#include <bit>
 #include <cstddef>
 #include <cstdint>
 
@@ -366,5 +367,77 @@ inline Floats reciprocal(Floats v) {
   estimate = vmulq_f32(estimate, vrecpsq_f32(v, estimate));
   return vmulq_f32(estimate, vrecpsq_f32(v, estimate));
 }
+
+// ---- floats and their bits
+
+/// Of a NaN and a number these make the number.
+inline Floats minNumber(Floats a, Floats b) { return vminnmq_f32(a, b); }
+inline Floats maxNumber(Floats a, Floats b) { return vmaxnmq_f32(a, b); }
+inline Words min(Words a, Words b) { return vminq_u32(a, b); }
+
+/// c - a b, rounded once.
+inline Floats multiplySubtract(Floats c, Floats a, Floats b) { return vfmsq_f32(c, a, b); }
+/// Whether |a| > |b|.
+inline Words exceeds(Floats a, Floats b) { return vcagtq_f32(a, b); }
+/// The bits of `a` where the mask's are set, those of `b` elsewhere.
+inline Floats mixedBits(Words mask, Floats a, Floats b) { return vbslq_f32(mask, a, b); }
+/// (2 a factor) >> 32
+inline SignedWords multiplyHigh(SignedWords a, int32_t factor) { return vqdmulhq_n_s32(a, factor); }
+
+/// The whole part of floats from 0 on, and integers as floats.
+inline Words truncated(Floats v) { return vcvtq_u32_f32(v); }
+inline Floats floatsOf(Words v) { return vcvtq_f32_u32(v); }
+inline Floats floatsOf(SignedWords v) { return vcvtq_f32_s32(v); }
+
+inline bool anySet(Words mask) { return vmaxvq_u32(mask) != 0; }
+
+// Entries of a table by pairs of indices, as they come out of a vector. Indices are small enough that the
+// shift for the high one brings no bit of the low one.
+template <typename Entry>
+inline const Entry* lowEntry(const Entry* table, uint64_t pair) {
+  return table + static_cast<uint32_t>(pair);
+}
+template <typename Entry>
+inline const Entry* highEntry(const Entry* table, uint64_t pair) {
+  constexpr int kSizeShift = std::countr_zero(sizeof(Entry));
+  return reinterpret_cast<const Entry*>(reinterpret_cast<const char*>(table) + (pair >> (32 - kSizeShift)));
+}
+inline uint64_t lowPair(Words index) { return vgetq_lane_u64(vreinterpretq_u64_u32(index), 0); }
+inline uint64_t highPair(Words index) { return vgetq_lane_u64(vreinterpretq_u64_u32(index), 1); }
+
+/// Of a table of rows of four, those that `index` names, by columns.
+inline void lookUpRows(const float (*rows)[4], Words index, Floats (&columns)[4]) {
+  float32x4x4_t v = vld4q_dup_f32(*lowEntry(rows, lowPair(index)));
+  v = vld4q_lane_f32(*highEntry(rows, lowPair(index)), v, 1);
+  v = vld4q_lane_f32(*lowEntry(rows, highPair(index)), v, 2);
+  v = vld4q_lane_f32(*highEntry(rows, highPair(index)), v, 3);
+  columns[0] = v.val[0], columns[1] = v.val[1], columns[2] = v.val[2], columns[3] = v.val[3];
+}
+/// Those of a table that `index` names.
+inline Words lookUp(const uint32_t* table, Words index) {
+  Words entry = vld1q_dup_u32(lowEntry(table, lowPair(index)));
+  entry = vld1q_lane_u32(highEntry(table, lowPair(index)), entry, 1);
+  entry = vld1q_lane_u32(lowEntry(table, highPair(index)), entry, 2);
+  return vld1q_lane_u32(highEntry(table, highPair(index)), entry, 3);
+}
+
+/// Four constants, here in one register: a multiplication by `at<i>()` takes its factor from lane i.
+class Factors {
+ public:
+  Factors(float f0, float f1, float f2, float f3) {
+    const float all[4] = {f0, f1, f2, f3};
+    all_ = load(all);
+    // The compiler would make parts of it a second time, one constant to a register.
+    asm("" : "+w"(all_));
+  }
+
+  template <int i>
+  Floats at() const {
+    return vdupq_laneq_f32(all_, i);
+  }
+
+ private:
+  Floats all_;
+};
 
 }  // namespace HPC::fastcv::arm

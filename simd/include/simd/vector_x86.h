@@ -635,4 +635,94 @@ inline Floats reciprocal(Floats v) {
   return estimate * step(estimate);
 }
 
+// ---- floats and their bits
+
+/// Of a NaN in `a` these make the number in `b`.
+inline Floats minNumber(Floats a, Floats b) {
+  return std::bit_cast<Floats>(_mm256_min_ps(x86::m(a), x86::m(b)));
+}
+inline Floats maxNumber(Floats a, Floats b) {
+  return std::bit_cast<Floats>(_mm256_max_ps(x86::m(a), x86::m(b)));
+}
+inline Words min(Words a, Words b) { return x86::as<Words>(_mm256_min_epu32(x86::m(a), x86::m(b))); }
+
+/// c - a b, rounded once.
+inline Floats multiplySubtract(Floats c, Floats a, Floats b) {
+  return std::bit_cast<Floats>(_mm256_fnmadd_ps(x86::m(a), x86::m(b), x86::m(c)));
+}
+/// Whether |a| > |b|.
+inline Words exceeds(Floats a, Floats b) {
+  return std::bit_cast<Words>(distance(a, Floats{}) > distance(b, Floats{}));
+}
+/// The bits of `a` where the mask's are set, those of `b` elsewhere.
+inline Floats mixedBits(Words mask, Floats a, Floats b) {
+  return std::bit_cast<Floats>((std::bit_cast<Words>(a) & mask) | (std::bit_cast<Words>(b) & ~mask));
+}
+/// (2 a factor) >> 32
+inline SignedWords multiplyHigh(SignedWords a, int32_t factor) {
+  const __m256i f = _mm256_set1_epi32(factor);
+  const __m256i even = _mm256_srli_epi64(_mm256_mul_epi32(x86::m(a), f), 31);
+  const __m256i odd = _mm256_slli_epi64(_mm256_mul_epi32(_mm256_srli_epi64(x86::m(a), 32), f), 1);
+  return x86::as<SignedWords>(_mm256_blend_epi32(even, odd, 0xaa));
+}
+
+/// The whole part of floats from 0 on, and integers below 2^31 as floats.
+inline Words truncated(Floats v) { return x86::as<Words>(_mm256_cvttps_epi32(x86::m(v))); }
+inline Floats floatsOf(Words v) { return std::bit_cast<Floats>(_mm256_cvtepi32_ps(x86::m(v))); }
+inline Floats floatsOf(SignedWords v) { return std::bit_cast<Floats>(_mm256_cvtepi32_ps(x86::m(v))); }
+
+inline bool anySet(Words mask) { return _mm256_testz_si256(x86::m(mask), x86::m(mask)) == 0; }
+
+/// Of a table of rows of four, those that `index` names, by columns.
+inline void lookUpRows(const float (*rows)[4], Words index, Floats (&columns)[4]) {
+  __m256i v[4];
+  for (int i = 0; i < 4; ++i) {
+    v[i] = x86::loadHalves(rows[index[i]], rows[index[i + 4]]);
+  }
+  x86::transpose(v);
+  for (int i = 0; i < 4; ++i) {
+    columns[i] = x86::as<Floats>(v[i]);
+  }
+}
+/// Those of a table that `index` names.
+inline Words lookUp(const uint32_t* table, Words index) {
+  return Words{table[index[0]], table[index[1]], table[index[2]], table[index[3]],
+               table[index[4]], table[index[5]], table[index[6]], table[index[7]]};
+}
+
+/// Four constants.
+class Factors {
+ public:
+  Factors(float f0, float f1, float f2, float f3) : all_{f0, f1, f2, f3} {}
+
+  template <int i>
+  Floats at() const {
+    return splat<Floats>(all_[i]);
+  }
+
+ private:
+  float all_[4];
+};
+
+/// Eight pixels of three bytes, one to a lane of 32 bits, and back.
+inline Words loadGroup(const unsigned char* p) {
+  static constexpr x86::Table kOrder =
+      x86::tableOf([](int i) { return i % 4 == 3 ? -1 : i / 4 * 3 + i % 4; });
+  // The last 12 bytes are the end of what is loaded, so that nothing behind the group is read.
+  const __m128i last = _mm_srli_si128(x86::loadHalf(p + 8), 4);
+  return x86::as<Words>(_mm256_shuffle_epi8(_mm256_set_m128i(last, x86::loadHalf(p)), kOrder.twice()));
+}
+template <int nc>
+inline void storeGroup(unsigned char* p, Words pixels) {
+  if constexpr (nc == 4) {
+    x86::storeWhole(p, x86::m(pixels));
+  } else {
+    static constexpr x86::Table kOrder = x86::tableOf([](int i) { return i < 12 ? i / 3 * 4 + i % 3 : -1; });
+    const __m256i packed = _mm256_shuffle_epi8(x86::m(pixels), kOrder.twice());
+    unsigned char bytes[32];
+    x86::storeHalves(bytes, bytes + 12, packed);
+    memcpy(p, bytes, 24);
+  }
+}
+
 }  // namespace HPC::fastcv::arm
