@@ -36,7 +36,7 @@ class Roots {
     const auto bits = std::bit_cast<SignedWords>(t);
     // z, minus the inverse of the root, off by up to 3.3 %: from minus a third of the bits, exponent and
     // mantissa.
-    const auto z = std::bit_cast<Floats>(splat<SignedWords>(kMinusRootOfOne) - multiplyHigh(bits, kThird));
+    const auto z = std::bit_cast<Floats>(splat<SignedWords>(kMinusRootOfOne) - doubledHigh(bits, kThird));
     // With e = 1 + t z^3 it is z (1 - e)^(-1/3).
     const Floats e = multiplyAdd(factors.units.at<1>(), t * z, z * z);
     Floats series = multiplyAdd(factors.series.at<1>(), e, factors.series.at<2>());

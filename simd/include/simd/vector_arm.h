@@ -382,7 +382,7 @@ inline Words exceeds(Floats a, Floats b) { return vcagtq_f32(a, b); }
 /// The bits of `a` where the mask's are set, those of `b` elsewhere.
 inline Floats mixedBits(Words mask, Floats a, Floats b) { return vbslq_f32(mask, a, b); }
 /// (2 a factor) >> 32
-inline SignedWords multiplyHigh(SignedWords a, int32_t factor) { return vqdmulhq_n_s32(a, factor); }
+inline SignedWords doubledHigh(SignedWords a, int32_t factor) { return vqdmulhq_n_s32(a, factor); }
 
 /// The whole part of floats from 0 on, and integers as floats.
 inline Words truncated(Floats v) { return vcvtq_u32_f32(v); }

@@ -659,7 +659,7 @@ inline Floats mixedBits(Words mask, Floats a, Floats b) {
   return std::bit_cast<Floats>((std::bit_cast<Words>(a) & mask) | (std::bit_cast<Words>(b) & ~mask));
 }
 /// (2 a factor) >> 32
-inline SignedWords multiplyHigh(SignedWords a, int32_t factor) {
+inline SignedWords doubledHigh(SignedWords a, int32_t factor) {
   const __m256i f = _mm256_set1_epi32(factor);
   const __m256i even = _mm256_srli_epi64(_mm256_mul_epi32(x86::m(a), f), 31);
   const __m256i odd = _mm256_slli_epi64(_mm256_mul_epi32(_mm256_srli_epi64(x86::m(a), 32), f), 1);
