@@ -1,25 +1,34 @@
 // SPDX-FileCopyrightText: the libjni_kyface_api authors
 // SPDX-License-Identifier: Apache-2.0
 
-// What the open engine needs for a frame: run under the counting plugin, or by itself for its time,
+// What the open engine needs for a frame and for a feature: run under the counting plugin, or by itself for
+// its time,
 //
 //   bench_engine count|time REPEATS [LANDMARKS]
 //
 // The frame is the portrait, reduced or enlarged to 640 x 480 with the face where a phone held at arm's
-// length shows it. Prints a line for each operation in the order of their laps: its name and the calls in the
-// difference, or its name and the median of its milliseconds.
+// length shows it; the descriptor's weights are random. Prints a line for each operation in the order of
+// their laps: its name and the calls in the difference, or its name and the median of its milliseconds of
+// processor time, all operations taking turns. Among those that are timed is a loop of as many multiply-adds
+// as a feature takes, in registers: the machine's peak.
+
+#include <unistd.h>
 
 #include <algorithm>
-#include <chrono>
 #include <cstdio>
+#include <cstdlib>
 #include <cstring>
+#include <ctime>
 #include <functional>
+#include <iterator>
 #include <string>
 #include <vector>
 
 #include "engine/ky_engine.h"
+#include "engine/src/lanes.h"
 #include "kyface_api/kyface_api.h"
 #include "lap.h"
+#include "tests/engine/descriptor_model.h"
 #include "tests/support/picture.h"
 
 namespace {
@@ -38,7 +47,7 @@ struct Operation {
 
 /// Calls one of the engine's searches, whose faces nobody wants.
 template <auto search, auto release>
-std::function<void()> Search(ky_handle_t handle, const std::vector<uint8_t>& frame) {
+std::function<void()> searching(ky_handle_t handle, const std::vector<uint8_t>& frame) {
   return [handle, &frame] {
     ky_face_t* faces = nullptr;
     int count = 0;
@@ -46,23 +55,91 @@ std::function<void()> Search(ky_handle_t handle, const std::vector<uint8_t>& fra
                               &faces, &count);
     if (result != KY_SUCCESS || count != 1) {
       (void)std::fprintf(stderr, "bench_engine: result %d, %d faces\n", result, count);
-      std::exit(1);
+      std::_Exit(1);
     }
     release(faces, count);
   };
 }
 
-double MedianMilliseconds(const std::function<void()>& call, int repeats) {
-  using Clock = std::chrono::steady_clock;
-  call();
-  std::vector<double> times;
-  for (int i = 0; i < repeats; ++i) {
-    const Clock::time_point begin = Clock::now();
-    call();
-    times.push_back(std::chrono::duration<double, std::milli>(Clock::now() - begin).count());
+/// Takes a feature of the portrait's face.
+std::function<void()> extracting(ky_handle_t verifier, const ky_face_t& face) {
+  return [verifier, &face] {
+    const Picture& picture = kyengine::test::Portrait();
+    ky_feature_t feature = nullptr;
+    int length = 0;
+    const int result = ky_verify_get_feature(verifier, picture.rgb.data(), KY_PIXEL_RGB, picture.width,
+                                             picture.height, 3 * picture.width, &face, &feature, &length);
+    if (result != KY_SUCCESS) {
+      (void)std::fprintf(stderr, "bench_engine: result %d, no feature\n", result);
+      std::_Exit(1);
+    }
+    ky_verify_release_feature(feature);
+  };
+}
+
+/// A verifier by a descriptor whose weights are random, or none.
+ky_handle_t randomVerifier() {
+  using namespace kyengine;
+  const std::vector<uint8_t> model = test::FileOf(test::RandomModel(FaceDescriptorShape(), 1));
+  char path[] = "/tmp/bench_engine.XXXXXX";
+  const int file = mkstemp(path);
+  ky_handle_t verifier = nullptr;
+  if (file < 0 || write(file, model.data(), model.size()) != static_cast<ssize_t>(model.size()) ||
+      ky_verify_create_handle(&verifier, path) != KY_SUCCESS) {
+    verifier = nullptr;
   }
-  std::sort(times.begin(), times.end());
-  return times[times.size() / 2];
+  (void)close(file);
+  (void)unlink(path);
+  return verifier;
+}
+
+/// As many multiply-adds as the descriptor's network has by its definition, one independent of the next.
+void multiplyAdds() {
+  using namespace kyengine;
+  constexpr int kSums = 5;
+  constexpr int kRounds = 270'800'000 / (kSums * kLanes);
+  static volatile float number = 0.5F;
+  const Lanes x = Broadcast(number);
+  Lanes sums[kSums] = {x, x, x, x, x};
+  for (int i = 0; i < kRounds; ++i) {
+#pragma GCC unroll 8
+    for (Lanes& sum : sums) {
+      sum = MultiplyAdd(x, sum, x);
+    }
+  }
+  for (const Lanes& sum : sums) {
+    float one[kLanes];
+    Store(sum, one);
+    number = one[0] / 2;
+  }
+}
+
+double millisecondsOf(const std::function<void()>& call) {
+  const auto now = [] {
+    timespec time = {};
+    (void)clock_gettime(CLOCK_THREAD_CPUTIME_ID, &time);
+    return static_cast<double>(time.tv_sec) * 1e3 + static_cast<double>(time.tv_nsec) * 1e-6;
+  };
+  const double begin = now();
+  call();
+  return now() - begin;
+}
+
+void timeAll(const std::vector<Operation>& operations, int repeats) {
+  std::vector<std::vector<double>> times(operations.size());
+  for (int i = 0; i <= repeats; ++i) {
+    for (size_t k = 0; k < operations.size(); ++k) {
+      const double time = millisecondsOf(operations[k].call);
+      // The first round warms up.
+      if (i > 0) {
+        times[k].push_back(time);
+      }
+    }
+  }
+  for (size_t k = 0; k < operations.size(); ++k) {
+    std::sort(times[k].begin(), times[k].end());
+    std::printf("%s\t%.2f\n", operations[k].name.c_str(), times[k][times[k].size() / 2]);
+  }
 }
 
 }  // namespace
@@ -82,28 +159,40 @@ int main(int argc, char** argv) {
   ky_handle_t small = nullptr;
   ky_handle_t usual = nullptr;
   ky_handle_t tracker = nullptr;
+  ky_handle_t patterns = nullptr;
+  const ky_handle_t descriptor = randomVerifier();
   if (ky_face_create_detector(&large, nullptr, KY_CONFIG_LARGE_FACES) != KY_SUCCESS ||
       ky_face_create_detector(&small, nullptr, KY_CONFIG_SMALL_FACES) != KY_SUCCESS ||
       ky_face_create_detector(&usual, nullptr, KY_CONFIG_DEFAULT) != KY_SUCCESS ||
       ky_face_create_tracker(&tracker, landmarks, KY_CONFIG_DEFAULT) != KY_SUCCESS ||
-      ky_face_track_set_detect_interval(tracker, KY_MAX_DETECT_INTERVAL, nullptr) != KY_SUCCESS) {
+      ky_face_track_set_detect_interval(tracker, KY_MAX_DETECT_INTERVAL, nullptr) != KY_SUCCESS ||
+      ky_verify_create_handle(&patterns, nullptr) != KY_SUCCESS || descriptor == nullptr) {
     return 1;
   }
-  constexpr auto detect = Search<ky_face_detect, ky_face_release_detector_result>;
-  constexpr auto track = Search<ky_face_track, ky_face_release_tracker_result>;
-  const std::vector<Operation> operations = {
+  constexpr auto detect = searching<ky_face_detect, ky_face_release_detector_result>;
+  constexpr auto track = searching<ky_face_track, ky_face_release_tracker_result>;
+  ky_face_t face = {};
+  face.rect = kyengine::test::kPortraitFace;
+  constexpr ky_pointf_t kEyes[] = {{244, 109}, {244, 109}, {201, 106}, {201, 106}, {222, 128}};
+  face.points_count = std::size(kEyes);
+  std::copy(std::begin(kEyes), std::end(kEyes), face.points_array);
+
+  std::vector<Operation> operations = {
       {"detect, faces from 80 pixels", detect(large, frame)},
       {"detect, faces from 40 pixels", detect(small, frame)},
       {"detect, by default", detect(usual, frame)},
       {"track a face between detections", track(tracker, frame)},
+      {"extract a feature, by the descriptor", extracting(descriptor, face)},
+      {"extract a feature, by patterns", extracting(patterns, face)},
   };
+  if (!counts) {
+    operations.push_back({"multiply-adds of a feature, in registers", multiplyAdds});
+    timeAll(operations, repeats);
+    return 0;
+  }
   for (const Operation& operation : operations) {
-    if (counts) {
-      bench::measure(operation.call, repeats);
-      std::printf("%s\t%d\n", operation.name.c_str(), 2 * repeats);
-    } else {
-      std::printf("%s\t%.2f\n", operation.name.c_str(), MedianMilliseconds(operation.call, repeats));
-    }
+    bench::measure(operation.call, repeats);
+    std::printf("%s\t%d\n", operation.name.c_str(), 2 * repeats);
   }
   return 0;
 }

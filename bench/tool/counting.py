@@ -59,10 +59,10 @@ class Counts:
 
 @dataclasses.dataclass
 class CallCount:
-    """What a call of a native method needs."""
+    """What a call of a native method or of the open engine needs."""
 
     machine_calls: int  # calls into the virtual machine
-    instructions: float  # of the shared library alone
+    instructions: float  # of a native method, of the shared library alone
 
 
 def tools(build):
@@ -99,6 +99,16 @@ def count_bridge(build, root, repeats=10):
             if begin <= blocks[block].address < end
         )
         counts[name] = CallCount(int(machine_calls), own / int(calls))
+    return counts
+
+
+def count_engine(build, root):
+    """Runs bench_engine of the folder `build` and returns {call: CallCount}, its instructions those of all libraries."""
+    lines, laps, _ = _run(build, root, ["bench_engine", "count", "1"])
+    counts = {}
+    for index, line in enumerate(lines):
+        name, calls = line.split("\t")
+        counts[name] = CallCount(0, _difference(laps, index)[0] / int(calls))
     return counts
 
 

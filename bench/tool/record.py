@@ -6,12 +6,13 @@
 TOLERANCE = 0.02
 
 
-def figures(counts, bridge):
-    """What is kept: {operation: {size: instructions per pixel}}, and of native methods {name: {"call": instructions}}."""
+def figures(counts, calls):
+    """What is kept: {operation: {size: instructions per pixel}}, and of native methods and the engine
+    {name: {"call": instructions}}."""
     result = {}
     for key, count in counts.items():
         result.setdefault(key.operation, {})[key.size] = round(count.per_pixel, 4)
-    for name, count in bridge.items():
+    for name, count in calls.items():
         result[name] = {"call": round(count.instructions, 1)}
     return result
 
