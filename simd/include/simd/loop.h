@@ -304,6 +304,7 @@ class PixelRow {
 /// of a destination
 ///   with four channels it may give three, then alpha is opaque;
 /// - `scalar(const Src*, Dst*)`, for one pixel;
+/// - `Vector`, the register of a block, if it is not that of BlockOf;
 /// - `kWeighs`, if `vector` takes Colours;
 /// - `kPacked`, if `vector` takes and gives blocks of 4-channel pixels as they lie in memory, not a channel a
 ///   register.
