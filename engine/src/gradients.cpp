@@ -159,8 +159,9 @@ void Cast(Votes& votes, float* top, float* bottom) {
 /// For every place in a square between the centres of four cells, how its pixel's vote is shared among them.
 void Share(int cell, std::vector<float>& weights) {
   // How far pixel i behind the centre of one cell is on its way to the next one's.
-  const auto way = [cell](int i) {
-    return (static_cast<float>(cell / 2 + i) + 0.5F) / static_cast<float>(cell) - 0.5F;
+  const int half = cell / 2;
+  const auto way = [cell, half](int i) {
+    return (static_cast<float>(half + i) + 0.5F) / static_cast<float>(cell) - 0.5F;
   };
   weights.clear();
   for (int y = 0; y < cell; ++y) {

@@ -41,6 +41,7 @@ class FeatureMap {
   /// Cells in the result for a picture of `pixels` in that direction: those that have neighbours on all
   /// sides. Not positive when there are none.
   static int CellsOf(int pixels, int cell) {
+    // NOLINTNEXTLINE(bugprone-incorrect-roundings): as dlib counts them
     return static_cast<int>(static_cast<float>(pixels) / static_cast<float>(cell) + 0.5F) - 2;
   }
 
