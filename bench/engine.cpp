@@ -100,7 +100,15 @@ void multiplyAdds() {
   constexpr int kRounds = 270'800'000 / (kSums * kLanes);
   static volatile float number = 0.5F;
   const Lanes x = Broadcast(number);
-  Lanes sums[kSums] = {x, x, x, x, x};
+  // Numbers that are known to be equal would be worked out once.
+  float first[kSums * kLanes];
+  for (float& each : first) {
+    each = number;
+  }
+  Lanes sums[kSums];
+  for (int i = 0; i < kSums; ++i) {
+    sums[i] = Load(first + static_cast<ptrdiff_t>(i) * kLanes);
+  }
   for (int i = 0; i < kRounds; ++i) {
 #pragma GCC unroll 8
     for (Lanes& sum : sums) {
@@ -110,7 +118,7 @@ void multiplyAdds() {
   for (const Lanes& sum : sums) {
     float one[kLanes];
     Store(sum, one);
-    number = one[0] / 2;
+    number = (one[0] + one[kLanes - 1]) / 4;
   }
 }
 
