@@ -125,7 +125,7 @@ TEST(TotalLightness, IsWholeBeyond32Bits) {
   std::fill_n(pixels, kBlock, 255);
   std::fill_n(pixels + 1028 * kBlock, kBlock, 255);
   const auto total = [&](int columns, int rows, bool rgba) {
-    return kyface::brightness::total_lightness(pixels, 0, columns, rows, rgba);
+    return kyface::brightness::totalLightness(pixels, 0, columns, rows, rgba);
   };
   // Each only once: they are many pixels for an emulator.
   EXPECT_EQ(total(kColumns, 1, true), uint64_t{255} * kColumns);
