@@ -4,7 +4,8 @@
 places, its system's headers as far as the project includes them, and its stand-ins for the system's libraries at API
 level 24. Behind it are this machine's clang and the C libraries of Linux.
 
-Without --runs what it links needs the libraries that Android has, and cannot be run; with it, it runs on Linux."""
+Without --runs what it links needs the libraries that Android has, and cannot be run; with it, it runs on Linux. Linked
+with a C++ library it still cannot be run: the C library's stand-in then has the names of Linux's."""
 
 import argparse
 import os
@@ -107,6 +108,21 @@ def stub(compiler, triple, folder, name, symbols, more=()):
                    input=source, text=True, check=True)
 
 
+def names_of_the_c_library(compiler, nm, triple):
+    """{library: symbols}, of all that a C++ library for Linux may ask of C's."""
+    loader = {"aarch64-linux": "ld-linux-aarch64.so.1", "x86_64-linux": "ld-linux-x86-64.so.2"}[triple]
+
+    def symbols(file):
+        path = subprocess.run([compiler, f"--target={triple}-gnu", f"--print-file-name={file}"], stdout=subprocess.PIPE,
+                              text=True, check=True).stdout.strip()
+        lines = subprocess.run([nm, "-D", "--defined-only", "--format=just-symbols", path], stdout=subprocess.PIPE,
+                               text=True, check=True).stdout.split()
+        # The versions have names with dots in them.
+        return {name for name in (line.split("@")[0] for line in lines) if name.isidentifier()}
+
+    return {"libc": sorted(symbols("libc.so.6") | symbols(loader)), "libm": sorted(symbols("libm.so.6")), "libdl": []}
+
+
 def standing(compiler, triple, folder, include, name, source):
     """A library of Android's that works on Linux."""
     subprocess.run([f"{compiler}++", f"--target={triple}-gnu", "-fuse-ld=lld", "-shared", "-fPIC", "-isystem", include,
@@ -114,13 +130,16 @@ def standing(compiler, triple, folder, include, name, source):
                     f"-Wl,-soname,{name}.so"], check=True)
 
 
-def make(ndk, clang, tools, jni, runs=False, compile_options="", abis=tuple(TRIPLES)):
-    """`tools` maps the NDK's names of llvm's tools to this machine's."""
+def make(ndk, clang, tools, jni, runs=False, cplusplus=False, compile_options="", abis=tuple(TRIPLES)):
+    """`tools` maps the NDK's names of llvm's tools to this machine's. With `cplusplus` what is linked has a C++ library in
+    it, Linux's."""
     # Where it is installed it finds its linker.
     clang = Path(shutil.which(clang)).resolve()
     prebuilt = ndk / "toolchains" / "llvm" / "prebuilt" / "linux-x86_64"
     # Android's own C++ library is linked into everything, and the C library's parts are few.
     link = "-static-libstdc++ -static-libgcc" if runs else "-nodefaultlibs -lc -lm -Wl,--as-needed"
+    if cplusplus:
+        link += " -Wl,--start-group -l:libstdc++.a -l:libgcc_eh.a -l:libgcc.a -Wl,--end-group"
     text = TOOLCHAIN.replace("@link@", link).replace("@link_exe@", "" if runs else "-nostartfiles -Wl,-e,main")
     # On Android the stack's guard is in the thread's own block, on Linux it is a variable.
     guard = "" if runs else "-mstack-protector-guard=sysreg -mstack-protector-guard-reg=sp_el0 " \
@@ -143,7 +162,11 @@ def make(ndk, clang, tools, jni, runs=False, compile_options="", abis=tuple(TRIP
             standing(compiler, triple, folder, include, "liblog", ROOT / "platform" / "log.cpp")
             standing(compiler, triple, folder, include, "libjnigraphics", ROOT / "platform" / "bitmap.cpp")
         else:
-            for name, symbols in listed_imports().items():
+            libraries = listed_imports()
+            if cplusplus:
+                for name, more in names_of_the_c_library(compiler, prebuilt / "bin" / "llvm-nm", triple).items():
+                    libraries[name] = sorted({*libraries.get(name, []), *more})
+            for name, symbols in libraries.items():
                 stub(compiler, triple, folder, name, symbols)
 
 
