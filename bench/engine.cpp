@@ -25,10 +25,10 @@
 #include <vector>
 
 #include "engine/ky_engine.h"
-#include "engine/src/lanes.h"
 #include "kyface_api/kyface_api.h"
 #include "lap.h"
-#include "tests/engine/descriptor_model.h"
+#include "simd/vector.h"
+#include "tests/support/descriptor_model.h"
 #include "tests/support/picture.h"
 
 namespace {
@@ -95,30 +95,24 @@ ky_handle_t randomVerifier() {
 
 /// As many multiply-adds as the descriptor's network has by its definition, one independent of the next.
 void multiplyAdds() {
-  using namespace kyengine;
-  constexpr int kSums = 5;
+  using namespace HPC::fastcv::arm;
+  constexpr int kLanes = static_cast<int>(sizeof(Floats) / sizeof(float));
+  constexpr int kSums = 10;  // enough for a multiply-add's latency, and few enough for the registers
   constexpr int kRounds = 270'800'000 / (kSums * kLanes);
   static volatile float number = 0.5F;
-  const Lanes x = Broadcast(number);
-  // Numbers that are known to be equal would be worked out once.
-  float first[kSums * kLanes];
-  for (float& each : first) {
-    each = number;
-  }
-  Lanes sums[kSums];
-  for (int i = 0; i < kSums; ++i) {
-    sums[i] = Load(first + static_cast<ptrdiff_t>(i) * kLanes);
+  const Floats x = splat<Floats>(number);
+  Floats sums[kSums];
+  for (Floats& sum : sums) {
+    sum = splat<Floats>(number);  // read anew: numbers known to be equal would be worked out once
   }
   for (int i = 0; i < kRounds; ++i) {
-#pragma GCC unroll 8
-    for (Lanes& sum : sums) {
-      sum = MultiplyAdd(x, sum, x);
+#pragma GCC unroll 16
+    for (Floats& sum : sums) {
+      sum = multiplyAdd(x, sum, x);
     }
   }
-  for (const Lanes& sum : sums) {
-    float one[kLanes];
-    Store(sum, one);
-    number = (one[0] + one[kLanes - 1]) / 4;
+  for (const Floats& sum : sums) {
+    number = (sum[0] + sum[kLanes - 1]) / 4;
   }
 }
 

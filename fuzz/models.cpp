@@ -26,7 +26,7 @@
 #include "engine/src/model.h"
 #include "engine/src/scanner.h"
 #include "fuzz_input.h"
-#include "tests/engine/descriptor_model.h"
+#include "tests/support/descriptor_model.h"
 
 namespace {
 

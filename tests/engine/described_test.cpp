@@ -15,10 +15,10 @@
 #include <memory>
 #include <string>
 
-#include "descriptor_model.h"
 #include "engine_calls.h"
 #include "feature_text.h"
 #include "landmark_model.h"
+#include "tests/support/descriptor_model.h"
 
 namespace kyengine::test {
 namespace {

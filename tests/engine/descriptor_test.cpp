@@ -16,7 +16,7 @@
 #include <span>
 #include <vector>
 
-#include "descriptor_model.h"
+#include "tests/support/descriptor_model.h"
 #include "tests/support/guarded_image.h"
 
 namespace kyengine::test {

@@ -1,7 +1,7 @@
 // SPDX-FileCopyrightText: the libjni_kyface_api authors
 // SPDX-License-Identifier: Apache-2.0
 
-#include "descriptor_model.h"
+#include "tests/support/descriptor_model.h"
 
 #include <algorithm>
 #include <array>
