@@ -91,9 +91,9 @@ TILE_INLINE void transposeTiles(const Byte* src, const RowOffsets<16 / bytes>& r
   for (; count != 0; --count) {
     transposeTile<bytes>(src, rows, [&](auto r, uint8x16_t v) TILE_LAMBDA { vst1q_u8(at(dst, r), v); });
     src += 16;
-    keepInRegister(src);
+    forget(src);
     dst += next;
-    keepInRegister(dst);
+    forget(dst);
   }
 }
 
@@ -168,11 +168,11 @@ inline void decodeBlock(const Scratch& scratch, ptrdiff_t rows, bool firstIsV, c
       chroma = {loadSamples(chromaAt), loadSamples(chromaAt + 16)};
     }
     chromaAt += kBlock;
-    keepInRegister(chromaAt);
+    forget(chromaAt);
     decoder.decode([=](int row, int part) TILE_LAMBDA { return loadParts(lumaAt + 16 * row, 32, part); },
                    chroma, out, step);
     lumaAt += 64;
-    keepInRegister(lumaAt);
+    forget(lumaAt);
   }
 }
 
@@ -269,7 +269,7 @@ inline void copyLumaBlock(const Scratch& scratch, ptrdiff_t pairs, Byte* to, ptr
       vst1q_u8(to, v[2 * row]);
       vst1q_u8(to + 16, v[2 * row + 1]);
       to += stride;
-      keepInRegister(to);
+      forget(to);
     }
   }
 }
@@ -291,7 +291,7 @@ inline void copyChromaBlock(const Scratch& scratch, ptrdiff_t rows, uint8x16_t p
       vst2q_u8(to, both);
     }
     to += stride;
-    keepInRegister(to);
+    forget(to);
   }
 }
 

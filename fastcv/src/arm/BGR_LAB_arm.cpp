@@ -71,7 +71,9 @@ inline uint16x8_t gather(const CubeRootTable& table, uint32x4_t low, uint32x4_t 
   v = vld1q_lane_u16(lowEntry(entries, lowPair(high)), v, 4);
   v = vld1q_lane_u16(highEntry(entries, lowPair(high)), v, 5);
   v = vld1q_lane_u16(lowEntry(entries, highPair(high)), v, 6);
-  return opaque(vld1q_lane_u16(highEntry(entries, highPair(high)), v, 7));
+  v = vld1q_lane_u16(highEntry(entries, highPair(high)), v, 7);
+  forget(v);  // its parts would be made a second time where only those are used
+  return v;
 }
 
 template <int nc>
@@ -121,7 +123,9 @@ struct BgrToLab8 {
   // Weights of B, G and R in a register, from lane 0.
   static uint16x4_t lanes(LinearWeights weights) {
     const uint16_t all[4] = {weights.b, weights.g, weights.r};
-    return opaque(vld1_u16(all));
+    uint16x4_t v = vld1_u16(all);
+    forget(v);  // constants would be made one to a register
+    return v;
   }
 
   static uint32x4_t coordinate(uint16x4_t weights, uint16x4_t b, uint16x4_t g, uint16x4_t r) {

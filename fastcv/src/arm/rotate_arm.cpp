@@ -129,8 +129,8 @@ class QuarterTurn {
   // What moves on does so tile by tile: left to itself the compiler forms many addresses anew from that of
   // the first, and runs out of registers.
   static TILE_INLINE void settle(const unsigned char*& src, RowPairs& out) {
-    keepInRegister(src);
-    keepInRegister(out.first);
+    forget(src);
+    forget(out.first);
   }
 
   template <int rows, int columns, bool past>
@@ -179,7 +179,7 @@ struct ReversedRow {
     constexpr ptrdiff_t kSize = pixels * bytes;
     // In registers, both steps are the loads' and the stores' own.
     ptrdiff_t down = -kSize;
-    keepInRegister(down);
+    forget(down);
     src += down;
     KERNEL_ROLLED_LOOP
     for (ptrdiff_t n = left / (pixels * blocks); n != 0; --n) {
@@ -187,7 +187,7 @@ struct ReversedRow {
         move(src, dst);
         src += down;
         dst += kSize;
-        keepInRegister(dst);
+        forget(dst);
       });
     }
     src -= down;

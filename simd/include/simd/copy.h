@@ -48,9 +48,9 @@ inline void copyRow(const unsigned char* src, unsigned char* dst, ptrdiff_t size
     copyBlock(src, dst);
     copyBlock(src + kCopyBlock, dst + kCopyBlock);
     src += kTurn;
-    keepInRegister(src);
+    forget(src);
     dst += kTurn;
-    keepInRegister(dst);
+    forget(dst);
   }
   if (size % kTurn > kCopyBlock) {
     copyBlock(src, dst);

@@ -15,6 +15,7 @@
 #include "simd/neon.h"
 #include "simd/overlap.h"
 #include "simd/pixel.h"
+#include "simd/registers.h"
 
 /// Keeps the compiler from unrolling or vectorising the loop that follows.
 #if defined(__clang__)
@@ -79,25 +80,6 @@ inline void inFlight(const Load& load, const Compute& compute, const Store& stor
     (store(i, out[i]), ...);
   }(std::make_integer_sequence<int, n>{});
 }
-
-/// Makes the compiler forget what it knows about a value (that it is a constant, how it was made, how far it
-/// is from another), where it would use that knowledge to the loop's disadvantage. No instruction.
-template <typename V>
-inline void forget(V& value) {
-  asm volatile("" : "+r"(value));
-}
-#if defined(__ARM_NEON)
-#define KERNEL_VECTOR_REGISTER "+w"
-#else
-#define KERNEL_VECTOR_REGISTER "+x"
-#endif
-inline void forget(Bytes& value) { asm("" : KERNEL_VECTOR_REGISTER(value)); }
-inline void forget(Floats& value) { asm("" : KERNEL_VECTOR_REGISTER(value)); }
-#if !defined(__ARM_NEON)
-inline void forget(uint8x16_t& value) { asm("" : KERNEL_VECTOR_REGISTER(value)); }
-inline void forget(float32x4_t& value) { asm("" : KERNEL_VECTOR_REGISTER(value)); }
-#endif
-#undef KERNEL_VECTOR_REGISTER
 
 namespace detail {
 

@@ -15,7 +15,11 @@
 #include <type_traits>
 #include <utility>
 
+#include "simd/registers.h"
+
 namespace neon_x86 {
+
+using HPC::fastcv::arm::kept;
 
 // ---- vectors and registers
 
@@ -89,15 +93,6 @@ inline __m128i load(const void* p) { return _mm_loadu_si128(static_cast<const __
 inline __m128i load8(const void* p) { return _mm_loadl_epi64(static_cast<const __m128i*>(p)); }
 inline void store(void* p, __m128i x) { _mm_storeu_si128(static_cast<__m128i*>(p), x); }
 inline void store8(void* p, __m128i x) { _mm_storel_epi64(static_cast<__m128i*>(p), x); }
-
-// A constant in a register or in memory. GCC would rather make it anew, in a loop time and again.
-template <typename V>
-inline V kept(V v) {
-#if !defined(__clang__)
-  asm("" : "+x"(v));
-#endif
-  return v;
-}
 
 // ---- widening
 

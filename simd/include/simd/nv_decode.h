@@ -180,7 +180,7 @@ class ColourDecoder {
   TILE_INLINE void store(const Pixels<Bytes, 3>& pixels, unsigned char*& out, ptrdiff_t step) const {
     storePixels(out, withAlpha<nc>(pixels, alpha_[row]));
     out += step;
-    keepInRegister(out);
+    forget(out);
   }
 
   ChromaWeights first_;
@@ -233,7 +233,7 @@ class RowPairReader {
  private:
   static TILE_INLINE void advance(const unsigned char*& at, ptrdiff_t step) {
     at += mirrored ? -step : step;
-    keepInRegister(at);
+    forget(at);
   }
 
   const unsigned char* luma_[2];

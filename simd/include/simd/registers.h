@@ -1,24 +1,36 @@
 // SPDX-FileCopyrightText: the libjni_kyface_api authors
 // SPDX-License-Identifier: Apache-2.0
-/// How kernels tell the compiler what it is to keep in registers.
+/// What kernels hide from the compiler. No instruction comes of it.
 #pragma once
+
+#include <type_traits>
 
 namespace HPC::fastcv::arm {
 
-/// Hides where a value comes from. The compiler then keeps it in its register, where it would otherwise
-/// derive it again from others at every use, or make it the by-product of a load or store, for which in-order
-/// cores wait.
+/// Makes the compiler forget what it knows about a value (that it is a constant, how it was made, how far it
+/// is from another), where it would use that to a loop's disadvantage: derive the value again at every use,
+/// make parts of it a second time, or make it the by-product of a load or store, for which in-order cores
+/// wait.
 template <typename T>
-inline __attribute__((always_inline)) void keepInRegister(T& value) {
-  asm("" : "+r"(value));
+inline __attribute__((always_inline)) void forget(T& value) {
+  if constexpr (std::is_scalar_v<T>) {
+    asm("" : "+r"(value));
+  } else {
+#if defined(__ARM_NEON)
+    asm("" : "+w"(value));
+#else
+    asm("" : "+x"(value));
+#endif
+  }
 }
 
-/// Hides how a vector was made. The compiler would make parts of it a second time where only those are used,
-/// and constants one to a register.
+/// A vector of constants, in a register or in memory. With GCC on x86-64 it is forgotten: of products with
+/// what it knows GCC makes several shifts and additions, and it makes constants anew, in a loop time and
+/// again.
 template <typename V>
-inline V opaque(V v) {
-#if defined(__ARM_NEON)
-  asm("" : "+w"(v));
+inline V kept(V v) {
+#if !defined(__clang__) && !defined(__ARM_NEON)
+  forget(v);
 #endif
   return v;
 }

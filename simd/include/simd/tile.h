@@ -57,7 +57,7 @@ struct RowOffsets {
   TILE_INLINE explicit RowOffsets(ptrdiff_t step) {
     for (int r = 0; r < count; ++r) {
       at[r] = r * step;
-      keepInRegister(at[r]);
+      forget(at[r]);
     }
   }
 };
@@ -298,13 +298,13 @@ TILE_INLINE void moveTiles(const unsigned char* src, const RowOffsets<kLargestTi
   detail::unrolled<tiles>([&](auto tile) TILE_LAMBDA {
     const auto current = detail::interleaved(in);
     src += 16;
-    keepInRegister(src);
+    forget(src);
     detail::storeColumns<kSide>(current, out, [&](auto r) TILE_LAMBDA {
       if constexpr (tile + 1 < tiles) {
         in.v[r] = loadBytes<16>(src + from.at[r]);
       }
     });
-    keepInRegister(out.first);
+    forget(out.first);
   });
 }
 

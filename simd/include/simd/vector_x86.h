@@ -13,6 +13,8 @@
 #include <cstdint>
 #include <cstring>
 
+#include "simd/registers.h"
+
 namespace HPC::fastcv::arm {
 
 typedef uint8_t Bytes __attribute__((vector_size(32)));
@@ -35,14 +37,6 @@ inline V as(__m256i v) {
   return std::bit_cast<V>(v);
 }
 inline __m256 m(Floats v) { return std::bit_cast<__m256>(v); }
-
-// A constant in a register. GCC would make shifts and additions of a product with what it knows.
-inline __m256i kept(__m256i v) {
-#if !defined(__clang__)
-  asm("" : "+x"(v));
-#endif
-  return v;
-}
 
 inline __m128i loadHalf(const void* p) { return _mm_loadu_si128(static_cast<const __m128i*>(p)); }
 // 16 bytes at `low` and 16 at `high`, in the halves of a register.
@@ -302,7 +296,7 @@ inline Two<SignedHalves> asSigned(const Two<Halves>& a) {
 }
 inline Two<SignedHalves> difference(Bytes a, Bytes b) {
   // Products of neighbours with 1 and -1.
-  const __m256i weights = x86::kept(_mm256_set1_epi16(static_cast<int16_t>(0xff01)));
+  const __m256i weights = kept(_mm256_set1_epi16(static_cast<int16_t>(0xff01)));
   return {x86::as<SignedHalves>(_mm256_maddubs_epi16(_mm256_unpacklo_epi8(x86::m(a), x86::m(b)), weights)),
           x86::as<SignedHalves>(_mm256_maddubs_epi16(_mm256_unpackhi_epi8(x86::m(a), x86::m(b)), weights))};
 }
@@ -343,7 +337,7 @@ inline Two<V> addShifted(const Two<V>& a, const Two<V>& b) {
 }
 /// (2 a weight + 2^15) >> 16
 inline Two<SignedHalves> multiplyRounded(const Two<SignedHalves>& a, int16_t weight) {
-  const __m256i w = x86::kept(_mm256_set1_epi16(weight));
+  const __m256i w = kept(_mm256_set1_epi16(weight));
   return {x86::as<SignedHalves>(_mm256_mulhrs_epi16(x86::m(a.low), w)),
           x86::as<SignedHalves>(_mm256_mulhrs_epi16(x86::m(a.high), w))};
 }
