@@ -52,7 +52,7 @@ struct field {
   jfieldID* id;
 };
 
-const field kFields[] = {
+const field fields[] = {
     {kRectClass, "left", "I", &registry.rect.left},
     {kRectClass, "top", "I", &registry.rect.top},
     {kRectClass, "right", "I", &registry.rect.right},
@@ -151,7 +151,7 @@ jobject ky_pointf_t_to_java_pointf(JNIEnv* env, const ky_pointf_t* point) {
 }  // namespace
 
 int register_face_fields(JNIEnv* env) {
-  if (find_fields(env, kFields, static_cast<int>(std::size(kFields))) < 0) {
+  if (find_fields(env, fields, static_cast<int>(std::size(fields))) < 0) {
     return -1;
   }
   if (!registerClass(env, kPointFClass, &registry.mPointFClass, &registry.newPointF)) {
