@@ -18,6 +18,10 @@ inline __attribute__((always_inline)) void forget(T& value) {
   } else {
 #if defined(__ARM_NEON)
     asm("" : "+w"(value));
+#elif defined(__clang__)
+    if constexpr (sizeof(T) >= 16) {  // it has no such register for less
+      asm("" : "+x"(value));
+    }
 #else
     asm("" : "+x"(value));
 #endif
