@@ -282,9 +282,8 @@ class PixelRow {
 /// - `kUniform`: whether `vector` and `scalar` give identical results, so that rows may be joined and the
 ///   last block of a row may overlap its neighbour. Otherwise `vector` does a row's whole groups of 8 pixels
 ///   and `scalar` the rest;
-/// - `vector(Pixels<BlockOf<Src>, kSrcChannels>)` giving `Pixels<BlockOf<Dst>, kDstChannels>`, for a block;
-/// of a destination
-///   with four channels it may give three, then alpha is opaque;
+/// - `vector(Pixels<BlockOf<Src>, kSrcChannels>)` giving `Pixels<BlockOf<Dst>, kDstChannels>`, for a block.
+///   Of a destination with four channels it may give three, then alpha is opaque;
 /// - `scalar(const Src*, Dst*)`, for one pixel;
 /// - `Vector`, the register of a block, if it is not that of BlockOf;
 /// - `kWeighs`, if `vector` takes Colours;

@@ -20,8 +20,7 @@ inline float32x4_t vfmsq_f32(float32x4_t a, float32x4_t b, float32x4_t c) { retu
 
 namespace HPC::fastcv::arm {
 
-#if !defined(__ARM_NEON)
-// Blocks of 16 bytes, for the kernels that are still written in intrinsics.
+// Blocks of 16 bytes: all on Arm, on x86-64 those of the kernels that are still written in intrinsics.
 inline void load(const unsigned char* p, uint8x16_t& v) { v = vld1q_u8(p); }
 inline void load(const float* p, float32x4_t& v) { v = vld1q_f32(p); }
 inline void store(unsigned char* p, uint8x16_t v) { vst1q_u8(p, v); }
@@ -58,7 +57,6 @@ inline void storeChannels(float* p, const float32x4_t (&c)[4]) {
   const float32x4x4_t v = {{c[0], c[1], c[2], c[3]}};
   vst4q_f32(p, v);
 }
-#endif
 
 /// Two vectors narrowed into one: (x + 2^(n-1)) >> n of each lane, limited to a byte.
 template <int n>
