@@ -15,16 +15,13 @@
 //
 // Chroma belongs to a 2 x 2 block and is made from its top-left pixel alone.
 //
-// A frame of H luma rows has one stride for everything. Its chroma rows are half a luma row wide and lie two
-// to a stride row, first one plane, then the other; where H / 2 is odd, the second plane starts in the second
-// half of the stride row in which the first ends.
-//
 // Both loops find their vector constants in an object that their caller fills, and are not inlined there: a
 // compiler that sees the values does not keep them in registers but makes them anew in every block.
 
 #include <cstddef>
 
 #include "entry.h"
+#include "i420.h"
 #include "kernel_assert.h"
 #include "simd/loop.h"
 
@@ -47,32 +44,6 @@ constexpr int kRV = 1673527;
 constexpr int kYB = 102760, kYG = 528482, kYR = 269484;
 constexpr int kUB = 460324, kUG = -305135, kUR = -155188;
 constexpr int kVB = -74448, kVG = -385875, kVR = 460324;
-
-// The chroma planes of a frame. A step says in which half of a stride row, 0 or 1, a plane starts.
-template <typename T>
-struct ChromaPlanes {
-  T* u;
-  T* v;
-  int uStep;
-  int vStep;
-};
-
-// `uIdx` is the place of the U plane.
-template <int uIdx, typename T>
-ChromaPlanes<T> chromaPlanesOf(T* frame, ptrdiff_t height, ptrdiff_t width, ptrdiff_t stride) {
-  static_assert(uIdx == 0 || uIdx == 1);
-  const int step = height % 4 == 2 ? 1 : 0;
-  T* const first = frame + height * stride;
-  T* const second = first + height / 4 * stride + step * (width / 2);
-  return uIdx == 0 ? ChromaPlanes<T>{first, second, 0, step} : ChromaPlanes<T>{second, first, step, 0};
-}
-
-// Row `j` of a chroma plane.
-template <typename T>
-T* chromaRow(T* plane, int step, ptrdiff_t j, ptrdiff_t stride, ptrdiff_t width) {
-  const ptrdiff_t half = step + j;
-  return plane + half / 2 * stride + (half % 2 - step) * (width / 2);
-}
 
 // ---- I420 to BGR
 

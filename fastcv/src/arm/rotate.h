@@ -6,6 +6,8 @@
 
 #include <cstddef>
 
+#include "i420.h"
+
 namespace HPC::fastcv::arm {
 
 /// An image to read; `stride` in bytes.
@@ -14,17 +16,6 @@ struct SourceImage {
   ptrdiff_t stride;
   ptrdiff_t height;
   ptrdiff_t width;
-};
-
-/// The rows of an image: row r + 1 begins `afterEven` bytes behind row r where r is even, `afterOdd` where it
-/// is odd. Both are the stride of an ordinary image.
-template <typename Byte>
-struct Rows {
-  Byte* data;
-  ptrdiff_t afterEven;
-  ptrdiff_t afterOdd;
-
-  Byte* at(ptrdiff_t r) const { return data + r / 2 * (afterEven + afterOdd) + r % 2 * afterEven; }
 };
 
 /// An image to write.

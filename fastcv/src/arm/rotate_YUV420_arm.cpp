@@ -3,16 +3,12 @@
 
 // Rotation of whole YUV 4:2:0 frames by right angles: the luma as an image of one-byte pixels; the chroma of
 // a semi-planar frame as one of two-byte pixels, of a planar frame plane by plane.
-//
-// A planar frame (I420) with stride S keeps two chroma rows in a buffer row: row 2k of a plane at the row's
-// start, row 2k + 1 half a width behind it. The U plane begins below the luma rows. The V plane begins where
-// U ends, which is in the middle of a buffer row when the number of chroma rows is odd. With S equal to the
-// width that is plain contiguous I420.
 
 #include <cstdlib>
 #include <memory>
 
 #include "entry.h"
+#include "i420.h"
 #include "kernel_assert.h"
 #include "rotate.h"
 #include "simd/copy.h"
@@ -25,25 +21,6 @@ using arm::Rows;
 template <int bytes>
 void rotatePlane(int degree, const arm::SourceImage& in, const arm::TargetImage& out) {
   arm::rotatePixels<bytes, arm::kRotateBlock, arm::kRotateBlock>(degree, in, out);
-}
-
-template <typename Byte>
-struct Planes {
-  Rows<Byte> luma;
-  Rows<Byte> u;
-  Rows<Byte> v;
-};
-
-template <typename Byte>
-Planes<Byte> planesOf(Byte* frame, ptrdiff_t stride, int lumaHeight, int width) {
-  const ptrdiff_t half = width / 2;
-  const ptrdiff_t rest = stride - half;
-  const bool inTheMiddle = lumaHeight % 4 / 2 != 0;
-  Byte* const u = frame + lumaHeight * stride;
-  Byte* const v = u + lumaHeight / 4 * stride;
-  return {{frame, stride, stride},
-          {u, half, rest},
-          inTheMiddle ? Rows<Byte>{v + half, rest, half} : Rows<Byte>{v, half, rest}};
 }
 
 struct Free {
@@ -80,15 +57,17 @@ void imgRotate_I420(int inHeight, int inWidth, int inWidthStride, const T* inDat
   if (u == nullptr || v == nullptr) {
     return;
   }
-  const Planes<const T> in = planesOf(inData, inWidthStride, lumaIn, inWidth);
-  gather(in.u, chromaHeight, chromaWidth, u.get());
-  gather(in.v, chromaHeight, chromaWidth, v.get());
-  const Planes<T> out = planesOf(outData, outWidthStride, lumaOut, outWidth);
-  rotatePlane<1>(degree, {inData, inWidthStride, lumaIn, inWidth}, {out.luma, lumaOut, outWidth});
+  const auto in = arm::chromaPlanesOf<0>(inData, lumaIn, inWidth, inWidthStride);
+  gather(arm::chromaRowsOf(in.u, in.uStep, inWidthStride, inWidth), chromaHeight, chromaWidth, u.get());
+  gather(arm::chromaRowsOf(in.v, in.vStep, inWidthStride, inWidth), chromaHeight, chromaWidth, v.get());
+  const ptrdiff_t outStride = outWidthStride;
+  const auto out = arm::chromaPlanesOf<0>(outData, lumaOut, outWidth, outStride);
+  rotatePlane<1>(degree, {inData, inWidthStride, lumaIn, inWidth},
+                 {{outData, outStride, outStride}, lumaOut, outWidth});
   rotatePlane<1>(degree, {u.get(), chromaWidth, chromaHeight, chromaWidth},
-                 {out.u, lumaOut / 2, outWidth / 2});
+                 {arm::chromaRowsOf(out.u, out.uStep, outStride, outWidth), lumaOut / 2, outWidth / 2});
   rotatePlane<1>(degree, {v.get(), chromaWidth, chromaHeight, chromaWidth},
-                 {out.v, lumaOut / 2, outWidth / 2});
+                 {arm::chromaRowsOf(out.v, out.vStep, outStride, outWidth), lumaOut / 2, outWidth / 2});
 }
 
 template <typename T>
