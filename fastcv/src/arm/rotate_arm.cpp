@@ -48,7 +48,10 @@ class QuarterTurn {
     static_assert(blockHeight % 2 == 0 && blockHeight % kTile.columns == 0 && blockWidth % kTile.rows == 0);
     const ptrdiff_t height = wholeBlocks(target_.height, blockHeight);
     const ptrdiff_t width = wholeBlocks(target_.width, blockWidth);
-    for (ptrdiff_t r = 0; r < height; r += blockHeight) {
+    // In the order of the source's columns: what a processor reads ahead of a block's pieces of rows is in
+    // the next ones.
+    const ptrdiff_t step = upwards_ ? -blockHeight : blockHeight;
+    for (ptrdiff_t r = upwards_ ? height - blockHeight : 0; r >= 0 && r < height; r += step) {
       for (ptrdiff_t c = 0; c < width; c += blockWidth) {
         area(r, std::integral_constant<int, blockHeight>{}, c, std::integral_constant<int, blockWidth>{});
       }
