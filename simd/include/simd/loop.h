@@ -260,13 +260,26 @@ class PixelRow {
 
   template <int n, typename From, typename To, typename Alpha>
   static void convertBlocks(const Op& op, const From& from, const To& to, const Alpha& alpha) {
-    const auto compute = [&](const auto& block) { return op.vector(block); };
+    const auto compute = [&](const auto& block) {
+      if constexpr (requires { Op::kSwaps; }) {
+        return block;
+      } else {
+        return op.vector(block);
+      }
+    };
     if constexpr (requires { Op::kPacked; }) {
       inFlight<n>([&](int i) { return loadPacked<SrcBlock>(from(i)); }, compute,
                   [&](int i, const auto& block) { storePacked(to(i), block); });
     } else if constexpr (requires { Op::kWeighs; }) {
       inFlight<n>([&](int i) { return loadColours<kSrc>(from(i)); }, compute,
                   [&](int i, const auto& block) { storePixels(to(i), block); });
+    } else if constexpr (requires { Op::kSwaps; }) {
+      // Three channels are looked up anyway, when they are loaded or when they are stored.
+      constexpr bool kEarly = Op::kSwaps && kSrc == 3;
+      inFlight<n>([&](int i) { return loadColours<kSrc, kEarly>(from(i)); }, compute,
+                  [&](int i, const auto& block) {
+                    storeColours<kDst, Op::kSwaps && !kEarly>(to(i), block, alpha(i));
+                  });
     } else {
       inFlight<n>([&](int i) { return loadPixels<SrcBlock, kSrc>(from(i)); }, compute,
                   [&](int i, const auto& block) { storePixels(to(i), withAlpha<kDst>(block, alpha(i))); });
@@ -287,6 +300,8 @@ class PixelRow {
 /// - `scalar(const Src*, Dst*)`, for one pixel;
 /// - `Vector`, the register of a block, if it is not that of BlockOf;
 /// - `kWeighs`, if `vector` takes Colours;
+/// - `kSwaps` instead of `vector`, if all that happens to a pixel is that its first and third channel change
+///   places, where it is true, and that a fourth one comes, opaque, or goes;
 /// - `kPacked`, if `vector` takes and gives blocks of 4-channel pixels as they lie in memory, not a channel a
 ///   register.
 /// Strides count elements. Rows are worked on from their starts, each block read before it is written, so

@@ -187,11 +187,23 @@ struct EvenColours {
   uint8x8_t c[3];
 };
 
-template <int nc>
+/// Loads them, of three channels the first and the third swapped or not.
+template <int nc, bool swapped = false>
 inline Colours loadColours(const unsigned char* p) {
   Bytes v[nc];
   loadChannels(p, v);
-  return {{v[0], v[1], v[2]}};
+  return {{v[swapped ? 2 : 0], v[1], v[swapped ? 0 : 2]}};
+}
+/// The way back, where `swapped` with the first and the third channel swapped. Of four channels the last is
+/// 255.
+template <int nc, bool swapped>
+inline void storeColours(unsigned char* p, const Colours& v, Bytes opaque) {
+  const Bytes first = v.c[swapped ? 2 : 0], third = v.c[swapped ? 0 : 2];
+  if constexpr (nc == 4) {
+    storeChannels(p, {first, v.c[1], third, opaque});
+  } else {
+    storeChannels(p, {first, v.c[1], third});
+  }
 }
 inline EvenColours evenColumns(const Colours& v) {
   const auto even = [](Bytes channel) { return vmovn_u16(vreinterpretq_u16_u8(channel)); };

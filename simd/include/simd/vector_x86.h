@@ -49,7 +49,7 @@ inline void storeHalves(void* low, void* high, __m256i v) {
 }
 inline void storeWhole(void* p, __m256i v) { _mm256_storeu_si256(static_cast<__m256i*>(p), v); }
 
-// Byte i of a table is f(i); -1 makes a 0 where it is a shuffle.
+// Byte i of a table is f(i). What is negative makes a 0 where it is a shuffle.
 struct alignas(16) Table {
   std::array<int8_t, 16> bytes;
   __m256i twice() const { return _mm256_broadcastsi128_si256(loadHalf(bytes.data())); }
@@ -376,17 +376,21 @@ struct EvenColours {
   __m256i v[2];
 };
 
-template <int nc>
+/// Loads them, of three channels the first and the third swapped or not.
+template <int nc, bool swapped = false>
 inline Colours loadColours(const unsigned char* p) {
   Colours all;
   if constexpr (nc == 4) {
+    static_assert(!swapped);
     x86::loadFour(p, all.v);
   } else {
     static_assert(nc == 3);
-    static constexpr x86::Table kFirst =
-        x86::tableOf([](int i) { return i % 4 == 3 ? -1 : i / 4 * 3 + i % 4; });
-    static constexpr x86::Table kLast =
-        x86::tableOf([](int i) { return i % 4 == 3 ? -1 : i / 4 * 3 + i % 4 + 4; });
+    static constexpr auto kFrom = [](int i) {
+      const int channel = i % 4;
+      return channel == 3 ? -16 : i / 4 * 3 + (swapped ? 2 - channel : channel);
+    };
+    static constexpr x86::Table kFirst = x86::tableOf(kFrom);
+    static constexpr x86::Table kLast = x86::tableOf([](int i) { return kFrom(i) + 4; });
     for (int i = 0; i < 3; ++i) {
       all.v[i] = _mm256_shuffle_epi8(x86::loadHalves(p + 12 * i, p + 48 + 12 * i), kFirst.twice());
     }
@@ -394,6 +398,31 @@ inline Colours loadColours(const unsigned char* p) {
     all.v[3] = _mm256_shuffle_epi8(x86::loadHalves(p + 32, p + 80), kLast.twice());
   }
   return all;
+}
+/// The way back, where `swapped` with the first and the third channel swapped. Of four channels the last is
+/// 255: what stands for it is 0 or that.
+template <int nc, bool swapped>
+inline void storeColours(unsigned char* p, const Colours& c, Bytes opaque) {
+  __m256i v[4];
+  if constexpr (nc == 4) {
+    static_assert(!swapped);
+    for (int i = 0; i < 4; ++i) {
+      v[i] = _mm256_or_si256(c.v[i], _mm256_slli_epi32(x86::m(opaque), 24));
+    }
+    x86::storeFour(p, v);
+  } else {
+    // The 12 bytes of register k go to byte 12 k of three registers, those beyond one to the next one's start.
+    [&]<int... k>(std::integer_sequence<int, k...>) {
+      static constexpr x86::Table kOrder[] = {x86::tableOf([](int i) {
+        const int from = (i + 4 * k) % 16;
+        return from < 12 ? from / 3 * 4 + (swapped ? 2 - from % 3 : from % 3) : -1;
+      })...};
+      ((v[k] = _mm256_shuffle_epi8(c.v[k], kOrder[k].twice())), ...);
+    }(std::make_integer_sequence<int, 4>{});
+    x86::storeHalves(p, p + 48, _mm256_blend_epi32(v[0], v[1], 0x88));
+    x86::storeHalves(p + 16, p + 64, _mm256_blend_epi32(v[1], v[2], 0xcc));
+    x86::storeHalves(p + 32, p + 80, _mm256_blend_epi32(v[2], v[3], 0xee));
+  }
 }
 inline EvenColours evenColumns(const Colours& c) {
   const auto even = [](__m256i a, __m256i b) {
