@@ -72,7 +72,7 @@ struct FromGray {
   static constexpr int kInFlight = ncDst == 3 ? 8 : 4;
   static constexpr bool kUniform = true;
 
-  Pixels<BlockOf<T>, 3> vector(const Pixels<BlockOf<T>, 1>& p) const { return {{p.c[0], p.c[0], p.c[0]}}; }
+  Pixels<BlockOf<T>, 1> vector(const Pixels<BlockOf<T>, 1>& p) const { return p; }
 
   void scalar(const T* in, T* out) const { storePixel<ncDst, T>(out, *in, *in, *in); }
 };

@@ -52,9 +52,7 @@ struct Reorder<float, ncSrc, ncDst, order> {
     return {{p.c[kFirst], p.c[1], p.c[kThird]}};
   }
 
-  void scalar(const float* in, float* out) const {
-    storePixel<ncDst>(out, in[kFirst], in[1], in[kThird]);
-  }
+  void scalar(const float* in, float* out) const { storePixel<ncDst>(out, in[kFirst], in[1], in[kThird]); }
 };
 
 /// Red and blue swapped, alpha kept. A pixel's bytes stay within their register, so a table look-up per

@@ -296,7 +296,8 @@ class PixelRow {
 ///   last block of a row may overlap its neighbour. Otherwise `vector` does a row's whole groups of 8 pixels
 ///   and `scalar` the rest;
 /// - `vector(Pixels<BlockOf<Src>, kSrcChannels>)` giving `Pixels<BlockOf<Dst>, kDstChannels>`, for a block.
-///   Of a destination with four channels it may give three, then alpha is opaque;
+///   Of a destination with four channels it may give three, then alpha is opaque; of one with three or four,
+///   one that is all colours;
 /// - `scalar(const Src*, Dst*)`, for one pixel;
 /// - `Vector`, the register of a block, if it is not that of BlockOf;
 /// - `kWeighs`, if `vector` takes Colours;

@@ -82,14 +82,30 @@ inline void storePacked(ElementOf<V>* p, const Pixels<V, 4>& v) {
   storeRow(p, v.c);
 }
 
-/// A block with `nc` channels: `v` itself, or its three channels and `alpha`.
+/// A block of three channels that are all `v`.
+template <typename V>
+struct Gray {
+  V v;
+};
+template <typename V>
+inline void storePixels(ElementOf<V>* p, const Gray<V>& gray) {
+  storeThrice(p, gray.v);
+}
+
+/// A block with `nc` channels: `v` itself, or its three channels, or three times its one, and `alpha`.
 template <int nc, typename V, int channels>
-inline Pixels<V, nc> withAlpha(const Pixels<V, channels>& v, V alpha) {
+inline auto withAlpha(const Pixels<V, channels>& v, V alpha) {
   if constexpr (nc == channels) {
     return v;
+  } else if constexpr (channels == 1) {
+    if constexpr (nc == 3) {
+      return Gray<V>{v.c[0]};
+    } else {
+      return Pixels<V, nc>{{v.c[0], v.c[0], v.c[0], alpha}};
+    }
   } else {
     static_assert(nc == 4 && channels == 3);
-    return {{v.c[0], v.c[1], v.c[2], alpha}};
+    return Pixels<V, nc>{{v.c[0], v.c[1], v.c[2], alpha}};
   }
 }
 

@@ -63,6 +63,10 @@ inline void storeRow(float* p, const Floats (&v)[4]) {
   vst1q_f32_x4(p, all);
 }
 
+/// Pixels of three channels that are all `v`.
+inline void storeThrice(unsigned char* p, Bytes v) { storeChannels(p, {v, v, v}); }
+inline void storeThrice(float* p, Floats v) { storeChannels(p, {v, v, v}); }
+
 // ---- lanes
 
 inline Bytes min(Bytes a, Bytes b) { return vminq_u8(a, b); }

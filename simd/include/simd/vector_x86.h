@@ -230,6 +230,21 @@ inline void storeRow(T* p, const V (&v)[4]) {
   }
 }
 
+/// Pixels of three channels that are all `v`.
+template <typename V>
+inline void storeThrice(ElementOf<V>* p, V v) {
+  constexpr int kSize = sizeof(v[0]);
+  const auto store = [=]<int part>(std::integral_constant<int, part>) {
+    static constexpr x86::Table kOrder =
+        x86::tableOf([](int i) { return (16 * part + i) / (3 * kSize) * kSize + i % kSize; });
+    auto* const bytes = reinterpret_cast<unsigned char*>(p) + 16 * part;
+    x86::storeHalves(bytes, bytes + 48, _mm256_shuffle_epi8(std::bit_cast<__m256i>(v), kOrder.twice()));
+  };
+  store(std::integral_constant<int, 0>{});
+  store(std::integral_constant<int, 1>{});
+  store(std::integral_constant<int, 2>{});
+}
+
 // ---- lanes
 
 inline Bytes min(Bytes a, Bytes b) { return x86::as<Bytes>(_mm256_min_epu8(x86::m(a), x86::m(b))); }
@@ -411,7 +426,8 @@ inline void storeColours(unsigned char* p, const Colours& c, Bytes opaque) {
     }
     x86::storeFour(p, v);
   } else {
-    // The 12 bytes of register k go to byte 12 k of three registers, those beyond one to the next one's start.
+    // The 12 bytes of register k go to byte 12 k of three registers, those beyond one to the next one's
+    // start.
     [&]<int... k>(std::integer_sequence<int, k...>) {
       static constexpr x86::Table kOrder[] = {x86::tableOf([](int i) {
         const int from = (i + 4 * k) % 16;
