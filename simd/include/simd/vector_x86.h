@@ -162,7 +162,7 @@ inline __m256i zero() { return _mm256_setzero_si256(); }
 
 template <typename V>
 inline V splat(ElementOf<V> value) {
-  return V{} + value;
+  return value - V{};  // which 0 + value is not, of -0
 }
 
 inline Bytes load(const unsigned char* p) {
