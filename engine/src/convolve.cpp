@@ -76,7 +76,7 @@ class Finisher {
  public:
   /// The sums are so many times too large as `scale` is less than 1.
   Finisher(const Convolution& c, const Finish& finish, const Map& to, int channel, float scale)
-      : factor_(Multiply(Load(c.factors.data() + channel), Broadcast(scale))),
+      : factor_(Load(c.factors.data() + channel) * Broadcast(scale)),
         offset_(Load(c.offsets.data() + channel)),
         rectify_(finish.rectify),
         skip_(finish.skip == nullptr ? nullptr : finish.skip->data),
@@ -86,7 +86,7 @@ class Finisher {
   void Store(const Lanes& sum, ptrdiff_t at) const {
     Lanes result = MultiplyAdd(offset_, sum, factor_);
     if (skip_ != nullptr) {
-      result = Add(result, Load(skip_ + at));
+      result = result + Load(skip_ + at);
     }
     kyengine::Store(rectify_ ? Max(result, Broadcast(0)) : result, to_ + at);
   }
@@ -176,11 +176,11 @@ constexpr int kLeastTiledSide = 2 * kTile;
 
 void TransformWeights(const Lanes (&w)[kKernel], Lanes (&transformed)[kWindow]) {
   const Lanes two = Broadcast(2);
-  const Lanes near = Add(w[0], w[2]);
+  const Lanes near = w[0] + w[2];
   const Lanes far = MultiplyAdd(w[0], Broadcast(4), w[2]);
   transformed[0] = w[0];
-  transformed[1] = Add(near, w[1]);
-  transformed[2] = Subtract(near, w[1]);
+  transformed[1] = near + w[1];
+  transformed[2] = near - w[1];
   transformed[3] = MultiplyAdd(far, two, w[1]);
   transformed[4] = MultiplySubtract(far, two, w[1]);
   transformed[5] = w[2];
@@ -192,11 +192,11 @@ void TransformPixels(const Lanes (&p)[kWindow], Lanes (&transformed)[kWindow]) {
   const Lanes five = Broadcast(5);
   const Lanes near_even = MultiplySubtract(p[4], four, p[2]);
   const Lanes near_odd = MultiplySubtract(p[3], four, p[1]);
-  const Lanes far_even = Subtract(p[4], p[2]);
-  const Lanes far_odd = Subtract(p[3], p[1]);
+  const Lanes far_even = p[4] - p[2];
+  const Lanes far_odd = p[3] - p[1];
   transformed[0] = MultiplyAdd(MultiplySubtract(p[4], five, p[2]), four, p[0]);
-  transformed[1] = Add(near_even, near_odd);
-  transformed[2] = Subtract(near_even, near_odd);
+  transformed[1] = near_even + near_odd;
+  transformed[2] = near_even - near_odd;
   transformed[3] = MultiplyAdd(far_even, two, far_odd);
   transformed[4] = MultiplySubtract(far_even, two, far_odd);
   transformed[5] = MultiplyAdd(MultiplySubtract(p[5], five, p[3]), four, p[1]);
@@ -205,13 +205,13 @@ void TransformPixels(const Lanes (&p)[kWindow], Lanes (&transformed)[kWindow]) {
 /// The results, 24 times.
 void TransformSums(const Lanes (&s)[kWindow], Lanes (&results)[kTile]) {
   const Lanes four = Broadcast(4);
-  const Lanes near_even = Multiply(Add(s[1], s[2]), four);
-  const Lanes near_odd = Multiply(Subtract(s[2], s[1]), four);
-  const Lanes far_even = Add(s[3], s[4]);
-  const Lanes far_odd = Subtract(s[3], s[4]);
-  results[0] = MultiplyAdd(Subtract(far_even, near_even), Broadcast(6), s[0]);
+  const Lanes near_even = (s[1] + s[2]) * four;
+  const Lanes near_odd = (s[2] - s[1]) * four;
+  const Lanes far_even = s[3] + s[4];
+  const Lanes far_odd = s[3] - s[4];
+  results[0] = MultiplyAdd(far_even - near_even, Broadcast(6), s[0]);
   results[1] = MultiplyAdd(near_odd, Broadcast(2), far_odd);
-  results[2] = Subtract(Multiply(far_even, four), near_even);
+  results[2] = far_even * four - near_even;
   results[3] = MultiplyAdd(MultiplyAdd(near_odd, Broadcast(8), far_odd), Broadcast(24), s[5]);
 }
 

@@ -170,7 +170,7 @@ void AddMeansAndRectify(const Map& from, const Map& to) {
     Lanes sum = Load(to.at(y, x) + channel);
     if (channel < from.channels) {
       const auto at = [&](int dy, int dx) { return Load(from.at(2 * y + dy, 2 * x + dx) + channel); };
-      sum = MultiplyAdd(sum, Add(Add(at(0, 0), at(0, 1)), Add(at(1, 0), at(1, 1))), Broadcast(0.25F));
+      sum = MultiplyAdd(sum, (at(0, 0) + at(0, 1)) + (at(1, 0) + at(1, 1)), Broadcast(0.25F));
     }
     Store(Max(sum, Broadcast(0)), to.at(y, x) + channel);
   });
