@@ -7,8 +7,8 @@
 
 #include "luminance_tables.h"
 #include "region.h"
-#include "simd/gamma_planes.h"
 #include "simd/lab_tables.h"
+#include "simd/pixel.h"
 
 namespace kyface::brightness {
 
@@ -21,6 +21,7 @@ class LightnessSum {
  public:
   static constexpr int kChannels = 4;
   static constexpr int kInFlight = 1;
+  static constexpr bool kWeighs = false;
 
   LightnessSum() {
 #pragma GCC unroll 16
@@ -30,24 +31,20 @@ class LightnessSum {
   }
 
   template <int n>
-  void add(const Block<kChannels> (&pixels)[n]) {
-    uint8x16_t bytes[3 * n];
+  void add(const arm::Pixels<arm::Bytes, kChannels> (&pixels)[n]) {
+    arm::Bytes bytes[3 * n];
     for (int i = 0; i < n; ++i) {
       bytes[3 * i] = pixels[i].c[blue];
       bytes[3 * i + 1] = pixels[i].c[1];
       bytes[3 * i + 2] = pixels[i].c[2 - blue];
     }
-    arm::Light light[3 * n];
+    arm::Two<arm::Halves> light[3 * n];
     arm::lookUp(gamma_, bytes, light);
     uint32_t total = 0;
     for (int i = 0; i < n; ++i) {
-      for (int half = 0; half < 2; ++half) {
-        const uint16x8_t b = light[3 * i].half[half];
-        const uint16x8_t g = light[3 * i + 1].half[half];
-        const uint16x8_t r = light[3 * i + 2].half[half];
-        total += lightness(luminance(vget_low_u16(b), vget_low_u16(g), vget_low_u16(r)));
-        total += lightness(luminance(vget_high_u16(b), vget_high_u16(g), vget_high_u16(r)));
-      }
+      const auto &b = light[3 * i], &g = light[3 * i + 1], &r = light[3 * i + 2];
+      total += lightness(luminance_(b.low, g.low, r.low));
+      total += lightness(luminance_(b.high, g.high, r.high));
     }
     total_ += total;
   }
@@ -55,18 +52,16 @@ class LightnessSum {
   uint32_t total() const { return total_; }
 
  private:
-  // Y in units of 1 / 2040: at most 2040, as the weights sum to 4096.
-  static uint32x4_t luminance(uint16x4_t b, uint16x4_t g, uint16x4_t r) {
-    uint32x4_t sum = vmull_n_u16(b, arm::kYWeights.b);
-    sum = vmlal_n_u16(sum, g, arm::kYWeights.g);
-    sum = vmlal_n_u16(sum, r, arm::kYWeights.r);
-    return vrshrq_n_u32(sum, arm::kWeightShift);
-  }
-
-  // Summed up over four pixels.
-  static uint32_t lightness(uint32x4_t y) {
-    return lightness(vgetq_lane_u32(y, 0)) + lightness(vgetq_lane_u32(y, 1)) +
-           lightness(vgetq_lane_u32(y, 2)) + lightness(vgetq_lane_u32(y, 3));
+  // Summed up over pixels, of Y in units of 1 / 2040: at most 2040, as the weights sum to 4096.
+  static uint32_t lightness(const arm::Two<arm::Words>& y) {
+    uint32_t sum = 0;
+    for (const arm::Words& each : {y.low, y.high}) {
+#pragma GCC unroll 8
+      for (int i = 0; i < arm::kLanes<arm::Words>; ++i) {
+        sum += lightness(each[i]);
+      }
+    }
+    return sum;
   }
 
   // In 0..255 for every Y that occurs: there is nothing to clamp.
@@ -75,7 +70,8 @@ class LightnessSum {
            arm::kLightnessShift;
   }
 
-  arm::GammaPlanes gamma_;
+  arm::WideTable gamma_;
+  arm::WeighedHalves<arm::kWeightShift> luminance_{arm::kYWeights.b, arm::kYWeights.g, arm::kYWeights.r};
   uint32_t total_ = 0;
 };
 

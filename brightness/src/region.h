@@ -4,10 +4,12 @@
 #pragma once
 
 #include <algorithm>
+#include <array>
 #include <cstddef>
 #include <cstdint>
 #include <cstdio>
 #include <cstring>
+#include <numeric>
 
 #include "brightness/clip.h"
 #include "simd/loop.h"
@@ -16,10 +18,7 @@
 namespace kyface::brightness {
 
 /// Pixels of a block.
-inline constexpr int kBlock = HPC::fastcv::arm::kLanes<uint8x16_t>;
-
-template <int nc>
-using Block = HPC::fastcv::arm::Pixels<uint8x16_t, nc>;
+inline constexpr int kBlock = HPC::fastcv::arm::kBlockPixels<unsigned char>;
 
 /// The arguments of a metric.
 struct Region {
@@ -49,19 +48,31 @@ struct Range {
   int64_t count() const { return end - first; }
 };
 
+/// A block of pixels, in the form in which `Sum` takes it.
+template <typename Sum>
+inline auto loadBlock(const unsigned char* p) {
+  using namespace HPC::fastcv::arm;
+  if constexpr (Sum::kWeighs) {
+    return loadColours<Sum::kChannels>(p);
+  } else {
+    return loadPixels<Bytes, Sum::kChannels>(p);
+  }
+}
+
 /// Adds a row of `length` >= 1 pixels to `sum`. The pixels after the last whole block come as one more block,
 /// in which those that are not to be counted are black: black adds nothing to any metric.
 template <typename Sum>
 inline void addRow(Sum& sum, const unsigned char* row, ptrdiff_t length) {
   using namespace HPC::fastcv::arm;
+  using Block = decltype(loadBlock<Sum>(row));
   constexpr int nc = Sum::kChannels;
   const ptrdiff_t rest = length % kBlock;
   walk<kBlock, Sum::kInFlight, kBlock>(
       length - rest, Tail::kSteps,
       [&](ptrdiff_t x, auto blocks) {
-        Block<nc> pixels[blocks];
+        Block pixels[blocks];
         for (int i = 0; i < blocks; ++i) {
-          pixels[i] = loadPixels<uint8x16_t, nc>(row + (x + ptrdiff_t{i} * kBlock) * nc);
+          pixels[i] = loadBlock<Sum>(row + (x + ptrdiff_t{i} * kBlock) * nc);
         }
         sum.add(pixels);
       },
@@ -69,26 +80,27 @@ inline void addRow(Sum& sum, const unsigned char* row, ptrdiff_t length) {
   if (rest == 0) {
     return;
   }
-  Block<nc> last[1];
+  Block last[1];
   if (length > kBlock) {
-    static constexpr unsigned char kColumns[kBlock] = {0, 1, 2, 3, 4, 5, 6, 7, 8, 9, 10, 11, 12, 13, 14, 15};
-    last[0] = loadPixels<uint8x16_t, nc>(row + (length - kBlock) * nc);
-    const uint8x16_t counts =
-        vcgeq_u8(vld1q_u8(kColumns), splat<uint8x16_t>(static_cast<unsigned char>(kBlock - rest)));
-    for (uint8x16_t& channel : last[0].c) {
-      channel = vandq_u8(channel, counts);
-    }
+    static constexpr auto kColumns = [] {
+      std::array<unsigned char, kBlock> columns{};
+      std::iota(columns.begin(), columns.end(), 0);
+      return columns;
+    }();
+    const auto counts = load(kColumns.data()) >= splat<Bytes>(static_cast<unsigned char>(kBlock - rest));
+    last[0] = masked((Bytes)counts, loadBlock<Sum>(row + (length - kBlock) * nc));
   } else {
     unsigned char padded[kBlock * nc] = {};
     memcpy(padded, row, static_cast<size_t>(rest * nc));
-    last[0] = loadPixels<uint8x16_t, nc>(padded);
+    last[0] = loadBlock<Sum>(padded);
   }
   sum.add(last);
 }
 
 /// The metric over a region. `Sum` adds up the values of pixels:
 /// - `kChannels`: bytes of a pixel; `kInFlight`: blocks it is best given at a time;
-/// - `add(const Block<kChannels> (&)[n])`: adds n blocks; a black pixel adds 0;
+/// - `kWeighs`: whether it takes blocks as Colours, not a channel a register;
+/// - `add(blocks)`: adds an array of blocks; a black pixel adds 0;
 /// - `total()`: the sum so far, in 32 bits.
 template <typename Sum>
 unsigned char meanOf(const Region& region) {

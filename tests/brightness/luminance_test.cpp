@@ -18,7 +18,6 @@
 
 namespace {
 
-using kyface::brightness::Block;
 using kyface::brightness::LightnessSum;
 using kyface::test::cubeRootEntry;
 using kyface::test::gammaEntry;
@@ -83,7 +82,7 @@ TEST(LuminanceTables, AreRebuiltByEveryCall) {
   }
 }
 
-// Every colour, in blocks of 16 with different reds.
+// Every colour, in blocks with different reds.
 template <int blue>
 void expectEveryColour() {
   constexpr int kBlock = kyface::brightness::kBlock;
@@ -103,8 +102,8 @@ void expectEveryColour() {
           bytes[4 * i + 3] = static_cast<unsigned char>(b + i);
           expected += static_cast<uint32_t>(reference(b, g, r + i));
         }
-        const Block<4> blocks[1] = {HPC::fastcv::arm::loadPixels<uint8x16_t, 4>(bytes)};
-        sum.add(blocks);
+        const auto block = kyface::brightness::loadBlock<LightnessSum<blue>>(bytes);
+        sum.add({block});
         ASSERT_EQ(sum.total() - before, expected) << b << ", " << g << ", " << r;
         before = sum.total();
       }

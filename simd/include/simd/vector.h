@@ -12,6 +12,7 @@
 /// by a constant, and comparisons, whose result is a mask for `select`.
 #pragma once
 
+#include <cstddef>
 #include <type_traits>
 #include <utility>
 
@@ -39,6 +40,26 @@ inline Two<V> operator-(V a, const Two<V>& b) {
 template <typename V>
 inline Two<V> operator~(const Two<V>& a) {
   return {~a.low, ~a.high};
+}
+
+/// The pixels whose byte in a mask is set, and black.
+template <typename V, typename Block>
+  requires requires(Block block) { block.c[0]; }
+inline Block masked(V mask, Block pixels) {
+  for (V& channel : pixels.c) {
+    channel &= mask;
+  }
+  return pixels;
+}
+
+/// The sum of all lanes.
+template <typename V>
+inline ElementOf<V> total(V v) {
+  ElementOf<V> sum = 0;
+  for (size_t i = 0; i < sizeof(V) / sizeof(sum); ++i) {
+    sum += v[i];
+  }
+  return sum;
 }
 
 /// Factors of the first three channels of a pixel.

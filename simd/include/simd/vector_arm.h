@@ -161,6 +161,15 @@ inline Two<SignedHalves> multiplyRounded(const Two<SignedHalves>& a, int16_t wei
   return {vqrdmulhq_n_s16(a.low, weight), vqrdmulhq_n_s16(a.high, weight)};
 }
 
+/// The sum, and those of neighbouring lanes.
+inline Halves addPairs(Halves sum, Bytes a) { return vpadalq_u8(sum, a); }
+inline Words addPairs(Words sum, Halves a) { return vpadalq_u16(sum, a); }
+/// The sum, and (a + 2^(n-1)) >> n of both registers.
+template <int n>
+inline Halves addRounded(Halves sum, const Two<Halves>& a) {
+  return vrsraq_n_u16(vrsraq_n_u16(sum, a.low, n), a.high, n);
+}
+
 // ---- narrowing
 
 /// (a + 2^(n-1)) >> n, limited to a byte.
@@ -321,6 +330,79 @@ inline Bytes subtractNarrowed(const EvenOdd& luma, const Two<SignedWords>& chrom
       vsubhn_s32(luma.even.low, chroma.low), vsubhn_s32(luma.even.high, chroma.high),
       vsubhn_s32(luma.odd.low, chroma.low), vsubhn_s32(luma.odd.high, chroma.high));
 }
+
+// ---- tables
+
+/// 256 entries of 16 bits, in the form in which vectors of bytes look them up: here four quarters of 64, each
+/// as low bytes and as high bytes.
+struct alignas(64) WideTable {
+  static constexpr int kQuarters = 4;
+  static constexpr int kEntries = 64;
+  unsigned char low[kQuarters][kEntries];
+  unsigned char high[kQuarters][kEntries];
+
+  constexpr void set(int index, uint16_t entry) {
+    low[index / kEntries][index % kEntries] = static_cast<unsigned char>(entry);
+    high[index / kEntries][index % kEntries] = static_cast<unsigned char>(entry >> 8);
+  }
+};
+
+namespace detail {
+inline uint8x16x4_t loadEntries(const unsigned char (&entries)[WideTable::kEntries]) {
+  return {{load(entries), load(entries + 16), load(entries + 32), load(entries + 48)}};
+}
+}  // namespace detail
+
+/// The entries that `n` vectors of bytes name: a quarter is held in registers for all of them.
+template <int n>
+inline void lookUp(const WideTable& table, const Bytes (&bytes)[n], Two<Halves> (&entries)[n]) {
+  Bytes index[n];
+  Bytes low[n];
+  Bytes high[n];
+  for (int i = 0; i < n; ++i) {
+    index[i] = bytes[i];
+    low[i] = high[i] = splat<Bytes>(0);
+  }
+  // Unrolled as a whole, all quarters would be loaded ahead of their use: that is more than there are
+  // registers.
+#pragma GCC unroll 2
+  for (int quarter = 0; quarter < WideTable::kQuarters; ++quarter) {
+    const uint8x16x4_t lows = detail::loadEntries(table.low[quarter]);
+    const uint8x16x4_t highs = detail::loadEntries(table.high[quarter]);
+    for (int i = 0; i < n; ++i) {
+      // An index outside the quarter leaves what was found before.
+      low[i] = vqtbx4q_u8(low[i], lows, index[i]);
+      high[i] = vqtbx4q_u8(high[i], highs, index[i]);
+      index[i] = index[i] - splat<Bytes>(WideTable::kEntries);
+    }
+  }
+  for (int i = 0; i < n; ++i) {
+    entries[i] = {(Halves)vzip1q_u8(low[i], high[i]), (Halves)vzip2q_u8(low[i], high[i])};
+  }
+}
+
+/// Three factors of 16 bits, here in one register.
+template <int n>
+class WeighedHalves {
+ public:
+  WeighedHalves(uint16_t f0, uint16_t f1, uint16_t f2) : factors_{f0, f1, f2} {
+    asm("" : "+w"(factors_));  // constants would be made one to a register
+  }
+
+  /// (f0 a + f1 b + f2 c + 2^(n-1)) >> n in 32 bits.
+  Two<Words> operator()(Halves a, Halves b, Halves c) const {
+    return {sum(vget_low_u16(a), vget_low_u16(b), vget_low_u16(c)),
+            sum(vget_high_u16(a), vget_high_u16(b), vget_high_u16(c))};
+  }
+
+ private:
+  Words sum(uint16x4_t a, uint16x4_t b, uint16x4_t c) const {
+    const Words products = vmlal_lane_u16(vmull_lane_u16(a, factors_, 0), b, factors_, 1);
+    return vrshrq_n_u32(vmlal_lane_u16(products, c, factors_, 2), n);
+  }
+
+  uint16x4_t factors_;
+};
 
 // ---- bytes as floats
 

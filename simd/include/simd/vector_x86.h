@@ -357,6 +357,20 @@ inline Two<SignedHalves> multiplyRounded(const Two<SignedHalves>& a, int16_t wei
           x86::as<SignedHalves>(_mm256_mulhrs_epi16(x86::m(a.high), w))};
 }
 
+/// The sum, and those of neighbouring lanes; lanes of 16 bits are less than 2^15.
+inline Halves addPairs(Halves sum, Bytes a) {
+  return sum + x86::as<Halves>(_mm256_maddubs_epi16(x86::m(a), _mm256_set1_epi8(1)));
+}
+inline Words addPairs(Words sum, Halves a) {
+  return sum + x86::as<Words>(_mm256_madd_epi16(x86::m(a), _mm256_set1_epi16(1)));
+}
+/// The sum, and (a + 2^(n-1)) >> n of both registers, which is less than 2^16 before the shift.
+template <int n>
+inline Halves addRounded(Halves sum, const Two<Halves>& a) {
+  constexpr uint16_t kHalf = 1 << (n - 1);
+  return sum + ((a.low + kHalf) >> n) + ((a.high + kHalf) >> n);
+}
+
 // ---- narrowing
 
 /// Limited to a byte, and to a signed one.
@@ -439,6 +453,15 @@ inline void storeColours(unsigned char* p, const Colours& c, Bytes opaque) {
     x86::storeHalves(p + 16, p + 64, _mm256_blend_epi32(v[1], v[2], 0xcc));
     x86::storeHalves(p + 32, p + 80, _mm256_blend_epi32(v[2], v[3], 0xee));
   }
+}
+/// Those of pixels whose byte in a mask is set, and black.
+inline Colours masked(Bytes mask, Colours c) {
+  static constexpr x86::Table kFourTimes = x86::tableOf([](int i) { return i / 4; });
+  for (int i = 0; i < 4; ++i) {
+    const __m256i index = _mm256_add_epi8(kFourTimes.twice(), _mm256_set1_epi8(static_cast<char>(4 * i)));
+    c.v[i] &= _mm256_shuffle_epi8(x86::m(mask), index);
+  }
+  return c;
 }
 inline EvenColours evenColumns(const Colours& c) {
   const auto even = [](__m256i a, __m256i b) {
@@ -640,6 +663,62 @@ inline Halves multiplyHigh(Halves a, uint16_t factor) {
   return x86::as<Halves>(_mm256_mulhi_epu16(x86::m(a), _mm256_set1_epi16(static_cast<int16_t>(factor))));
 }
 
+// ---- tables
+
+/// 256 entries of 16 bits, in the form in which vectors of bytes look them up.
+struct WideTable {
+  uint16_t entry[256];
+
+  constexpr void set(int index, uint16_t value) { entry[index] = value; }
+};
+
+/// The entries of a table that lanes name.
+template <typename Entry, typename V>
+  requires std::is_same_v<Entry, ElementOf<V>>
+inline V lookUp(const Entry* table, V index) {
+  std::array<Entry, sizeof(V) / sizeof(Entry)> found;
+#pragma GCC unroll 16
+  for (size_t i = 0; i < found.size(); ++i) {
+    found[i] = table[index[i]];
+  }
+  return std::bit_cast<V>(found);
+}
+inline Halves lookUp(const uint16_t* table, const Two<Words>& index) {
+  return lookUp(table, x86::as<Halves>(_mm256_packus_epi32(x86::m(index.low), x86::m(index.high))));
+}
+/// Those of each of `n` vectors of bytes.
+template <int n>
+inline void lookUp(const WideTable& table, const Bytes (&bytes)[n], Two<Halves> (&entries)[n]) {
+#pragma GCC unroll 3
+  for (int i = 0; i < n; ++i) {
+    const Two<Halves> index = widen(bytes[i]);
+    entries[i] = {lookUp(table.entry, index.low), lookUp(table.entry, index.high)};
+  }
+}
+
+/// Three factors of 16 bits.
+template <int n>
+class WeighedHalves {
+ public:
+  WeighedHalves(uint16_t f0, uint16_t f1, uint16_t f2)
+      : first_(_mm256_set1_epi32(f0 | f1 << 16)), last_(_mm256_set1_epi32(f2 | 1 << (n + 15))) {}
+
+  /// (f0 a + f1 b + f2 c + 2^(n-1)) >> n in 32 bits; all are less than 2^15.
+  Two<Words> operator()(Halves a, Halves b, Halves c) const {
+    const __m256i one = _mm256_set1_epi16(1);
+    return {sum(_mm256_unpacklo_epi16(x86::m(a), x86::m(b)), _mm256_unpacklo_epi16(x86::m(c), one)),
+            sum(_mm256_unpackhi_epi16(x86::m(a), x86::m(b)), _mm256_unpackhi_epi16(x86::m(c), one))};
+  }
+
+ private:
+  Words sum(__m256i ab, __m256i c) const {
+    const __m256i all = _mm256_add_epi32(_mm256_madd_epi16(ab, first_), _mm256_madd_epi16(c, last_));
+    return x86::as<Words>(all) >> n;
+  }
+
+  __m256i first_, last_;
+};
+
 // ---- bytes as floats
 
 /// Number `i` of the four quarters of a block of bytes, as floats.
@@ -722,11 +801,6 @@ inline void lookUpRows(const float (*rows)[4], Words index, Floats (&columns)[4]
   for (int i = 0; i < 4; ++i) {
     columns[i] = x86::as<Floats>(v[i]);
   }
-}
-/// Those of a table that `index` names.
-inline Words lookUp(const uint32_t* table, Words index) {
-  return Words{table[index[0]], table[index[1]], table[index[2]], table[index[3]],
-               table[index[4]], table[index[5]], table[index[6]], table[index[7]]};
 }
 
 /// Four constants.
