@@ -60,14 +60,13 @@ void decodeRows(const PlanesView& view, const PixelRows& to) {
 template <int bytes, typename Store>
 TILE_INLINE void transposeTile(const Byte* src, const RowOffsets<16 / bytes>& rows, const Store& store) {
   constexpr int kSide = 16 / bytes;
-  detail::Registers<bytes, 16, kSide, 1> in;
-  detail::unrolled<kSide>([&](auto r) TILE_LAMBDA { in.v[r] = vld1q_u8(src + rows.at[r]); });
+  detail::Registers<Part, bytes, 16, kSide, 1> in;
+  detail::unrolled<kSide>([&](auto r) TILE_LAMBDA { in.v[r] = loadAs<Part>(rows.template of<r>(src)); });
   const auto halves = detail::interleaved(in);
   detail::unrolled<kSide / 2>([&](auto i) TILE_LAMBDA {
-    const uint64x2_t upper = vreinterpretq_u64_u8(halves.v[i]);
-    const uint64x2_t lower = vreinterpretq_u64_u8(halves.v[i + kSide / 2]);
-    store(std::integral_constant<int, 2 * i>{}, vreinterpretq_u8_u64(vzip1q_u64(upper, lower)));
-    store(std::integral_constant<int, 2 * i + 1>{}, vreinterpretq_u8_u64(vzip2q_u64(upper, lower)));
+    const Part upper = halves.v[i], lower = halves.v[i + kSide / 2];
+    store(std::integral_constant<int, 2 * i>{}, zip<8, false>(upper, lower));
+    store(std::integral_constant<int, 2 * i + 1>{}, zip<8, true>(upper, lower));
   });
 }
 
@@ -89,7 +88,7 @@ TILE_INLINE void transposeTiles(const Byte* src, const RowOffsets<16 / bytes>& r
                                 Byte* dst, ptrdiff_t next, const At& at) {
   KERNEL_ROLLED_LOOP
   for (; count != 0; --count) {
-    transposeTile<bytes>(src, rows, [&](auto r, uint8x16_t v) TILE_LAMBDA { vst1q_u8(at(dst, r), v); });
+    transposeTile<bytes>(src, rows, [&](auto r, Part v) TILE_LAMBDA { storeAs(at(dst, r), v); });
     src += 16;
     forget(src);
     dst += next;

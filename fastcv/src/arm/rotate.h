@@ -37,7 +37,7 @@ inline int lumaHeightOf(int bufferHeight) {
 inline constexpr int kRotateBlock = 64;
 
 /// Rotates clockwise by 90, 180 or 270 degrees; by any other angle nothing is done. Every pixel of `out` is
-/// written once, and nothing else; the size of `in` only says which pixel goes where. Instances: the pixel
+/// written, and nothing else; the size of `in` only says which pixel goes where. Instances: the pixel
 /// sizes of the rotation workers.
 template <int bytes, int blockHeight, int blockWidth>
 void rotatePixels(int degree, const SourceImage& in, const TargetImage& out);

@@ -111,7 +111,7 @@ class QuarterTurn {
       tiles<rows, kColumns>(src, length - std::max<ptrdiff_t>(tilesPast, 0) * kColumns, out);
     } else if constexpr (std::is_same_v<Length, ptrdiff_t>) {
       tiles<rows, kColumns>(src, length, out);
-    } else if constexpr (kInterleaves<bytes> && rows == kTile.rows) {
+    } else if constexpr (sizeof(Bytes) == 16 && kInterleaves<bytes> && rows == kTile.rows) {
       moveTiles<bytes, length / kColumns>(src, offsets_, out);
     } else {
       detail::unrolled<length / kColumns>([&](auto) TILE_LAMBDA { tile<rows, kColumns, false>(src, out); });
@@ -152,23 +152,6 @@ class QuarterTurn {
 
 // ---- half turns
 
-// The pixels of a register in reverse order.
-template <int bytes>
-TILE_INLINE uint8x16_t reversed(uint8x16_t v) {
-  if constexpr (bytes == 16) {
-    return v;
-  } else {
-    static constexpr auto kOrder = [] {
-      std::array<unsigned char, 16> order = {};
-      for (int i = 0; i < 16; ++i) {
-        order[i] = static_cast<unsigned char>(16 - bytes - i / bytes * bytes + i % bytes);
-      }
-      return order;
-    }();
-    return vqtbl1q_u8(v, vld1q_u8(kOrder.data()));
-  }
-}
-
 // A walk from the end of a source row down, along the destination row up.
 struct ReversedRow {
   const unsigned char* src;
@@ -201,26 +184,24 @@ struct ReversedRow {
 // Four registers of pixels, or three where a pixel is a multiple of three bytes: what one load and one store
 // take.
 template <int bytes>
-inline constexpr int kReversedBlock = (bytes % 3 == 0 ? 48 : 64) / bytes;
+inline constexpr int kReversedBlock = (bytes % 3 == 0 ? 3 : 4) * static_cast<int>(sizeof(Bytes)) / bytes;
 
 template <int bytes>
 TILE_INLINE void reverseBlock(const unsigned char* src, unsigned char* dst) {
   if constexpr (bytes == 3) {
-    const uint8x16x3_t v = vld3q_u8(src);
-    const uint8x16x3_t out = {{reversed<1>(v.val[0]), reversed<1>(v.val[1]), reversed<1>(v.val[2])}};
-    vst3q_u8(dst, out);
+    Bytes v[3];
+    loadChannels(src, v);
+    storeChannels(dst, {reversed(v[0]), reversed(v[1]), reversed(v[2])});
   } else if constexpr (bytes == 12) {
-    const auto turned = [](uint32x4_t v) {
-      return vreinterpretq_u32_u8(reversed<4>(vreinterpretq_u8_u32(v)));
-    };
-    const uint32x4x3_t v = vld3q_u32(reinterpret_cast<const uint32_t*>(src));
-    const uint32x4x3_t out = {{turned(v.val[0]), turned(v.val[1]), turned(v.val[2])}};
-    vst3q_u32(reinterpret_cast<uint32_t*>(dst), out);
+    const auto turned = [](Floats v) { return (Floats)reversed<Bytes, 4>((Bytes)v); };
+    Floats v[3];
+    loadChannels(reinterpret_cast<const float*>(src), v);
+    storeChannels(reinterpret_cast<float*>(dst), {turned(v[0]), turned(v[1]), turned(v[2])});
   } else {
-    const uint8x16x4_t v = vld1q_u8_x4(src);
-    const uint8x16x4_t out = {{reversed<bytes>(v.val[3]), reversed<bytes>(v.val[2]),
-                               reversed<bytes>(v.val[1]), reversed<bytes>(v.val[0])}};
-    vst1q_u8_x4(dst, out);
+    Bytes v[4];
+    loadRow(src, v);
+    storeRow(dst, {reversed<Bytes, bytes>(v[3]), reversed<Bytes, bytes>(v[2]), reversed<Bytes, bytes>(v[1]),
+                   reversed<Bytes, bytes>(v[0])});
   }
 }
 
@@ -228,34 +209,55 @@ TILE_INLINE void reverseBlock(const unsigned char* src, unsigned char* dst) {
 template <int bytes, int size>
 TILE_INLINE void reversePieces(ReversedRow& row) {
   row.each<bytes, size / bytes, 1>([](const unsigned char* src, unsigned char* dst) TILE_LAMBDA {
-    storeLane<size, 16 / size - 1>(dst, reversed<bytes>(loadBytes<size>(src)));
+    storeLane<size, 16 / size - 1>(dst, reversed<Part, bytes>(loadBytes<size>(src)));
   });
   if constexpr (size > bytes) {
     reversePieces<bytes, size / 2>(row);
   }
 }
 
+// As many pixels of three lanes as go into a register, in reverse order at its low end, from its high end.
+// What else is in the register is read before them and written behind them.
+template <typename V, int bytes>
+TILE_INLINE void reverseTriplets(const unsigned char* src, unsigned char* dst) {
+  constexpr int kSize = sizeof(V), kLane = bytes / 3, kPixels = kSize / bytes;
+  constexpr auto kFrom = [](int i) { return kSize / kLane - 3 - (i / 3 * 3 - i % 3) % (kPixels * 3); };
+  const auto v = loadAs<V>(src + kPixels * bytes - kSize);
+  storeAs(dst, arranged<V, kLane, kFrom>(v, v));
+}
+
 template <int bytes>
 void reverseRow(const unsigned char* end, unsigned char* dst, ptrdiff_t pixels) {
   ReversedRow row = {end, dst, pixels};
-  // A block takes few instructions, six for pixels of a power of two: the loop itself is worth spreading.
-  constexpr int kBlock = kReversedBlock<bytes>;
-  constexpr int kInFlight = bytes >= 4 ? 8 : 2;
-  row.each<bytes, kBlock, kInFlight>(reverseBlock<bytes>);
-  row.each<bytes, kBlock, 1>(reverseBlock<bytes>);
+  constexpr bool kWide = sizeof(Bytes) > 16;
+  if constexpr (bytes % 3 != 0 || !kWide) {
+    // A block takes few instructions, six for pixels of a power of two: the loop itself is worth spreading.
+    constexpr int kBlock = kReversedBlock<bytes>;
+    constexpr int kInFlight = kWide ? 1 : bytes >= 4 ? 8 : 2;
+    row.each<bytes, kBlock, kInFlight>(reverseBlock<bytes>);
+    row.each<bytes, kBlock, 1>(reverseBlock<bytes>);
+  }
   if constexpr (bytes % 3 != 0) {
     reversePieces<bytes, 16>(row);
-  } else {
-    if constexpr (bytes == 3) {
-      row.each<bytes, 8, 1>([](const unsigned char* from, unsigned char* to) TILE_LAMBDA {
-        const uint8x8x3_t v = vld3_u8(from);
-        const uint8x8x3_t out = {{vrev64_u8(v.val[0]), vrev64_u8(v.val[1]), vrev64_u8(v.val[2])}};
-        vst3_u8(to, out);
-      });
-    }
-    row.each<bytes, 1, 1>([](const unsigned char* from, unsigned char* to)
-                              TILE_LAMBDA { memcpy(to, from, bytes); });
+    return;
   }
+#if defined(__ARM_NEON)
+  if constexpr (bytes == 3) {
+    row.each<bytes, 8, 1>(reverseEightTriplets);
+  }
+#else
+  if constexpr (bytes % 3 == 0) {
+    // The last pixel is written over by none.
+    using V = std::conditional_t<bytes == 3, Part, Bytes>;
+    --row.left;
+    constexpr int kPixels = static_cast<int>(sizeof(V)) / bytes;
+    row.each<bytes, kPixels, 4>(reverseTriplets<V, bytes>);
+    row.each<bytes, kPixels, 1>(reverseTriplets<V, bytes>);
+    ++row.left;
+  }
+#endif
+  row.each<bytes, 1, 1>([](const unsigned char* from, unsigned char* to)
+                            TILE_LAMBDA { memcpy(to, from, bytes); });
 }
 
 template <int bytes>

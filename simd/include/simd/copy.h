@@ -6,9 +6,10 @@
 #include <cstddef>
 #include <cstring>
 
-#include "simd/neon.h"
 #include "simd/overlap.h"
 #include "simd/registers.h"
+#include "simd/shuffle.h"
+#include "simd/vector.h"
 
 namespace HPC::fastcv::arm {
 
@@ -17,14 +18,14 @@ inline constexpr ptrdiff_t kCopyBlock = 64;
 /// Copies kCopyBlock bytes. Of single registers, which the compiler loads and stores in pairs: two pairs take
 /// in-order cores less time than four registers at once.
 inline void copyBlock(const unsigned char* src, unsigned char* dst) {
-  const uint8x16_t v0 = vld1q_u8(src);
-  const uint8x16_t v1 = vld1q_u8(src + 16);
-  const uint8x16_t v2 = vld1q_u8(src + 32);
-  const uint8x16_t v3 = vld1q_u8(src + 48);
-  vst1q_u8(dst, v0);
-  vst1q_u8(dst + 16, v1);
-  vst1q_u8(dst + 32, v2);
-  vst1q_u8(dst + 48, v3);
+  const auto v0 = loadAs<Part>(src);
+  const auto v1 = loadAs<Part>(src + 16);
+  const auto v2 = loadAs<Part>(src + 32);
+  const auto v3 = loadAs<Part>(src + 48);
+  storeAs(dst, v0);
+  storeAs(dst + 16, v1);
+  storeAs(dst + 32, v2);
+  storeAs(dst + 48, v3);
 }
 
 /// Whether a loop of its own pays: on Arm the rows of a picture are too short for what a call of `memcpy`

@@ -18,6 +18,8 @@ using SignedHalves = int16x8_t;
 using Words = uint32x4_t;
 using SignedWords = int32x4_t;
 using Floats = float32x4_t;
+/// 16 bytes.
+using Part = Bytes;
 
 // ---- made, loaded and stored
 
@@ -100,6 +102,25 @@ inline Floats distance(Floats a, Floats b) { return vabdq_f32(a, b); }
 
 /// Bytes of each 16 of a block, by the 16 places in `order`.
 inline Bytes shuffled(Bytes v, const unsigned char (&order)[16]) { return vqtbl1q_u8(v, vld1q_u8(order)); }
+
+/// Bytes, or pixels of `bytes` bytes, in reverse order.
+template <typename V, int bytes = 1>
+inline V reversed(V v) {
+  if constexpr (bytes == 16) {
+    return v;
+  } else {
+    struct Order {
+      unsigned char at[16];
+      constexpr Order() : at() {
+        for (int i = 0; i < 16; ++i) {
+          at[i] = static_cast<unsigned char>(16 - bytes - i / bytes * bytes + i % bytes);
+        }
+      }
+    };
+    static constexpr Order kOrder;
+    return shuffled(v, kOrder.at);
+  }
+}
 
 // ---- widening
 
@@ -280,11 +301,6 @@ inline void loadSamplePairs(const unsigned char* p, Samples& first, Samples& sec
 }
 /// The block number `part` of two, of which 16 bytes each lie `step` behind those before.
 inline Bytes loadParts(const unsigned char* p, ptrdiff_t step, int part) { return vld1q_u8(p + step * part); }
-
-inline Bytes reversed(Bytes v) {
-  static constexpr unsigned char kOrder[] = {15, 14, 13, 12, 11, 10, 9, 8, 7, 6, 5, 4, 3, 2, 1, 0};
-  return shuffled(v, kOrder);
-}
 
 /// What 16 samples add, as bytes, and the bytes of the columns of block `part`.
 template <int n>

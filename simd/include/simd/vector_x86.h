@@ -14,6 +14,7 @@
 #include <cstring>
 
 #include "simd/registers.h"
+#include "simd/shuffle.h"
 
 namespace HPC::fastcv::arm {
 
@@ -24,6 +25,8 @@ typedef int16_t SignedHalves __attribute__((vector_size(32)));
 typedef uint32_t Words __attribute__((vector_size(32)));
 typedef int32_t SignedWords __attribute__((vector_size(32)));
 typedef float Floats __attribute__((vector_size(32)));
+/// 16 bytes.
+typedef uint8_t Part __attribute__((vector_size(16)));
 
 namespace x86 {
 
@@ -285,6 +288,13 @@ inline Bytes shuffled(Bytes v, const unsigned char (&order)[16]) {
   return x86::as<Bytes>(_mm256_shuffle_epi8(x86::m(v), _mm256_broadcastsi128_si256(x86::loadHalf(order))));
 }
 
+/// Lanes, or pixels of `bytes` bytes, in reverse order.
+template <typename V, int bytes = sizeof(ElementOf<V>)>
+inline V reversed(V v) {
+  constexpr int kSize = bytes < 8 ? bytes : 8, kLanes = bytes / kSize, kAll = sizeof(V) / kSize;
+  return arranged<V, kSize, [](int i) { return kAll - kLanes - i / kLanes * kLanes + i % kLanes; }>(v, v);
+}
+
 // ---- widening
 
 inline Two<Halves> widen(Bytes a) {
@@ -535,17 +545,6 @@ inline void loadSamplePairs(const unsigned char* p, Samples& first, Samples& sec
 /// The block number `part` of two, of which 16 bytes each lie `step` behind those before: here all of it.
 inline Bytes loadParts(const unsigned char* p, ptrdiff_t step, int /*part*/) {
   return x86::as<Bytes>(x86::loadHalves(p, p + step));
-}
-
-inline Bytes reversed(Bytes v) {
-  static constexpr unsigned char kOrder[] = {15, 14, 13, 12, 11, 10, 9, 8, 7, 6, 5, 4, 3, 2, 1, 0};
-  const __m256i each = x86::m(shuffled(v, kOrder));
-  return x86::as<Bytes>(_mm256_permute2x128_si256(each, each, 1));
-}
-inline Samples reversed(Samples v) {
-  // The bytes of a sample change places too.
-  const auto bytes = std::bit_cast<Halves>(reversed(std::bit_cast<Bytes>(v)));
-  return bytes >> 8;
 }
 
 inline Halves multiply(Samples a, unsigned char weight) {
