@@ -13,6 +13,7 @@
 // The way back is in simd/nv_decode.h. Shifts floor. Chroma belongs to a 2 x 2 block and is made from its
 // top-left pixel alone.
 
+#include "encoded_rows.h"
 #include "entry.h"
 #include "simd/loop.h"
 #include "simd/nv_decode.h"
@@ -35,15 +36,12 @@ template <int nc, Order order, Chroma chroma>
 struct EncodePair {
   static constexpr int kBlock = kBlockPixels<unsigned char>;
 
-  const unsigned char* in0;
-  const unsigned char* in1;
-  unsigned char* luma0;
-  unsigned char* luma1;
+  EncodedRows<nc> rows;
   unsigned char* pairs;
 
-  void block(ptrdiff_t x, Blocks<1>) const {
-    const Colours top = loadColours<nc>(in0 + x * nc);
-    const Colours bottom = loadColours<nc>(in1 + x * nc);
+  void block(ptrdiff_t x, Blocks<1>, ptrdiff_t apart = 16) const {
+    const Colours top = rows.colours(0, x, apart);
+    const Colours bottom = rows.colours(1, x, apart);
     // The weights sum to 128, so the sum is at most 32640 and the rounded luma needs no clamp.
     const Bytes luma[] = {narrowRounded<kEncodeShift>(weighed<weightsOf(kYB, kYG, kYR)>(top)),
                           narrowRounded<kEncodeShift>(weighed<weightsOf(kYB, kYG, kYR)>(bottom))};
@@ -53,17 +51,17 @@ struct EncodePair {
     const Halves v = weighed<weightsOf(kVB, kVG, kVR)>(even);
     const BytePairs both =
         chroma == Chroma::kVU ? centredPairs<kEncodeShift>(v, u) : centredPairs<kEncodeShift>(u, v);
-    store(luma0 + x, luma[0]);
-    store(luma1 + x, luma[1]);
-    storePairs(pairs + x, both);
+    rows.storeLuma(0, x, apart, luma[0]);
+    rows.storeLuma(1, x, apart, luma[1]);
+    storePairs(pairs + x, apart, both);
   }
 
   void step(ptrdiff_t x) const {
     for (ptrdiff_t column = x; column < x + 2; ++column) {
-      luma0[column] = lumaOf(in0 + column * nc);
-      luma1[column] = lumaOf(in1 + column * nc);
+      rows.luma[0][column] = lumaOf(rows.pixel(0, column));
+      rows.luma[1][column] = lumaOf(rows.pixel(1, column));
     }
-    const unsigned char* pixel = in0 + x * nc;
+    const unsigned char* pixel = rows.pixel(0, x);
     const unsigned char u = chromaOf(pixel, kUB, kUG, kUR);
     const unsigned char v = chromaOf(pixel, kVB, kVG, kVR);
     pairs[x + (chroma == Chroma::kVU ? 1 : 0)] = u;
@@ -126,9 +124,8 @@ inline void encode(int height, int width, int inWidthStride, const unsigned char
   const ptrdiff_t inStride = inWidthStride;
   const ptrdiff_t outStride = outWidthStride;
   forEachRowPair<Pair::kBlock, 1>(height, width, [=](ptrdiff_t row) {
-    const unsigned char* in = inData + row * inStride;
-    unsigned char* luma = outData + row * outStride;
-    return Pair{in, in + inStride, luma, luma + outStride, outData + (height + row / 2) * outStride};
+    return Pair{{inData + row * inStride, inStride, outData + row * outStride, outStride},
+                outData + (height + row / 2) * outStride};
   });
 }
 

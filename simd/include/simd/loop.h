@@ -338,7 +338,9 @@ void convertImage(int height, int width, int inWidthStride, const typename Op::S
 
 /// Walks the whole row pairs of a picture and in each its whole column pairs: `pair(row)` is given the even
 /// row and returns what handles that pair, an object with `block(x, Blocks<n>)` for `n` blocks of `kBlock`
-/// columns and `step(x)` for one column pair. Source and destination are distinct.
+/// columns and `step(x)` for one column pair. Source and destination are distinct. A block of two registers'
+/// halves may take a row of at least half its columns, where its `block` is also given how many columns the
+/// second half is behind the first one.
 template <int kBlock, int kInFlight, typename Pair>
 inline void forEachRowPair(int height, int width, const Pair& pair) {
   const ptrdiff_t length = width & ~1;
@@ -347,6 +349,12 @@ inline void forEachRowPair(int height, int width, const Pair& pair) {
   }
   for (ptrdiff_t row = 0; row + 1 < height; row += 2) {
     const auto handler = pair(row);
+    if constexpr (kBlock > 16 && requires { handler.block(0, Blocks<1>{}, length); }) {
+      if (length >= kBlock / 2 && length < kBlock) {
+        handler.block(0, Blocks<1>{}, length - kBlock / 2);
+        continue;
+      }
+    }
     walk<kBlock, kInFlight, 2>(
         length, Tail::kOverlap, [&](ptrdiff_t x, auto blocks) { handler.block(x, blocks); },
         [&](ptrdiff_t x) { handler.step(x); });

@@ -65,6 +65,9 @@ inline void storeRow(float* p, const Floats (&v)[4]) {
   vst1q_f32_x4(p, all);
 }
 
+/// A block of which no part is apart.
+inline void storeParts(unsigned char* p, ptrdiff_t /*apart*/, Bytes v) { store(p, v); }
+
 /// Pixels of three channels that are all `v`.
 inline void storeThrice(unsigned char* p, Bytes v) { storeChannels(p, {v, v, v}); }
 inline void storeThrice(float* p, Floats v) { storeChannels(p, {v, v, v}); }
@@ -221,9 +224,10 @@ struct EvenColours {
   uint8x8_t c[3];
 };
 
-/// Loads them, of three channels the first and the third swapped or not.
+/// Loads them, of three channels the first and the third swapped or not. A block has no halves that could be
+/// apart.
 template <int nc, bool swapped = false>
-inline Colours loadColours(const unsigned char* p) {
+inline Colours loadColours(const unsigned char* p, ptrdiff_t /*apart*/ = 16) {
   Bytes v[nc];
   loadChannels(p, v);
   return {{v[swapped ? 2 : 0], v[1], v[swapped ? 0 : 2]}};
@@ -285,7 +289,7 @@ inline BytePairs centredPairs(Halves first, Halves second) {
   };
   return {{centred(first), centred(second)}};
 }
-inline void storePairs(unsigned char* p, const BytePairs& v) { vst2_u8(p, v); }
+inline void storePairs(unsigned char* p, ptrdiff_t /*apart*/, const BytePairs& v) { vst2_u8(p, v); }
 
 // ---- samples of chroma
 
@@ -310,41 +314,6 @@ inline Bytes sampleBytes(const Two<SignedHalves>& a) {
 template <int part>
 inline Bytes spread(Bytes v) {
   return part == 0 ? vzip1q_u8(v, v) : vzip2q_u8(v, v);
-}
-
-// ---- lanes of 32 bits
-
-/// Of eight neighbouring samples, or of the even or the odd columns of a block.
-struct EvenOdd {
-  Two<SignedWords> even;
-  Two<SignedWords> odd;
-};
-
-namespace detail {
-// Of two results, that of sum s in 32 bits being ((s >> 16) + 2^(n-17)) >> (n - 16), limited to a byte.
-template <int n>
-inline Bytes narrowedColumns(int16x4_t even0, int16x4_t even1, int16x4_t odd0, int16x4_t odd1) {
-  const auto rounded = [](int16x4_t low, int16x4_t high) {
-    const uint8x8_t bytes = vqrshrun_n_s16(vcombine_s16(low, high), n - 16);
-    return vcombine_u8(bytes, bytes);
-  };
-  return vzip1q_u8(rounded(even0, even1), rounded(odd0, odd1));
-}
-}  // namespace detail
-
-/// (luma + chroma + 2^(n-1)) >> n, limited to a byte, of the even and the odd column of each sample; n is
-/// more than 16, and (luma + chroma) >> 16 fits 16 bits.
-template <int n>
-inline Bytes addNarrowed(const EvenOdd& luma, const Two<SignedWords>& chroma) {
-  return detail::narrowedColumns<n>(
-      vaddhn_s32(luma.even.low, chroma.low), vaddhn_s32(luma.even.high, chroma.high),
-      vaddhn_s32(luma.odd.low, chroma.low), vaddhn_s32(luma.odd.high, chroma.high));
-}
-template <int n>
-inline Bytes subtractNarrowed(const EvenOdd& luma, const Two<SignedWords>& chroma) {
-  return detail::narrowedColumns<n>(
-      vsubhn_s32(luma.even.low, chroma.low), vsubhn_s32(luma.even.high, chroma.high),
-      vsubhn_s32(luma.odd.low, chroma.low), vsubhn_s32(luma.odd.high, chroma.high));
 }
 
 // ---- tables

@@ -138,11 +138,11 @@ inline void transpose(__m256i (&v)[4]) {
   v[3] = _mm256_unpackhi_epi64(high01, high23);
 }
 
-// Four registers of which one half block lies behind the other.
-inline void loadFour(const void* p, __m256i (&v)[4]) {
+// Four registers of which one half block lies `apart` behind the other.
+inline void loadFour(const void* p, __m256i (&v)[4], ptrdiff_t apart = 64) {
   const auto* bytes = static_cast<const uint8_t*>(p);
   for (int i = 0; i < 4; ++i) {
-    v[i] = loadHalves(bytes + 16 * i, bytes + 64 + 16 * i);
+    v[i] = loadHalves(bytes + 16 * i, bytes + apart + 16 * i);
   }
 }
 inline void storeFour(void* p, const __m256i (&v)[4]) {
@@ -176,6 +176,11 @@ inline void load(const unsigned char* p, Bytes& v) { v = load(p); }
 inline void load(const float* p, Floats& v) { v = load(p); }
 inline void store(unsigned char* p, Bytes v) { x86::storeWhole(p, x86::m(v)); }
 inline void store(float* p, Floats v) { _mm256_storeu_ps(p, x86::m(v)); }
+
+/// A block whose second half belongs `apart` bytes behind the first one.
+inline void storeParts(unsigned char* p, ptrdiff_t apart, Bytes v) {
+  apart == 16 ? store(p, v) : x86::storeHalves(p, p + apart, x86::m(v));
+}
 
 inline void loadChannels(const unsigned char* p, Bytes (&c)[3]) { x86::loadThree<1>(p, c); }
 inline void loadChannels(const float* p, Floats (&c)[3]) { x86::loadThree<4>(p, c); }
@@ -415,13 +420,14 @@ struct EvenColours {
   __m256i v[2];
 };
 
-/// Loads them, of three channels the first and the third swapped or not.
+/// Loads them, of three channels the first and the third swapped or not. The second half of the block begins
+/// `apart` pixels behind the first one.
 template <int nc, bool swapped = false>
-inline Colours loadColours(const unsigned char* p) {
+inline Colours loadColours(const unsigned char* p, ptrdiff_t apart = 16) {
   Colours all;
   if constexpr (nc == 4) {
     static_assert(!swapped);
-    x86::loadFour(p, all.v);
+    x86::loadFour(p, all.v, 4 * apart);
   } else {
     static_assert(nc == 3);
     static constexpr auto kFrom = [](int i) {
@@ -431,10 +437,10 @@ inline Colours loadColours(const unsigned char* p) {
     static constexpr x86::Table kFirst = x86::tableOf(kFrom);
     static constexpr x86::Table kLast = x86::tableOf([](int i) { return kFrom(i) + 4; });
     for (int i = 0; i < 3; ++i) {
-      all.v[i] = _mm256_shuffle_epi8(x86::loadHalves(p + 12 * i, p + 48 + 12 * i), kFirst.twice());
+      all.v[i] = _mm256_shuffle_epi8(x86::loadHalves(p + 12 * i, p + 3 * apart + 12 * i), kFirst.twice());
     }
     // The last bytes are the end of what is loaded, so that nothing behind the block is read.
-    all.v[3] = _mm256_shuffle_epi8(x86::loadHalves(p + 32, p + 80), kLast.twice());
+    all.v[3] = _mm256_shuffle_epi8(x86::loadHalves(p + 32, p + 3 * apart + 32), kLast.twice());
   }
   return all;
 }
@@ -525,7 +531,7 @@ inline BytePairs centredPairs(Halves first, Halves second) {
       multiplyRounded(asSigned({first, second}), static_cast<int16_t>(1 << (15 - n)));
   return shuffled(std::bit_cast<Bytes>(narrowSigned(shifted)), kInTurn) ^ 0x80;
 }
-inline void storePairs(unsigned char* p, BytePairs v) { store(p, v); }
+inline void storePairs(unsigned char* p, ptrdiff_t apart, BytePairs v) { storeParts(p, apart, v); }
 
 // ---- samples of chroma
 
@@ -564,102 +570,6 @@ inline Bytes sampleBytes(SignedHalves a) {
 template <int part>
 inline Bytes spread(Bytes v) {
   return v;
-}
-
-// ---- lanes of 32 bits
-
-/// Of sixteen neighbouring samples, or of the even or the odd columns of a block.
-struct EvenOdd {
-  Two<SignedWords> even;
-  Two<SignedWords> odd;
-};
-
-namespace x86 {
-// Bytes `first`, `first` + `step`, ... of each half, one to a lane of 32 bits, as 128 times the byte and the
-// byte: what `multiplyPairs` takes.
-template <int first, int step>
-inline __m256i pairsOf(__m256i bytes) {
-  static constexpr Table kFourTimes = tableOf([](int i) { return first + step * (i / 4); });
-  return _mm256_maddubs_epi16(_mm256_shuffle_epi8(bytes, kFourTimes.twice()), _mm256_set1_epi32(0x00014040));
-}
-// The byte times `factor`, of up to 22 bits and a sign.
-inline SignedWords multiplyPairs(__m256i pairs, int factor) {
-  const uint32_t high = static_cast<uint16_t>(factor >> 7), low = static_cast<uint32_t>(factor) & 0x7f;
-  return as<SignedWords>(_mm256_madd_epi16(pairs, _mm256_set1_epi32(static_cast<int>(low << 16 | high))));
-}
-// Limited sums of the even and of the odd columns, in turn.
-template <int n>
-inline Bytes narrowedColumns(const Two<SignedWords>& even, const Two<SignedWords>& odd) {
-  // The upper halves, of which that of an even column goes where the lower one of its odd column is.
-  const auto merged = [](SignedWords e, SignedWords o) {
-    return as<SignedHalves>(_mm256_blend_epi16(_mm256_srli_epi32(m(e), 16), m(o), 0xaa));
-  };
-  return narrowRounded<n - 16>(Two<SignedHalves>{merged(even.low, odd.low), merged(even.high, odd.high)});
-}
-}  // namespace x86
-
-/// The bytes of a block times a factor of up to 22 bits; bytes are less than 240.
-inline EvenOdd multiplyWords(Bytes a, int factor) {
-  const auto each = [=](__m256i pairs) { return x86::multiplyPairs(pairs, factor); };
-  return {{each(x86::pairsOf<0, 2>(x86::m(a))), each(x86::pairsOf<8, 2>(x86::m(a)))},
-          {each(x86::pairsOf<1, 2>(x86::m(a))), each(x86::pairsOf<9, 2>(x86::m(a)))}};
-}
-
-/// (luma + chroma + 2^(n-1)) >> n, limited to a byte, of the even and the odd column of each sample; n is
-/// more than 16, and (luma + chroma) >> 16 fits 16 bits.
-template <int n>
-inline Bytes addNarrowed(const EvenOdd& luma, const Two<SignedWords>& chroma) {
-  return x86::narrowedColumns<n>({luma.even.low + chroma.low, luma.even.high + chroma.high},
-                                 {luma.odd.low + chroma.low, luma.odd.high + chroma.high});
-}
-template <int n>
-inline Bytes subtractNarrowed(const EvenOdd& luma, const Two<SignedWords>& chroma) {
-  return x86::narrowedColumns<n>({luma.even.low - chroma.low, luma.even.high - chroma.high},
-                                 {luma.odd.low - chroma.low, luma.odd.high - chroma.high});
-}
-
-/// 16 stored samples less 128, each as what products with factors of 22 bits are made of.
-struct CentredSamples {
-  __m256i low, high;
-};
-inline CentredSamples loadCentredSamples(const unsigned char* p) {
-  const __m256i v = _mm256_sub_epi16(_mm256_cvtepu8_epi16(x86::loadHalf(p)), _mm256_set1_epi16(128));
-  const __m256i scaled = _mm256_slli_epi16(v, 7);
-  return {_mm256_unpacklo_epi16(scaled, v), _mm256_unpackhi_epi16(scaled, v)};
-}
-inline Two<SignedWords> multiply(const CentredSamples& a, int factor) {
-  return {x86::multiplyPairs(a.low, factor), x86::multiplyPairs(a.high, factor)};
-}
-
-/// The first three channels of every second pixel, each as what products with factors of 22 bits are made of.
-struct WideColours {
-  __m256i c[3][2];
-};
-inline WideColours wideColours(const EvenColours& v) {
-  return {{{x86::pairsOf<0, 4>(v.v[0]), x86::pairsOf<0, 4>(v.v[1])},
-           {x86::pairsOf<1, 4>(v.v[0]), x86::pairsOf<1, 4>(v.v[1])},
-           {x86::pairsOf<2, 4>(v.v[0]), x86::pairsOf<2, 4>(v.v[1])}}};
-}
-/// (w.c0 c0 + w.c1 c1 + w.c2 c2 + bias) >> n of each pixel, from 0 to 255.
-template <int n, Weights w>
-inline Halves weighedShifted(const WideColours& v, int bias) {
-  const auto sum = [=](__m256i c0, __m256i c1, __m256i c2) {
-    const SignedWords all =
-        x86::multiplyPairs(c0, w.c0) + x86::multiplyPairs(c1, w.c1) + (x86::multiplyPairs(c2, w.c2) + bias);
-    return x86::m(all >> n);
-  };
-  return x86::as<Halves>(
-      _mm256_packs_epi32(sum(v.c[0][0], v.c[1][0], v.c[2][0]), sum(v.c[0][1], v.c[1][1], v.c[2][1])));
-}
-/// Stores 16 lanes below 256 at `p`, and 16 at `q`.
-inline void storeSamples(unsigned char* p, Halves first, unsigned char* q, Halves second) {
-  const __m256i both = _mm256_packus_epi16(x86::m(first), x86::m(second));
-  x86::storeHalves(p, q, _mm256_permute4x64_epi64(both, 0xd8));
-}
-
-/// (a factor) >> 16, without signs.
-inline Halves multiplyHigh(Halves a, uint16_t factor) {
-  return x86::as<Halves>(_mm256_mulhi_epu16(x86::m(a), _mm256_set1_epi16(static_cast<int16_t>(factor))));
 }
 
 // ---- tables
