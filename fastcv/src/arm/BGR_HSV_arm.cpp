@@ -67,9 +67,9 @@ struct BgrToHsv8 {
       const auto scaled = [&](Bytes bytes) { return quarterOf(bytes, i) * splat<Floats>(kPerByte); };
       const Floats vmax = scaled(max);
       const Floats diff = vmax - scaled(min);
-      const Floats s = diff * reciprocal(vmax + splat<Floats>(kEpsilon));
+      const Floats s = diff * reciprocalBelow2(vmax + splat<Floats>(kEpsilon));
       saturation[i] = s * splat<Floats>(255.0f);
-      const Floats k = reciprocal(diff + splat<Floats>(kEpsilon)) * splat<Floats>(30.0f);
+      const Floats k = reciprocalBelow2(diff + splat<Floats>(kEpsilon)) * splat<Floats>(30.0f);
       const Floats h = multiplyAdd(quarterOf(offset, i), scaled(minuend) - scaled(subtrahend), k);
       hue[i] = h + masked(h < splat<Floats>(-0.5f), splat<Floats>(180.0f));
     }
@@ -112,8 +112,11 @@ struct BgrToHsvFloat {
     const Floats lo = min(b, g);
     const Floats vmax = max(max(b, g), r);
     const Floats diff = vmax - min(lo, r);
-    const Floats s = diff * reciprocal(vmax + splat<Floats>(kEpsilon));
-    const Floats k = reciprocal(diff + splat<Floats>(kEpsilon)) * splat<Floats>(60.0f);
+    const Floats divisorS = vmax + splat<Floats>(kEpsilon);
+    const Floats divisorK = diff + splat<Floats>(kEpsilon);
+    const bool areSmall = areBelow2(divisorS, divisorK);
+    const Floats s = diff * (areSmall ? reciprocalBelow2(divisorS) : reciprocal(divisorS));
+    const Floats k = (areSmall ? reciprocalBelow2(divisorK) : reciprocal(divisorK)) * splat<Floats>(60.0f);
     const auto isRed = vmax == r;
     const Floats h = select(isRed, g - b, lo - r) * k;
     Floats red = masked(h < splat<Floats>(0.0f), splat<Floats>(-360.0f));

@@ -413,6 +413,10 @@ inline Floats reciprocal(Floats v) {
   estimate = vmulq_f32(estimate, vrecpsq_f32(v, estimate));
   return vmulq_f32(estimate, vrecpsq_f32(v, estimate));
 }
+/// The same of numbers that are above 0 and below 2, but not below 2^-100.
+inline Floats reciprocalBelow2(Floats v) { return reciprocal(v); }
+/// Whether all of `a` and `b` are above 0 and below 2, where that makes a difference; `b` is not 0.
+inline bool areBelow2(Floats /*a*/, Floats /*b*/) { return true; }
 
 // ---- floats and their bits
 

@@ -265,8 +265,7 @@ inline Floats max(Floats a, Floats b) { return std::bit_cast<Floats>(_mm256_max_
 /// `a` where the mask is set, `b` elsewhere.
 template <typename Mask, typename V>
 inline V select(Mask mask, V a, V b) {
-  return std::bit_cast<V>(
-      _mm256_blendv_epi8(std::bit_cast<__m256i>(b), std::bit_cast<__m256i>(a), std::bit_cast<__m256i>(mask)));
+  return mask ? a : b;
 }
 /// `a` where the mask is set, 0 elsewhere.
 template <typename Mask>
@@ -644,22 +643,39 @@ inline Bytes bytesOf(const Floats (&q)[4]) {
                                             _mm256_packs_epi32(rounded(q[2]), rounded(q[3]))));
 }
 
-/// 1 / v: the estimate of 8 bits that Arm's processors make, and two Newton-Raphson steps, each of which
-/// doubles the bits.
+namespace x86 {
+// 1 / v: the estimate of 8 bits that Arm's processors make, and two Newton-Raphson steps, each of which
+// doubles the bits. `scale` is 1, or 16 where numbers may be large, infinite or 0.
+template <int scale>
 inline Floats reciprocal(Floats v) {
   // The estimate is the inverse of the middle of the numbers with the same 8 bits of mantissa, rounded to 8
   // bits. That of a large number has fewer bits than a mantissa: all are taken 16 times as large first.
   const auto middle = std::bit_cast<Floats>((std::bit_cast<Words>(v) & 0xffff8000u) | 0x4000u);
-  const auto inverse = std::bit_cast<Words>(0x1p4f / middle);
-  auto estimate = std::bit_cast<Floats>((inverse + 0x4000u) & 0xffff8000u) * 0x1p-4f;
-  estimate = masked(distance(v, Floats{}) != splat<Floats>(__builtin_inff()), estimate);
+  const auto inverse = std::bit_cast<Words>(float{scale} / middle);
+  auto estimate = std::bit_cast<Floats>((inverse + 0x4000u) & 0xffff8000u);
+  if constexpr (scale > 1) {
+    estimate = masked(distance(v, Floats{}) != splat<Floats>(__builtin_inff()), estimate * (1.0f / scale));
+  }
   // A step is about 1; that of 0 and infinity is 2 on Arm.
   const auto step = [=](Floats e) {
-    const __m256 two = _mm256_set1_ps(2.0f);
-    return std::bit_cast<Floats>(_mm256_min_ps(_mm256_fnmadd_ps(x86::m(v), x86::m(e), two), two));
+    const Floats two = splat<Floats>(2.0f);
+    const auto rest = std::bit_cast<Floats>(_mm256_fnmadd_ps(m(v), m(e), m(two)));
+    return scale > 1 ? std::bit_cast<Floats>(_mm256_min_ps(m(rest), m(two))) : rest;
   };
   estimate = estimate * step(estimate);
   return estimate * step(estimate);
+}
+}  // namespace x86
+
+/// 1 / v, as exact as two steps make the estimate that Arm's processors have; and that of numbers that are
+/// above 0 and below 2, but not below 2^-100.
+inline Floats reciprocal(Floats v) { return x86::reciprocal<16>(v); }
+inline Floats reciprocalBelow2(Floats v) { return x86::reciprocal<1>(v); }
+/// Whether all of `a` and `b` are above 0 and below 2, where that makes a difference; `b` is not 0.
+inline bool areBelow2(Floats a, Floats b) {
+  // The sign and the upper bit of the exponent are those that count.
+  const __m256i bits = x86::m((std::bit_cast<Words>(a) - 1u) | std::bit_cast<Words>(b));
+  return _mm256_testz_si256(bits, _mm256_set1_epi32(static_cast<int>(0xc0000000u))) != 0;
 }
 
 // ---- floats and their bits
