@@ -13,12 +13,14 @@
 // rely on the difference: no group may take pixels of another row, and with such a factor none may end a row.
 
 #include <cmath>
+#include <cstring>
 #include <type_traits>
 
 #include "entry.h"
 #include "simd/copy.h"
 #include "simd/loop.h"
 #include "simd/overlap.h"
+#include "simd/tile.h"
 
 namespace HPC::fastcv {
 namespace {
@@ -29,30 +31,29 @@ using namespace arm;
 
 constexpr int kGroupPixels = 8;
 
-// Any factor: 8 samples widened to float and back.
+// Any factor: samples widened to float and back.
 struct ScaleByFloat {
   float ratio;
 
-  uint8x8_t operator()(uint8x8_t samples) const {
-    const uint16x8_t wide = vmovl_u8(samples);
-    return vqmovun_s16(vcombine_s16(scaled(vget_low_u16(wide)), scaled(vget_high_u16(wide))));
+  Bytes operator()(Bytes samples) const {
+    const Two<Halves> wide = widen(samples);
+    return narrow(Two<SignedHalves>{scaled(wide.low), scaled(wide.high)});
   }
 
  private:
-  int16x4_t scaled(uint16x4_t samples) const {
-    const float32x4_t v = vcvtq_f32_u32(vmovl_u16(samples));
-    return vmovn_s32(vcvtq_s32_f32(vfmaq_n_f32(vdupq_n_f32(0.5f), v, ratio)));
+  SignedHalves scaled(Halves samples) const {
+    const Two<Floats> v = floatsOf(samples);
+    return truncatedHalves({scaled(v.low), scaled(v.high)});
   }
+  Floats scaled(Floats v) const { return multiplyAdd(splat<Floats>(0.5f), v, splat<Floats>(ratio)); }
 };
 
 // A whole factor of 0 to 255, the only ones that the front-end passes: products of at most 65025, of which
 // truncating the half away leaves the product, and whose 16 bits are those that are kept.
 struct ScaleByByte {
-  uint8x8_t ratio;
+  unsigned char ratio;
 
-  uint8x8_t operator()(uint8x8_t samples) const {
-    return vqmovun_s16(vreinterpretq_s16_u16(vmull_u8(samples, ratio)));
-  }
+  Bytes operator()(Bytes samples) const { return narrow(asSigned(multiply(samples, ratio))); }
 };
 
 unsigned char scaleSample(unsigned char sample, float ratio) {
@@ -61,22 +62,24 @@ unsigned char scaleSample(unsigned char sample, float ratio) {
   return v > 255 ? 255 : v >= 0 ? static_cast<unsigned char>(v) : 0;
 }
 
+#if defined(__ARM_NEON)
+
 // `count` samples; all are loaded before one is stored, for the cores that work in order.
 template <int count, typename Scale>
 inline void scaleSamples(const Scale& scale, const unsigned char* src, unsigned char* dst) {
   if constexpr (count == 8) {
-    vst1_u8(dst, scale(vld1_u8(src)));
+    storeLane<8, 0>(dst, scale(loadBytes<8>(src)));
   } else {
     constexpr int kRegisters = count / 16;
-    uint8x16_t samples[kRegisters];
+    Bytes samples[kRegisters];
     for (int i = 0; i < kRegisters; ++i) {
-      samples[i] = vld1q_u8(src + i * 16);
+      samples[i] = load(src + i * 16);
     }
-    for (uint8x16_t& v : samples) {
-      v = vcombine_u8(scale(vget_low_u8(v)), scale(vget_high_u8(v)));
+    for (Bytes& v : samples) {
+      v = scale(v);
     }
     for (int i = 0; i < kRegisters; ++i) {
-      vst1q_u8(dst + i * 16, samples[i]);
+      store(dst + i * 16, samples[i]);
     }
     if constexpr (count % 16 != 0) {
       scaleSamples<count % 16>(scale, src + count / 16 * 16, dst + count / 16 * 16);
@@ -84,20 +87,55 @@ inline void scaleSamples(const Scale& scale, const unsigned char* src, unsigned 
   }
 }
 
-// `alike` says that a group gives what its pixels would give singly.
+// A row in groups of `group` samples. `alike` says that they give what single samples would give, `apart`
+// that they may be done twice.
+template <int group, typename Scale>
+inline void scaleRow(const Scale& scale, float ratio, bool alike, bool apart, ptrdiff_t length,
+                     const unsigned char* src, unsigned char* dst) {
+  constexpr int kInFlight = group == kGroupPixels ? 4 : 2;
+  walk<group, kInFlight, 1>(
+      length, alike && apart ? Tail::kOverlap : Tail::kSteps,
+      [&](ptrdiff_t x, auto groups) { scaleSamples<groups * group>(scale, src + x, dst + x); },
+      [&](ptrdiff_t x) { dst[x] = scaleSample(src[x], ratio); });
+}
+
+#else
+
+// The same, where a register has room for several groups, or for one with others: the last ones go through
+// memory of a register's size.
+template <int group, typename Scale>
+inline void scaleRow(const Scale& scale, float ratio, bool alike, bool apart, ptrdiff_t length,
+                     const unsigned char* src, unsigned char* dst) {
+  constexpr ptrdiff_t kBlock = sizeof(Bytes);
+  const auto block = [&](const unsigned char* from, unsigned char* to) { store(to, scale(load(from))); };
+  const ptrdiff_t grouped = alike ? length : length / group * group;
+  ptrdiff_t x = 0;
+  for (; x <= grouped - kBlock; x += kBlock) {
+    block(src + x, dst + x);
+  }
+  if (x < grouped && apart && grouped >= kBlock) {
+    block(src + grouped - kBlock, dst + grouped - kBlock);
+  } else if (x < grouped) {
+    unsigned char part[kBlock] = {};
+    memcpy(part, src + x, static_cast<size_t>(grouped - x));
+    block(part, part);
+    memcpy(dst + x, part, static_cast<size_t>(grouped - x));
+  }
+  for (x = grouped; x < length; ++x) {
+    dst[x] = scaleSample(src[x], ratio);
+  }
+}
+
+#endif
+
 template <int nc, typename Scale>
 inline void scaleRows(const Scale& scale, float ratio, bool alike, ptrdiff_t height, ptrdiff_t width,
                       ptrdiff_t inStride, const unsigned char* in, ptrdiff_t outStride, unsigned char* out) {
-  constexpr int kGroup = kGroupPixels * nc;
-  constexpr int kInFlight = nc == 1 ? 4 : 2;
   for (ptrdiff_t row = 0; row < height; ++row) {
     const unsigned char* src = in + row * inStride;
     unsigned char* dst = out + row * outStride;
-    const bool apart = areApart(src, width * nc, dst, width * nc);
-    walk<kGroup, kInFlight, 1>(
-        width * nc, alike && apart ? Tail::kOverlap : Tail::kSteps,
-        [&](ptrdiff_t x, auto groups) { scaleSamples<groups * kGroup>(scale, src + x, dst + x); },
-        [&](ptrdiff_t x) { dst[x] = scaleSample(src[x], ratio); });
+    scaleRow<kGroupPixels * nc>(scale, ratio, alike, areApart(src, width * nc, dst, width * nc), width * nc,
+                                src, dst);
   }
 }
 
@@ -105,7 +143,7 @@ template <int nc>
 void scaleImage(float ratio, ptrdiff_t height, ptrdiff_t width, ptrdiff_t inStride, const unsigned char* in,
                 ptrdiff_t outStride, unsigned char* out) {
   if (ratio >= 0 && ratio <= 255 && ratio == std::floor(ratio)) {
-    const ScaleByByte scale = {vdup_n_u8(static_cast<unsigned char>(ratio))};
+    const ScaleByByte scale = {static_cast<unsigned char>(ratio)};
     scaleRows<nc>(scale, ratio, ratio <= 128, height, width, inStride, in, outStride, out);
   } else {
     scaleRows<nc>(ScaleByFloat{ratio}, ratio, false, height, width, inStride, in, outStride, out);
@@ -115,19 +153,16 @@ void scaleImage(float ratio, ptrdiff_t height, ptrdiff_t width, ptrdiff_t inStri
 // ---- float samples
 
 struct ScaleFloats {
-  using Vector = float32x4_t;
   using Src = float;
   using Dst = float;
   static constexpr int kSrcChannels = 1;
   static constexpr int kDstChannels = 1;
-  static constexpr int kInFlight = 2;
+  static constexpr int kInFlight = sizeof(Floats) == 16 ? 2 : 4;
   static constexpr bool kUniform = true;
 
   float ratio;
 
-  Pixels<float32x4_t, 1> vector(const Pixels<float32x4_t, 1>& v) const {
-    return {{vmulq_n_f32(v.c[0], ratio)}};
-  }
+  Pixels<Floats, 1> vector(const Pixels<Floats, 1>& v) const { return {{v.c[0] * splat<Floats>(ratio)}}; }
   void scalar(const float* in, float* out) const { *out = *in * ratio; }
 };
 

@@ -179,7 +179,13 @@ class PixelRow {
     const ptrdiff_t turns = length / kTurn;
     convertTurns(op, turns, src, dst);
     if constexpr (kWide) {
-      convertTail(op, length, turns * kTurn, tail, src, dst);
+      ptrdiff_t x = turns * kTurn;
+      if constexpr (kTurn > std::max(kGroup, kBlock)) {
+        for (; x <= length - kBlock; x += kBlock) {
+          convertGroup(op, src + x * kSrc, dst + x * kDst);
+        }
+      }
+      convertTail(op, length, x, tail, src, dst);
     } else {
       walk<kGroup, 1, 1>(
           length, tail, [&](ptrdiff_t x, Blocks<1>) { convertGroup(op, src + x * kSrc, dst + x * kDst); },
@@ -196,7 +202,9 @@ class PixelRow {
   // Registers of 32 bytes.
   static constexpr bool kWide = sizeof(SrcBlock) > 16;
   static constexpr int kGroup = Op::kUniform ? kBlock : 8;
-  static constexpr int kInFlight = kBlocksInFlightPay ? Op::kInFlight : std::max(kGroup / kBlock, 1);
+  // A block of one channel is done so quickly that its store is in the way of the next one's load.
+  static constexpr bool kPays = kBlocksInFlightPay || (kSrc == 1 && kDst == 1);
+  static constexpr int kInFlight = kPays ? Op::kInFlight : std::max(kGroup / kBlock, 1);
   static constexpr int kTurn = kBlock * kInFlight;
   static_assert(kBlock == kLanes<DstBlock>);
   static_assert(kTurn % kGroup == 0);

@@ -438,6 +438,13 @@ inline SignedWords doubledHigh(SignedWords a, int32_t factor) { return vqdmulhq_
 inline Words truncated(Floats v) { return vcvtq_u32_f32(v); }
 inline Floats floatsOf(Words v) { return vcvtq_f32_u32(v); }
 inline Floats floatsOf(SignedWords v) { return vcvtq_f32_s32(v); }
+inline Two<Floats> floatsOf(Halves v) {
+  return {floatsOf(vmovl_u16(vget_low_u16(v))), floatsOf(vmovl_high_u16(v))};
+}
+/// The lowest 16 bits of the whole parts.
+inline SignedHalves truncatedHalves(const Two<Floats>& v) {
+  return vmovn_high_s32(vmovn_s32(vcvtq_s32_f32(v.low)), vcvtq_s32_f32(v.high));
+}
 
 inline bool anySet(Words mask) { return vmaxvq_u32(mask) != 0; }
 

@@ -713,6 +713,17 @@ inline SignedWords doubledHigh(SignedWords a, int32_t factor) {
 inline Words truncated(Floats v) { return x86::as<Words>(_mm256_cvttps_epi32(x86::m(v))); }
 inline Floats floatsOf(Words v) { return std::bit_cast<Floats>(_mm256_cvtepi32_ps(x86::m(v))); }
 inline Floats floatsOf(SignedWords v) { return std::bit_cast<Floats>(_mm256_cvtepi32_ps(x86::m(v))); }
+inline Two<Floats> floatsOf(Halves v) {
+  return {floatsOf(x86::as<Words>(_mm256_unpacklo_epi16(x86::m(v), x86::zero()))),
+          floatsOf(x86::as<Words>(_mm256_unpackhi_epi16(x86::m(v), x86::zero())))};
+}
+/// The lowest 16 bits of the whole parts.
+inline SignedHalves truncatedHalves(const Two<Floats>& v) {
+  const auto lowest = [](Floats each) {
+    return x86::m((std::bit_cast<SignedWords>(truncated(each)) << 16) >> 16);
+  };
+  return x86::as<SignedHalves>(_mm256_packs_epi32(lowest(v.low), lowest(v.high)));
+}
 
 inline bool anySet(Words mask) { return _mm256_testz_si256(x86::m(mask), x86::m(mask)) == 0; }
 
