@@ -21,7 +21,6 @@
 
 #include "entry.h"
 #include "roots.h"
-#include "simd/gamma_planes.h"
 #include "simd/lab_tables.h"
 #include "simd/loop.h"
 #include "simd/registers.h"
@@ -35,50 +34,21 @@ using namespace arm;
 
 constexpr LinearWeights kXWeights = {778, 1541, 1777};
 constexpr LinearWeights kZWeights = {3575, 448, 73};
-constexpr int kAScale = 500;
-constexpr int kBScale = 200;
+constexpr int16_t kAScale = 500;
+constexpr int16_t kBScale = 200;
 constexpr int kRootShift = 15;
 
-constexpr GammaPlanes gammaPlanes() {
-  GammaPlanes planes{};
+constexpr WideTable wideGammaTable() {
+  WideTable table{};
   for (int i = 0; i < 256; ++i) {
-    planes.set(i, kGammaTable[static_cast<size_t>(i)]);
+    table.set(i, kGammaTable[static_cast<size_t>(i)]);
   }
-  return planes;
+  return table;
 }
-constexpr GammaPlanes kGammaPlanes = gammaPlanes();
-
-#if !defined(__ARM_NEON)
-// The halves of a vector of indices, as they come out of it.
-template <typename Entry>
-inline const Entry* lowEntry(const Entry* table, uint64_t pair) {
-  return table + static_cast<uint32_t>(pair);
-}
-template <typename Entry>
-inline const Entry* highEntry(const Entry* table, uint64_t pair) {
-  return table + (pair >> 32);
-}
-inline uint64_t lowPair(uint32x4_t index) { return vgetq_lane_u64(vreinterpretq_u64_u32(index), 0); }
-inline uint64_t highPair(uint32x4_t index) { return vgetq_lane_u64(vreinterpretq_u64_u32(index), 1); }
-#endif
-
-inline uint16x8_t gather(const CubeRootTable& table, uint32x4_t low, uint32x4_t high) {
-  const uint16_t* entries = table.data();
-  uint16x8_t v = vld1q_dup_u16(lowEntry(entries, lowPair(low)));
-  v = vld1q_lane_u16(highEntry(entries, lowPair(low)), v, 1);
-  v = vld1q_lane_u16(lowEntry(entries, highPair(low)), v, 2);
-  v = vld1q_lane_u16(highEntry(entries, highPair(low)), v, 3);
-  v = vld1q_lane_u16(lowEntry(entries, lowPair(high)), v, 4);
-  v = vld1q_lane_u16(highEntry(entries, lowPair(high)), v, 5);
-  v = vld1q_lane_u16(lowEntry(entries, highPair(high)), v, 6);
-  v = vld1q_lane_u16(highEntry(entries, highPair(high)), v, 7);
-  forget(v);  // its parts would be made a second time where only those are used
-  return v;
-}
+constexpr WideTable kWideGammaTable = wideGammaTable();
 
 template <int nc>
 struct BgrToLab8 {
-  using Vector = uint8x16_t;
   using Src = unsigned char;
   using Dst = unsigned char;
   static constexpr int kSrcChannels = nc;
@@ -86,13 +56,15 @@ struct BgrToLab8 {
   static constexpr int kInFlight = 1;
   static constexpr bool kUniform = true;
 
-  Pixels<uint8x16_t, 3> vector(const Pixels<uint8x16_t, nc>& p) const {
-    const uint8x16_t bytes[3] = {p.c[0], p.c[1], p.c[2]};
-    Light light[3];
-    lookUp(kGammaPlanes, bytes, light);
-    const Half low = half(light[0].half[0], light[1].half[0], light[2].half[0]);
-    const Half high = half(light[0].half[1], light[1].half[1], light[2].half[1]);
-    return {{vcombine_u8(low.l, high.l), vcombine_u8(low.a, high.a), vcombine_u8(low.b, high.b)}};
+  [[gnu::always_inline]] Pixels<Bytes, 3> vector(const Pixels<Bytes, nc>& p) const {
+    const Bytes bytes[3] = {p.c[0], p.c[1], p.c[2]};
+    Two<Halves> light[3];
+    lookUp(kWideGammaTable, bytes, light);
+    const auto low = roots(light[0].low, light[1].low, light[2].low);
+    const auto high = roots(light[0].high, light[1].high, light[2].high);
+    return {{narrow(Two<Halves>{lightness(low.c[1]), lightness(high.c[1])}),
+             opponent({low.c[0] - low.c[1], high.c[0] - high.c[1]}, kAScale),
+             opponent({low.c[1] - low.c[2], high.c[1] - high.c[2]}, kBScale)}};
   }
 
   void scalar(const unsigned char* in, unsigned char* out) const {
@@ -110,61 +82,33 @@ struct BgrToLab8 {
   }
 
  private:
-  // L, a and b of 8 pixels.
-  struct Half {
-    uint8x8_t l, a, b;
-  };
+  using Coordinate = WeighedHalves<kWeightShift>;
 
   static int root(LinearWeights weights, int b, int g, int r) {
     return kCubeRootTable[static_cast<size_t>(
         (g * weights.g + b * weights.b + r * weights.r + (1 << (kWeightShift - 1))) >> kWeightShift)];
   }
 
-  // Weights of B, G and R in a register, from lane 0.
-  static uint16x4_t lanes(LinearWeights weights) {
-    const uint16_t all[4] = {weights.b, weights.g, weights.r};
-    uint16x4_t v = vld1_u16(all);
-    forget(v);  // constants would be made one to a register
-    return v;
-  }
-
-  static uint32x4_t coordinate(uint16x4_t weights, uint16x4_t b, uint16x4_t g, uint16x4_t r) {
-    uint32x4_t sum = vmull_u16(b, vdup_lane_u16(weights, 0));
-    sum = vmlal_u16(sum, g, vdup_lane_u16(weights, 1));
-    sum = vmlal_u16(sum, r, vdup_lane_u16(weights, 2));
-    return vrshrq_n_u32(sum, kWeightShift);
-  }
-
-  static uint16x8_t root(uint16x4_t weights, uint16x8_t b, uint16x8_t g, uint16x8_t r) {
-    return gather(kCubeRootTable, coordinate(weights, vget_low_u16(b), vget_low_u16(g), vget_low_u16(r)),
-                  coordinate(weights, vget_high_u16(b), vget_high_u16(g), vget_high_u16(r)));
+  // f of X, Y and Z.
+  [[gnu::always_inline]] Pixels<Halves, 3> roots(Halves b, Halves g, Halves r) const {
+    const uint16_t* const table = kCubeRootTable.data();
+    return {{lookUp(table, x_(b, g, r)), lookUp(table, y_(b, g, r)), lookUp(table, z_(b, g, r))}};
   }
 
   // (296 f(Y) - 1320550) >> 15, as the high half of twice the bracket.
-  static uint16x4_t lightness(uint16x4_t root) {
-    return vsubhn_u32(vmull_n_u16(root, 2 * kLightnessScale), vdupq_n_u32(2 * kLightnessOffset));
+  static Halves lightness(Halves root) {
+    return multiplySubtractHigh(root, 2 * kLightnessScale, 2 * kLightnessOffset);
   }
 
   // (scale * difference + 128.5 * 32768) >> 15, clamped to a byte: the difference of two roots fits a signed
-  // lane, the rounding doubling high product is (scale * difference + 16384) >> 15, and 128 more after
-  // saturation to a signed byte is the clamp.
-  static uint8x8_t opponent(uint16x8_t from, uint16x8_t to, int scale) {
-    const int16x8_t difference = vreinterpretq_s16_u16(vsubq_u16(from, to));
-    const int8x8_t centred = vqmovn_s16(vqrdmulhq_n_s16(difference, static_cast<int16_t>(scale)));
-    return veor_u8(vreinterpret_u8_s8(centred), vdup_n_u8(0x80));
+  // lane, and 128 more after saturation to a signed byte is the clamp.
+  static Bytes opponent(const Two<Halves>& difference, int16_t scale) {
+    return (Bytes)narrowSigned(multiplyRounded(asSigned(difference), scale)) ^ splat<Bytes>(0x80);
   }
 
-  [[gnu::always_inline]] Half half(uint16x8_t b, uint16x8_t g, uint16x8_t r) const {
-    const uint16x8_t x = root(x_, b, g, r);
-    const uint16x8_t y = root(y_, b, g, r);
-    const uint16x8_t z = root(z_, b, g, r);
-    return {vmovn_u16(vcombine_u16(lightness(vget_low_u16(y)), lightness(vget_high_u16(y)))),
-            opponent(x, y, kAScale), opponent(y, z, kBScale)};
-  }
-
-  uint16x4_t x_ = lanes(kXWeights);
-  uint16x4_t y_ = lanes(kYWeights);
-  uint16x4_t z_ = lanes(kZWeights);
+  Coordinate x_{kXWeights.b, kXWeights.g, kXWeights.r};
+  Coordinate y_{kYWeights.b, kYWeights.g, kYWeights.r};
+  Coordinate z_{kZWeights.b, kZWeights.g, kZWeights.r};
 };
 
 // The roots lie in 4520..32768, so that their differences fit 16 bits.

@@ -8,6 +8,7 @@
 #include <cstdint>
 
 #include "simd/neon.h"
+#include "simd/registers.h"
 
 namespace HPC::fastcv::arm {
 
@@ -194,6 +195,12 @@ inline Halves addRounded(Halves sum, const Two<Halves>& a) {
   return vrsraq_n_u16(vrsraq_n_u16(sum, a.low, n), a.high, n);
 }
 
+/// (a factor - offset) >> 16
+inline Halves multiplySubtractHigh(Halves a, uint16_t factor, uint32_t offset) {
+  const uint16x4_t low = vsubhn_u32(vmull_n_u16(vget_low_u16(a), factor), splat<Words>(offset));
+  return vsubhn_high_u32(low, vmull_high_n_u16(a, factor), splat<Words>(offset));
+}
+
 // ---- narrowing
 
 /// (a + 2^(n-1)) >> n, limited to a byte.
@@ -208,6 +215,8 @@ inline Bytes narrowRounded(const Two<Halves>& a) {
 }
 /// Limited to a byte, and to a signed one.
 inline Bytes narrow(const Two<SignedHalves>& a) { return vqmovun_high_s16(vqmovun_s16(a.low), a.high); }
+/// Of lanes that are bytes.
+inline Bytes narrow(const Two<Halves>& a) { return vuzp1q_u8((Bytes)a.low, (Bytes)a.high); }
 inline SignedBytes narrowSigned(const Two<SignedHalves>& a) {
   return vqmovn_high_s16(vqmovn_s16(a.low), a.high);
 }
@@ -371,7 +380,7 @@ template <int n>
 class WeighedHalves {
  public:
   WeighedHalves(uint16_t f0, uint16_t f1, uint16_t f2) : factors_{f0, f1, f2} {
-    asm("" : "+w"(factors_));  // constants would be made one to a register
+    forget(factors_);  // constants would be made one to a register
   }
 
   /// (f0 a + f1 b + f2 c + 2^(n-1)) >> n in 32 bits.
@@ -476,6 +485,19 @@ inline Words lookUp(const uint32_t* table, Words index) {
   entry = vld1q_lane_u32(highEntry(table, lowPair(index)), entry, 1);
   entry = vld1q_lane_u32(lowEntry(table, highPair(index)), entry, 2);
   return vld1q_lane_u32(highEntry(table, highPair(index)), entry, 3);
+}
+
+inline Halves lookUp(const uint16_t* table, const Two<Words>& index) {
+  Halves entry = vld1q_dup_u16(lowEntry(table, lowPair(index.low)));
+  entry = vld1q_lane_u16(highEntry(table, lowPair(index.low)), entry, 1);
+  entry = vld1q_lane_u16(lowEntry(table, highPair(index.low)), entry, 2);
+  entry = vld1q_lane_u16(highEntry(table, highPair(index.low)), entry, 3);
+  entry = vld1q_lane_u16(lowEntry(table, lowPair(index.high)), entry, 4);
+  entry = vld1q_lane_u16(highEntry(table, lowPair(index.high)), entry, 5);
+  entry = vld1q_lane_u16(lowEntry(table, highPair(index.high)), entry, 6);
+  entry = vld1q_lane_u16(highEntry(table, highPair(index.high)), entry, 7);
+  forget(entry);  // its parts would be made a second time where only those are used
+  return entry;
 }
 
 /// Four constants, here in one register: a multiplication by `at<i>()` takes its factor from lane i.

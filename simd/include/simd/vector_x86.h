@@ -385,12 +385,22 @@ inline Halves addRounded(Halves sum, const Two<Halves>& a) {
   return sum + ((a.low + kHalf) >> n) + ((a.high + kHalf) >> n);
 }
 
+/// (a factor - offset) >> 16, from 0 on.
+inline Halves multiplySubtractHigh(Halves a, uint16_t factor, uint32_t offset) {
+  const Halves factors = kept(splat<Halves>(factor)), low = a * factors;
+  const auto borrow = (Halves)(low < splat<Halves>(static_cast<uint16_t>(offset)));
+  const auto high = x86::as<Halves>(_mm256_mulhi_epu16(x86::m(a), x86::m(factors)));
+  return high + borrow - static_cast<uint16_t>(offset >> 16);
+}
+
 // ---- narrowing
 
 /// Limited to a byte, and to a signed one.
 inline Bytes narrow(const Two<SignedHalves>& a) {
   return x86::as<Bytes>(_mm256_packus_epi16(x86::m(a.low), x86::m(a.high)));
 }
+/// Of lanes that are bytes.
+inline Bytes narrow(const Two<Halves>& a) { return narrow(asSigned(a)); }
 inline SignedBytes narrowSigned(const Two<SignedHalves>& a) {
   return x86::as<SignedBytes>(_mm256_packs_epi16(x86::m(a.low), x86::m(a.high)));
 }
