@@ -5,8 +5,10 @@
 
 #include <algorithm>
 #include <cmath>
+#include <cstring>
 
-#include "simd/neon.h"
+#include "lanes.h"
+#include "simd/loop.h"
 
 namespace kyengine {
 namespace {
@@ -29,86 +31,60 @@ constexpr Boundary kBoundaries[] = {
     {250, 91},   // (0.5000 - 0.1736) / (0.9848 - 0.8660)
 };
 
-// A gradient's direction, by the boundaries that are behind it and the quarter that it is in.
-constexpr int kToTheLeft = 8;
-constexpr int kUpwards = 16;
-constexpr uint8_t kDirectionOf[32] = {0, 1,  2,  3,  4,  0, 0, 0,   // right and down
-                                      9, 8,  7,  6,  5,  0, 0, 0,   // left and down
-                                      0, 17, 16, 15, 14, 0, 0, 0,   // right and up
-                                      9, 10, 11, 12, 13, 0, 0, 0};  // left and up
+/// The direction of a gradient that has `beyond` boundaries of its quarter behind it, counted from the
+/// horizontal; of bytes, or of 16 of them.
+template <typename Truth, typename Number>
+Number DirectionOf(Truth upwards, Truth to_the_left, Number beyond) {
+  constexpr int kLeft = kDirections / 2;
+  const Number right = upwards ? kDirections - beyond : beyond;
+  return to_the_left ? (upwards ? kLeft + beyond : kLeft - beyond) : right == kDirections ? Number{} : right;
+}
 
-void FindGradient(const uint8_t* above, const uint8_t* row, const uint8_t* below, int x, uint8_t* direction,
-                  float* length) {
+void FindGradient(const uint8_t* above, const uint8_t* row, const uint8_t* below, ptrdiff_t x,
+                  uint8_t* direction, float* length) {
   const int dx = row[x + 1] - row[x - 1];
   const int dy = below[x] - above[x];
   const int across = std::abs(dx);
   const int along = std::abs(dy);
-  int index = 0;
+  int beyond = 0;
   for (const Boundary& b : kBoundaries) {
-    index += along * b.q > across * b.p ? 1 : 0;
+    beyond += along * b.q > across * b.p ? 1 : 0;
   }
-  index += dy < 0 ? kUpwards : 0;
-  index += dx < 0 || (dx == 0 && dy < 0) ? kToTheLeft : 0;
-  *direction = kDirectionOf[index];
+  const bool upwards = dy < 0;
+  const bool to_the_left = upwards ? dx <= 0 : dx < 0;
+  *direction = static_cast<uint8_t>(DirectionOf(upwards, to_the_left, beyond));
   *length = std::sqrt(static_cast<float>(dx * dx + dy * dy));
 }
 
-/// Square roots of whole numbers. Two Newton-Raphson steps from the estimate of the reciprocal take an
-/// in-order core a fraction of what its instruction for roots takes.
-float32x4_t Root(uint32x4_t squares) {
-  const float32x4_t x = vcvtq_f32_u32(squares);
-#if defined(__ARM_NEON)
-  // 0 has no reciprocal.
-  const float32x4_t positive = vcvtq_f32_u32(vmaxq_u32(squares, vdupq_n_u32(1)));
-  float32x4_t r = vrsqrteq_f32(positive);
-  r = vmulq_f32(r, vrsqrtsq_f32(vmulq_f32(positive, r), r));
-  r = vmulq_f32(r, vrsqrtsq_f32(vmulq_f32(positive, r), r));
-  return vmulq_f32(x, r);
-#else
-  float roots[4];
-  vst1q_f32(roots, x);
-  for (float& root : roots) {
-    root = std::sqrt(root);
-  }
-  return vld1q_f32(roots);
-#endif
-}
-
 /// The gradients of 16 pixels from `x` on.
-void FindGradients16(const uint8_t* above, const uint8_t* row, const uint8_t* below, int x,
+void FindGradients16(const uint8_t* above, const uint8_t* row, const uint8_t* below, ptrdiff_t x,
                      uint8_t* directions, float* lengths) {
-  const uint8x16_t left = vld1q_u8(row + x - 1);
-  const uint8x16_t right = vld1q_u8(row + x + 1);
-  const uint8x16_t up = vld1q_u8(above + x);
-  const uint8x16_t down = vld1q_u8(below + x);
-  const uint8x16_t across = vabdq_u8(right, left);
-  const uint8x16_t along = vabdq_u8(down, up);
-
-  uint16x8_t low = vdupq_n_u16(0);
-  uint16x8_t high = vdupq_n_u16(0);
-  for (const Boundary& b : kBoundaries) {
-    const uint8x16_t p = vdupq_n_u8(b.p);
-    const uint8x16_t q = vdupq_n_u8(b.q);
-    // A lane of a comparison is -1 where it holds.
-    low = vsubq_u16(low, vcgtq_u16(vmull_u8(vget_low_u8(along), vget_low_u8(q)),
-                                   vmull_u8(vget_low_u8(across), vget_low_u8(p))));
-    high = vsubq_u16(high, vcgtq_u16(vmull_high_u8(along, q), vmull_high_u8(across, p)));
-  }
-  const uint8x16_t upwards = vcltq_u8(down, up);
-  const uint8x16_t to_the_left = vbslq_u8(upwards, vcleq_u8(right, left), vcltq_u8(right, left));
-  uint8x16_t index = vcombine_u8(vmovn_u16(low), vmovn_u16(high));
-  index = vorrq_u8(index, vandq_u8(upwards, vdupq_n_u8(kUpwards)));
-  index = vorrq_u8(index, vandq_u8(to_the_left, vdupq_n_u8(kToTheLeft)));
-  const uint8x16x2_t direction_of = {{vld1q_u8(kDirectionOf), vld1q_u8(kDirectionOf + 16)}};
-  vst1q_u8(directions + x, vqtbl2q_u8(direction_of, index));
-
-  const auto store_lengths = [](uint16x8_t a, uint16x8_t b, float* to) {
-    vst1q_f32(to, Root(vaddl_u16(vget_low_u16(a), vget_low_u16(b))));
-    vst1q_f32(to + 4, Root(vaddl_high_u16(a, b)));
+  using Bytes = Sixteen<uint8_t>;
+  using Halves = Sixteen<uint16_t>;
+  using Words = Sixteen<int32_t>;
+  const Bytes left = LoadSixteen(row + x - 1);
+  const Bytes right = LoadSixteen(row + x + 1);
+  const Bytes up = LoadSixteen(above + x);
+  const Bytes down = LoadSixteen(below + x);
+  const auto distance = [](Bytes a, Bytes b) {
+    return __builtin_convertvector(a > b ? a - b : b - a, Halves);
   };
-  store_lengths(vmull_u8(vget_low_u8(across), vget_low_u8(across)),
-                vmull_u8(vget_low_u8(along), vget_low_u8(along)), lengths + x);
-  store_lengths(vmull_high_u8(across, across), vmull_high_u8(along, along), lengths + x + 8);
+  const Halves across = distance(right, left);
+  const Halves along = distance(down, up);
+
+  Halves beyond = {};
+  for (const Boundary& b : kBoundaries) {
+    // A lane of a comparison is -1 where it holds.
+    beyond -= (Halves)(along * b.q > across * b.p);
+  }
+  const auto upwards = down < up;
+  const auto to_the_left = upwards ? right <= left : right < left;
+  const Bytes direction = DirectionOf(upwards, to_the_left, __builtin_convertvector(beyond, Bytes));
+  std::memcpy(directions + x, &direction, sizeof(direction));
+
+  const auto squares =
+      __builtin_convertvector(across * across, Words) + __builtin_convertvector(along * along, Words);
+  Store(Root(LanesOf(squares)), lengths + x);
 }
 
 // ---- votes
@@ -122,37 +98,46 @@ struct Votes {
   float of[2][kSlots][4];
 };
 
+void StoreFour(float* p, Four four) { std::memcpy(p, &four, sizeof(four)); }
+
+/// sum + a b of each, rounded once.
+Four MultiplyAdd(Four sum, Four a, float b) {
+  for (int i = 0; i < 4; ++i) {
+    sum[i] = std::fma(a[i], b, sum[i]);
+  }
+  return sum;
+}
+
 /// Votes `length` times `weight` for each direction, of one pixel for each half.
-void VoteOfTwo(Votes& votes, uint8_t direction0, float32x4_t weight0, float length0, uint8_t direction1,
-               float32x4_t weight1, float length1) {
+void VoteOfTwo(Votes& votes, uint8_t direction0, const float* weight0, float length0, uint8_t direction1,
+               const float* weight1, float length1) {
   float* const slot0 = votes.of[0][direction0];
   float* const slot1 = votes.of[1][direction1];
-  const float32x4_t sum0 = vfmaq_n_f32(vld1q_f32(slot0), weight0, length0);
-  const float32x4_t sum1 = vfmaq_n_f32(vld1q_f32(slot1), weight1, length1);
-  vst1q_f32(slot0, sum0);
-  vst1q_f32(slot1, sum1);
+  const Four sum0 = MultiplyAdd(LoadFour(slot0), LoadFour(weight0), length0);
+  const Four sum1 = MultiplyAdd(LoadFour(slot1), LoadFour(weight1), length1);
+  StoreFour(slot0, sum0);
+  StoreFour(slot1, sum1);
 }
 
 /// Adds the votes to the four cells' histograms, the upper two and the lower two being neighbours, and clears
 /// them.
 void Cast(Votes& votes, float* top, float* bottom) {
-  const float32x4_t zero = vdupq_n_f32(0);
-  const auto add = [](float* to, float32x4_t v) { vst1q_f32(to, vaddq_f32(vld1q_f32(to), v)); };
+  const auto add = [](float* to, Four v) { StoreFour(to, LoadFour(to) + v); };
   for (int d = 0; d < Votes::kSlots; d += 4) {
-    float32x4_t sum[4];
+    Four sum[4];
     for (int i = 0; i < 4; ++i) {
-      sum[i] = vaddq_f32(vld1q_f32(votes.of[0][d + i]), vld1q_f32(votes.of[1][d + i]));
-      vst1q_f32(votes.of[0][d + i], zero);
-      vst1q_f32(votes.of[1][d + i], zero);
+      sum[i] = LoadFour(votes.of[0][d + i]) + LoadFour(votes.of[1][d + i]);
+      StoreFour(votes.of[0][d + i], Four{});
+      StoreFour(votes.of[1][d + i], Four{});
     }
-    const float32x4_t left02 = vzip1q_f32(sum[0], sum[2]);
-    const float32x4_t left13 = vzip1q_f32(sum[1], sum[3]);
-    const float32x4_t right02 = vzip2q_f32(sum[0], sum[2]);
-    const float32x4_t right13 = vzip2q_f32(sum[1], sum[3]);
-    add(top + d, vzip1q_f32(left02, left13));
-    add(bottom + d, vzip2q_f32(left02, left13));
-    add(top + Votes::kSlots + d, vzip1q_f32(right02, right13));
-    add(bottom + Votes::kSlots + d, vzip2q_f32(right02, right13));
+    const Four left02 = __builtin_shufflevector(sum[0], sum[2], 0, 4, 1, 5);
+    const Four left13 = __builtin_shufflevector(sum[1], sum[3], 0, 4, 1, 5);
+    const Four right02 = __builtin_shufflevector(sum[0], sum[2], 2, 6, 3, 7);
+    const Four right13 = __builtin_shufflevector(sum[1], sum[3], 2, 6, 3, 7);
+    add(top + d, __builtin_shufflevector(left02, left13, 0, 4, 1, 5));
+    add(bottom + d, __builtin_shufflevector(left02, left13, 2, 6, 3, 7));
+    add(top + Votes::kSlots + d, __builtin_shufflevector(right02, right13, 0, 4, 1, 5));
+    add(bottom + Votes::kSlots + d, __builtin_shufflevector(right02, right13, 2, 6, 3, 7));
   }
 }
 
@@ -176,18 +161,11 @@ void Share(int cell, std::vector<float>& weights) {
 
 void FindGradients(const uint8_t* above, const uint8_t* row, const uint8_t* below, int first, int last,
                    uint8_t* directions, float* lengths) {
-  constexpr int kBlock = 16;
-  int x = first;
-  for (; x + kBlock <= last; x += kBlock) {
-    FindGradients16(above, row, below, x, directions, lengths);
-  }
-  if (x < last && last - first >= kBlock) {
-    FindGradients16(above, row, below, last - kBlock, directions, lengths);
-    x = last;
-  }
-  for (; x < last; ++x) {
-    FindGradient(above, row, below, x, directions + x, lengths + x);
-  }
+  const auto tail = last - first >= kLanes ? simd::Tail::kOverlap : simd::Tail::kSteps;
+  simd::walk<kLanes, 1, 1>(
+      last, tail,
+      [=](ptrdiff_t x, simd::Blocks<1>) { FindGradients16(above, row, below, x, directions, lengths); },
+      [=](ptrdiff_t x) { FindGradient(above, row, below, x, directions + x, lengths + x); }, first);
 }
 
 void FeatureMap::Vote(const GrayImage& picture, int cell, int first, int rows) {
@@ -229,15 +207,15 @@ void FeatureMap::Vote(const GrayImage& picture, int cell, int first, int rows) {
           const float* const next_weights = weights + static_cast<ptrdiff_t>(cell) * 4;
           for (int x = left; x < right; ++x) {
             const ptrdiff_t place = static_cast<ptrdiff_t>(x - square_left) * 4;
-            VoteOfTwo(votes, directions[x], vld1q_f32(weights + place), lengths[x],
-                      directions[x + static_cast<ptrdiff_t>(pitch)], vld1q_f32(next_weights + place),
+            VoteOfTwo(votes, directions[x], weights + place, lengths[x],
+                      directions[x + static_cast<ptrdiff_t>(pitch)], next_weights + place,
                       lengths[x + static_cast<ptrdiff_t>(pitch)]);
           }
         } else {
           for (int x = left; x < right; ++x) {
-            const float32x4_t weight = vld1q_f32(weights + static_cast<ptrdiff_t>(x - square_left) * 4);
+            const Four weight = LoadFour(weights + static_cast<ptrdiff_t>(x - square_left) * 4);
             float* const slot = votes.of[0][directions[x]];
-            vst1q_f32(slot, vfmaq_n_f32(vld1q_f32(slot), weight, lengths[x]));
+            StoreFour(slot, MultiplyAdd(LoadFour(slot), weight, lengths[x]));
           }
         }
       }
@@ -264,8 +242,9 @@ void FeatureMap::Normalise(int rows) {
 
   // Each block by its cell at the top left.
   constexpr float kNotZero = 0.0001F;
-  limits_.resize(energies_.size());
-  factors_.resize(energies_.size());
+  // A register may be loaded from the last one on.
+  limits_.resize(energies_.size() + kLanes);
+  factors_.resize(energies_.size() + kLanes);
   for (int r = 0; r + 1 < rows; ++r) {
     const size_t line = static_cast<size_t>(r) * static_cast<size_t>(columns_);
     const float* const upper = &energies_[line];
@@ -279,65 +258,73 @@ void FeatureMap::Normalise(int rows) {
 }
 
 void FeatureMap::Describe(int first_row, int rows, int left) {
-  constexpr int kPitch = 32;
+  using simd::Floats;
+  constexpr int kCells = sizeof(Floats) / sizeof(float);
+  constexpr int kAxes = kDirections / 2;
   constexpr float kTexture = 2 * 0.2357F;
   const int cells = columns_ - 2;
-  described_.resize(static_cast<size_t>(cells + 3) * kPitch);
+  const ptrdiff_t pitch = (cells + kCells - 1) / kCells * kCells;
+  described_.resize(static_cast<size_t>(kFeatures * pitch));
+  // Where the histograms of neighbouring cells begin, in rows of four numbers.
+  simd::Words histograms = {};
+  for (int i = 0; i < kCells; ++i) {
+    histograms[i] = static_cast<uint32_t>(i * (kSlots / 4));
+  }
   for (int r = 0; r < rows; ++r) {
-    for (int c = 0; c < cells; ++c) {
+    // A register at a time, of which the last one may describe what is beyond the last cell.
+    for (int c = 0; c < cells; c += kCells) {
       const size_t block = static_cast<size_t>(r) * static_cast<size_t>(columns_) + static_cast<size_t>(c);
       const size_t below = block + static_cast<size_t>(columns_);
       // In the order of the features that tell of them: the blocks at the bottom right, the top right, the
       // bottom left, the top left.
       const size_t blocks[] = {below + 1, block + 1, below, block};
-      float32x4_t limits[4];
-      float32x4_t factors[4];
+      Floats limits[4];
+      Floats factors[4];
       for (int i = 0; i < 4; ++i) {
-        limits[i] = vdupq_n_f32(limits_[blocks[i]]);
-        factors[i] = vdupq_n_f32(factors_[blocks[i]]);
+        limits[i] = simd::load(&limits_[blocks[i]]);
+        factors[i] = simd::load(&factors_[blocks[i]]);
       }
-      const float* const votes = Histogram(r + 2, c + 2);
-      float* const out = &described_[static_cast<size_t>(c) * kPitch];
+      const auto* const rows_of_four = reinterpret_cast<const float(*)[4]>(Histogram(r + 2, c + 2));
+      float* const out = &described_[static_cast<size_t>(c)];
 
-      float32x4_t shares[4];
-      for (float32x4_t& share : shares) {
-        share = vdupq_n_f32(0);
-      }
+      // Every fourth direction's shares are summed up apart.
+      Floats votes[kSlots];
+      Floats shares[4][4] = {};
       for (int d = 0; d < kSlots; d += 4) {
-        const float32x4_t vote = vld1q_f32(votes + d);
-        float32x4_t sum = vdupq_n_f32(0);
-        for (int i = 0; i < 4; ++i) {
-          const float32x4_t limited = vminq_f32(vote, limits[i]);
-          sum = vfmaq_f32(sum, limited, factors[i]);
-          shares[i] = vfmaq_f32(shares[i], limited, factors[i]);
+        Floats four[4];
+        simd::lookUpRows(rows_of_four + d / 4, histograms, four);
+        for (int k = 0; k < 4; ++k) {
+          votes[d + k] = four[k];
+          Floats sum = {};
+          for (int i = 0; i < 4; ++i) {
+            const Floats limited = simd::min(four[k], limits[i]);
+            sum = simd::multiplyAdd(sum, limited, factors[i]);
+            shares[i][k] = simd::multiplyAdd(shares[i][k], limited, factors[i]);
+          }
+          // What is stored too much is overwritten by what comes next.
+          simd::store(out + (d + k) * pitch, sum);
         }
-        vst1q_f32(out + d, sum);
       }
-      // What is written too much is overwritten by what comes next.
-      constexpr int kAxes = kDirections / 2;
-      for (int d = 0; d < kAxes; d += 4) {
-        const float32x4_t vote = vaddq_f32(vld1q_f32(votes + d), vld1q_f32(votes + d + kAxes));
-        float32x4_t sum = vdupq_n_f32(0);
+      for (int d = 0; d < kAxes; ++d) {
+        const Floats vote = votes[d] + votes[d + kAxes];
+        Floats sum = {};
         for (int i = 0; i < 4; ++i) {
-          sum = vfmaq_f32(sum, vminq_f32(vote, limits[i]), factors[i]);
+          sum = simd::multiplyAdd(sum, simd::min(vote, limits[i]), factors[i]);
         }
-        vst1q_f32(out + kDirections + d, sum);
+        simd::store(out + (kDirections + d) * pitch, sum);
       }
-      const float32x4_t texture =
-          vpaddq_f32(vpaddq_f32(shares[0], shares[1]), vpaddq_f32(shares[2], shares[3]));
-      vst1q_f32(out + kDirections + kAxes, vmulq_n_f32(texture, kTexture));
+      for (int i = 0; i < 4; ++i) {
+        const Floats texture = (shares[i][0] + shares[i][1]) + (shares[i][2] + shares[i][3]);
+        simd::store(out + (kDirections + kAxes + i) * pitch, texture * simd::splat<Floats>(kTexture));
+      }
     }
 
-    // From cell by cell to plane by plane; a plane's margin takes what is beyond the last cell.
     const size_t plane = static_cast<size_t>(rows_) * static_cast<size_t>(stride_);
+    const size_t begin =
+        static_cast<size_t>(first_row + r) * static_cast<size_t>(stride_) + static_cast<size_t>(left);
     for (int f = 0; f < kFeatures; ++f) {
-      float* const to = &features_[static_cast<size_t>(f) * plane +
-                                   static_cast<size_t>(first_row + r) * static_cast<size_t>(stride_) +
-                                   static_cast<size_t>(left)];
-      const float* const from = &described_[static_cast<size_t>(f)];
-      for (int c = 0; c < cells; ++c) {
-        to[c] = from[static_cast<size_t>(c) * kPitch];
-      }
+      std::copy_n(&described_[static_cast<size_t>(f * pitch)], cells,
+                  &features_[static_cast<size_t>(f) * plane + begin]);
     }
   }
 }

@@ -47,17 +47,45 @@ inline void Store(const Lanes& a, float* p) {
   }
 }
 
-/// Sixteen bytes less `zero`.
-inline Lanes LoadBytes(const uint8_t* p, uint8_t zero) {
-  typedef uint8_t Bytes __attribute__((vector_size(kLanes)));
-  typedef int16_t Halves __attribute__((vector_size(2 * kLanes)));
-  typedef int32_t Words __attribute__((vector_size(4 * kLanes)));
-  typedef float Floats __attribute__((vector_size(4 * kLanes)));
-  Bytes bytes;
+/// Sixteen numbers in as many bytes as they take, or four floats in 16 bytes: whole registers or parts of
+/// one.
+template <typename T>
+using Sixteen __attribute__((vector_size(kLanes * sizeof(T)))) = T;
+typedef float Four __attribute__((vector_size(16)));
+
+inline Sixteen<uint8_t> LoadSixteen(const uint8_t* p) {
+  Sixteen<uint8_t> bytes;
   std::memcpy(&bytes, p, sizeof(bytes));
-  const Halves numbers =
-      __builtin_convertvector(bytes, Halves) - __builtin_convertvector(Bytes{} + zero, Halves);
-  return std::bit_cast<Lanes>(__builtin_convertvector(__builtin_convertvector(numbers, Words), Floats));
+  return bytes;
+}
+inline Four LoadFour(const float* p) {
+  Four four;
+  std::memcpy(&four, p, sizeof(four));
+  return four;
+}
+
+/// Whole numbers as floats.
+template <typename T>
+inline Lanes LanesOf(const T& numbers) {
+  return std::bit_cast<Lanes>(
+      __builtin_convertvector(__builtin_convertvector(numbers, Sixteen<int32_t>), Sixteen<float>));
+}
+
+/// Sixteen bytes less `zero`.
+inline Lanes LoadBytes(const uint8_t* p, uint8_t zero = 0) {
+  using Numbers = Sixteen<int16_t>;
+  return LanesOf(__builtin_convertvector(LoadSixteen(p), Numbers) -
+                 __builtin_convertvector(Sixteen<uint8_t>{} + zero, Numbers));
+}
+
+/// Stores the whole parts of numbers from 0 to 255.
+inline void StoreBytes(const Lanes& a, uint8_t* p) {
+  Sixteen<float> numbers;
+  std::memcpy(&numbers, &a, sizeof(numbers));
+  const auto whole = __builtin_convertvector(numbers, Sixteen<int32_t>);
+  const auto bytes =
+      __builtin_convertvector(__builtin_convertvector(whole, Sixteen<int16_t>), Sixteen<uint8_t>);
+  std::memcpy(p, &bytes, sizeof(bytes));
 }
 
 inline Lanes operator+(const Lanes& a, const Lanes& b) {
@@ -73,6 +101,11 @@ inline Lanes operator*(const Lanes& a, const Lanes& b) {
 /// Of a NaN in `b` it makes one.
 inline Lanes Max(const Lanes& a, const Lanes& b) {
   return EachOf([&](size_t i) { return simd::max(b.v[i], a.v[i]); });
+}
+
+/// Square roots of whole numbers.
+inline Lanes Root(const Lanes& a) {
+  return EachOf([&](size_t i) { return simd::rootOfWhole(a.v[i]); });
 }
 
 /// sum + a b, rounded once.
@@ -100,11 +133,10 @@ inline void AddProducts(Lanes (&sums)[count], const float* weights, const float*
 template <int count>
 inline void AddFourProducts(Lanes (&sums)[count], const float* weights, const float* const (&x)[count]) {
   // On Arm the four numbers of a pixel come with one load and are multiplied from their lanes.
-  typedef float Four __attribute__((vector_size(16)));
   Four four[count];
 #pragma GCC unroll 8
   for (int i = 0; i < count; ++i) {
-    std::memcpy(&four[i], x[i], sizeof(Four));
+    four[i] = LoadFour(x[i]);
   }
 #pragma GCC unroll 4
   for (int k = 0; k < 4; ++k) {

@@ -4,11 +4,14 @@
 #include "resize.h"
 
 #include <algorithm>
+#include <bit>
 #include <cmath>
 #include <cstddef>
 #include <cstdint>
+#include <cstring>
 
-#include "simd/neon.h"
+#include "lanes.h"
+#include "simd/loop.h"
 
 namespace kyengine {
 namespace {
@@ -29,45 +32,66 @@ Place PlaceOf(int i, int count, int among) {
   return {first, static_cast<float>(at - first)};
 }
 
-/// a + (b - a) way of each of `count` bytes. The result has room for whole vectors.
+/// Works on blocks of 16 of `count` results, the last of which may be done again, or on single ones where
+/// there are fewer.
+template <typename Block, typename Single>
+void InBlocks(int count, Block block, Single single) {
+  simd::walk<kLanes, 1, 1>(
+      count, simd::Tail::kOverlap, [&](ptrdiff_t x, simd::Blocks<1>) { block(x); }, single);
+}
+
+/// a + (b - a) way of each of `count` bytes.
 void Blend(const uint8_t* a, const uint8_t* b, float way, int count, float* result) {
-  constexpr int kBlock = 8;
-  int x = 0;
-  for (; x + kBlock <= count; x += kBlock) {
-    const uint16x8_t from = vmovl_u8(vld1_u8(a + x));
-    const int16x8_t by = vreinterpretq_s16_u16(vsubl_u8(vld1_u8(b + x), vld1_u8(a + x)));
-    vst1q_f32(result + x, vfmaq_n_f32(vcvtq_f32_u32(vmovl_u16(vget_low_u16(from))),
-                                      vcvtq_f32_s32(vmovl_s16(vget_low_s16(by))), way));
-    vst1q_f32(result + x + 4,
-              vfmaq_n_f32(vcvtq_f32_u32(vmovl_high_u16(from)), vcvtq_f32_s32(vmovl_high_s16(by)), way));
-  }
-  for (; x < count; ++x) {
-    result[x] = std::fma(static_cast<float>(b[x] - a[x]), way, static_cast<float>(a[x]));
-  }
+  InBlocks(
+      count,
+      [=](ptrdiff_t x) {
+        const Lanes from = LoadBytes(a + x);
+        Store(MultiplyAdd(from, LoadBytes(b + x) - from, Broadcast(way)), result + x);
+      },
+      [=](ptrdiff_t x) {
+        result[x] = std::fma(static_cast<float>(b[x] - a[x]), way, static_cast<float>(a[x]));
+      });
 }
 
-/// The same between neighbours of a row, for four results.
-uint32x4_t Between4(const float* row, const int* columns, const float* ways) {
-  const float32x4_t a = vcombine_f32(vld1_f32(row + columns[0]), vld1_f32(row + columns[1]));
-  const float32x4_t b = vcombine_f32(vld1_f32(row + columns[2]), vld1_f32(row + columns[3]));
-  const float32x4_t left = vuzp1q_f32(a, b);
-  const float32x4_t right = vuzp2q_f32(a, b);
-  const float32x4_t value = vfmaq_f32(left, vsubq_f32(right, left), vld1q_f32(ways));
-  return vcvtq_u32_f32(vaddq_f32(value, vdupq_n_f32(0.5F)));
+/// The number of `row` at each of 16 columns, and the one after it.
+struct Neighbours {
+  Lanes left;
+  Lanes right;
+};
+Neighbours LoadNeighbours(const float* row, const int* columns) {
+  typedef uint64_t Pairs __attribute__((vector_size(32)));
+  typedef float Eight __attribute__((vector_size(32)));
+  const auto pair = [=](int i) {
+    uint64_t two;
+    std::memcpy(&two, row + columns[i], sizeof(two));
+    return two;
+  };
+  Eight left[2];
+  Eight right[2];
+#pragma GCC unroll 2
+  for (int i = 0; i < 2; ++i) {
+    const int k = 8 * i;
+    const auto a = (Eight)Pairs{pair(k), pair(k + 1), pair(k + 4), pair(k + 5)};
+    const auto b = (Eight)Pairs{pair(k + 2), pair(k + 3), pair(k + 6), pair(k + 7)};
+    left[i] = __builtin_shufflevector(a, b, 0, 2, 8, 10, 4, 6, 12, 14);
+    right[i] = __builtin_shufflevector(a, b, 1, 3, 9, 11, 5, 7, 13, 15);
+  }
+  return {std::bit_cast<Lanes>(left), std::bit_cast<Lanes>(right)};
 }
 
+/// The same between neighbours of a row, rounded to bytes.
 void Between(const float* row, const int* columns, const float* ways, int count, uint8_t* result) {
-  constexpr int kBlock = 8;
-  int x = 0;
-  for (; x + kBlock <= count; x += kBlock) {
-    const uint16x4_t low = vmovn_u32(Between4(row, columns + x, ways + x));
-    const uint16x4_t high = vmovn_u32(Between4(row, columns + x + 4, ways + x + 4));
-    vst1_u8(result + x, vmovn_u16(vcombine_u16(low, high)));
-  }
-  for (; x < count; ++x) {
-    const float* const left = row + columns[x];
-    result[x] = static_cast<uint8_t>(std::fma(left[1] - left[0], ways[x], left[0]) + 0.5F);
-  }
+  InBlocks(
+      count,
+      [=](ptrdiff_t x) {
+        const Neighbours of = LoadNeighbours(row, columns + x);
+        const Lanes value = MultiplyAdd(of.left, of.right - of.left, Load(ways + x));
+        StoreBytes(value + Broadcast(0.5F), result + x);
+      },
+      [=](ptrdiff_t x) {
+        const float* const left = row + columns[x];
+        result[x] = static_cast<uint8_t>(std::fma(left[1] - left[0], ways[x], left[0]) + 0.5F);
+      });
 }
 
 }  // namespace

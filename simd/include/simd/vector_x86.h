@@ -688,6 +688,9 @@ inline bool areBelow2(Floats a, Floats b) {
   return _mm256_testz_si256(bits, _mm256_set1_epi32(static_cast<int>(0xc0000000u))) != 0;
 }
 
+/// Square roots of whole numbers.
+inline Floats rootOfWhole(Floats v) { return std::bit_cast<Floats>(_mm256_sqrt_ps(x86::m(v))); }
+
 // ---- floats and their bits
 
 /// Of a NaN in `a` these make the number in `b`.
