@@ -7,7 +7,6 @@
 #include "plane_kernels.h"
 
 #include <algorithm>
-#include <array>
 
 #include "simd/copy.h"
 #include "simd/loop.h"
@@ -188,60 +187,61 @@ void decodeTransposed(const PlanesView& view, const PixelRows& to) {
 
 // ---- copies
 
-/// Copies a row of at least 16 bytes in registers, each rearranged by `order`, and their order reversed where
-/// `mirrored`.
-template <bool mirrored>
-void rearrangeRow(const Byte* src, Byte* dst, ptrdiff_t size, uint8x16_t order) {
-  const auto move = [=](ptrdiff_t x, auto registers) {
+constexpr ptrdiff_t kRegister = sizeof(Bytes);
+static_assert(kRegister <= kKernelSide);
+
+/// Pairs of bytes with their bytes exchanged.
+inline Bytes exchanged(Bytes v) {
+  static constexpr unsigned char kOrder[] = {1, 0, 3, 2, 5, 4, 7, 6, 9, 8, 11, 10, 13, 12, 15, 14};
+  return shuffled(v, kOrder);
+}
+
+/// Copies a row of at least a register, each register rearranged, and their order reversed where `mirrored`.
+template <bool mirrored, typename Rearranged>
+void rearrangeRow(const Byte* src, Byte* dst, ptrdiff_t size, const Rearranged& rearranged) {
+  const auto move = [&](ptrdiff_t x, auto registers) {
     constexpr int kCount = registers;
-    const Byte* from = src + (mirrored ? size - x - 16 * kCount : x);
-    uint8x16_t v[kCount];
+    const Byte* from = src + (mirrored ? size - x - kRegister * kCount : x);
+    Bytes v[kCount];
     for (int i = 0; i < kCount; ++i) {
-      v[i] = vqtbl1q_u8(vld1q_u8(from + 16 * (mirrored ? kCount - 1 - i : i)), order);
+      v[i] = rearranged(load(from + kRegister * (mirrored ? kCount - 1 - i : i)));
     }
     for (int i = 0; i < kCount; ++i) {
-      vst1q_u8(dst + x + 16 * i, v[i]);
+      store(dst + x + kRegister * i, v[i]);
     }
   };
+  constexpr int kInFlight = 8;
   ptrdiff_t x = 0;
-  for (; x <= size - 128; x += 128) {
-    move(x, std::integral_constant<int, 8>{});
+  for (; x <= size - kInFlight * kRegister; x += kInFlight * kRegister) {
+    move(x, std::integral_constant<int, kInFlight>{});
   }
-  for (; x <= size - 16; x += 16) {
+  for (; x <= size - kRegister; x += kRegister) {
     move(x, std::integral_constant<int, 1>{});
   }
   if (x < size) {
-    move(size - 16, std::integral_constant<int, 1>{});
+    move(size - kRegister, std::integral_constant<int, 1>{});
   }
 }
 
-/// The places of a register's bytes: from its end where mirrored, in units of 1 or 2 bytes; with the bytes of
-/// each pair exchanged where `swapped`.
-uint8x16_t orderOf(int bytes, bool mirrored, bool swapped) {
-  std::array<Byte, 16> order;
-  for (int i = 0; i < 16; ++i) {
-    const int unit = mirrored ? 16 / bytes - 1 - i / bytes : i / bytes;
-    order[i] = static_cast<Byte>(unit * bytes + (swapped ? 1 - i % bytes : i % bytes));
-  }
-  return vld1q_u8(order.data());
-}
-
-void copyPixels(int bytes, ptrdiff_t height, ptrdiff_t size, const Byte* src, ptrdiff_t stride, bool mirrored,
+/// Copies rows of `size` bytes, pixels of `bytes` bytes, with the bytes of each exchanged where `swapped`.
+template <int bytes>
+void copyPixels(ptrdiff_t height, ptrdiff_t size, const Byte* src, ptrdiff_t stride, bool mirrored,
                 bool swapped, const PixelRows& to) {
   if (!mirrored && !swapped) {
     copyRows(height, size, src, stride, to.data, to.stride);
     return;
   }
-  const uint8x16_t order = orderOf(bytes, mirrored, swapped);
   for (ptrdiff_t row = 0; row < height; ++row) {
-    (mirrored ? rearrangeRow<true> : rearrangeRow<false>)(src + row * stride, to.data + row * to.stride, size,
-                                                          order);
+    const Byte* const from = src + row * stride;
+    Byte* const out = to.data + row * to.stride;
+    if (!mirrored) {
+      rearrangeRow<false>(from, out, size, [](Bytes v) { return exchanged(v); });
+    } else if (bytes == 1 || swapped) {
+      rearrangeRow<true>(from, out, size, [](Bytes v) { return reversed<Bytes, 1>(v); });
+    } else {
+      rearrangeRow<true>(from, out, size, [](Bytes v) { return reversed<Bytes, bytes>(v); });
+    }
   }
-}
-
-inline uint8x16_t reversedBytes(uint8x16_t v) {
-  static constexpr unsigned char kOrder[] = {15, 14, 13, 12, 11, 10, 9, 8, 7, 6, 5, 4, 3, 2, 1, 0};
-  return vqtbl1q_u8(v, vld1q_u8(kOrder));
 }
 
 /// Interleaves rows of samples of two planes.
@@ -249,10 +249,9 @@ template <bool mirrored>
 void interleaveRow(const Byte* first, const Byte* second, Byte* dst, ptrdiff_t samples) {
   const auto move = [=](ptrdiff_t x) {
     const ptrdiff_t from = mirrored ? samples - x - 16 : x;
-    const uint8x16_t a = vld1q_u8(first + from);
-    const uint8x16_t b = vld1q_u8(second + from);
-    const uint8x16x2_t both = {{mirrored ? reversedBytes(a) : a, mirrored ? reversedBytes(b) : b}};
-    vst2q_u8(dst + 2 * x, both);
+    const Part a = loadAs<Part>(first + from);
+    const Part b = loadAs<Part>(second + from);
+    storeInTurn(dst + 2 * x, mirrored ? reversed<Part, 1>(a) : a, mirrored ? reversed<Part, 1>(b) : b);
   };
   forEachBlock(samples, 16, move);
 }
@@ -262,33 +261,34 @@ inline void copyLumaBlock(const Scratch& scratch, ptrdiff_t pairs, Byte* to, ptr
   const Byte* from = scratch.luma[0][0][0];
   KERNEL_ROLLED_LOOP
   for (; pairs != 0; --pairs) {
-    const uint8x16_t v[] = {vld1q_u8(from), vld1q_u8(from + 32), vld1q_u8(from + 16), vld1q_u8(from + 48)};
+    const Part v[] = {loadAs<Part>(from), loadAs<Part>(from + 32), loadAs<Part>(from + 16),
+                      loadAs<Part>(from + 48)};
     from += 64;
     for (int row = 0; row < 2; ++row) {
-      vst1q_u8(to, v[2 * row]);
-      vst1q_u8(to + 16, v[2 * row + 1]);
+      storeAs(to, v[2 * row]);
+      storeAs(to + 16, v[2 * row + 1]);
       to += stride;
       forget(to);
     }
   }
 }
 
-/// Copies rows of a scratch block's chroma as pairs, their bytes in the order of `pairOrder` where they are
-/// pairs already.
-template <bool pairs>
-inline void copyChromaBlock(const Scratch& scratch, ptrdiff_t rows, uint8x16_t pairOrder, Byte* to,
-                            ptrdiff_t stride) {
+/// Copies rows of a scratch block's chroma as pairs, the bytes of those that are pairs already exchanged
+/// where `swapped`.
+template <bool pairs, bool swapped>
+inline void copyChromaBlock(const Scratch& scratch, ptrdiff_t rows, Byte* to, ptrdiff_t stride) {
   const Byte* from = scratch.chroma[0];
   KERNEL_ROLLED_LOOP
   for (; rows != 0; --rows) {
-    const uint8x16x2_t both = {{vld1q_u8(from), vld1q_u8(from + 16)}};
-    from += kBlock;
     if constexpr (pairs) {
-      vst1q_u8(to, vqtbl1q_u8(both.val[0], pairOrder));
-      vst1q_u8(to + 16, vqtbl1q_u8(both.val[1], pairOrder));
+      for (ptrdiff_t x = 0; x < kBlock; x += kRegister) {
+        const Bytes v = load(from + x);
+        store(to + x, swapped ? exchanged(v) : v);
+      }
     } else {
-      vst2q_u8(to, both);
+      storeInTurn(to, loadAs<Part>(from), loadAs<Part>(from + 16));
     }
+    from += kBlock;
     to += stride;
     forget(to);
   }
@@ -342,7 +342,7 @@ void decodeTransposed(const PlanesView& view, ColourOrder order, const PixelRows
 }
 
 void copyLuma(const PlanesView& view, bool mirrored, const PixelRows& out) {
-  copyPixels(1, view.height, view.width, view.luma, view.lumaStride, mirrored, false, out);
+  copyPixels<1>(view.height, view.width, view.luma, view.lumaStride, mirrored, false, out);
 }
 
 void transposeLuma(const PlanesView& view, const PixelRows& out) {
@@ -356,8 +356,8 @@ void transposeLuma(const PlanesView& view, const PixelRows& out) {
 void copyChroma(const PlanesView& view, bool mirrored, bool vFirst, const PixelRows& out) {
   const PlanesView ordered = withFirst(view, vFirst);
   if (ordered.second == nullptr) {
-    copyPixels(2, view.height / 2, view.width, view.first, view.firstStride, mirrored,
-               view.firstIsV != vFirst, out);
+    copyPixels<2>(view.height / 2, view.width, view.first, view.firstStride, mirrored,
+                  view.firstIsV != vFirst, out);
     return;
   }
   for (ptrdiff_t row = 0; row < view.height / 2; ++row) {
@@ -369,19 +369,20 @@ void copyChroma(const PlanesView& view, bool mirrored, bool vFirst, const PixelR
 
 void transposeChroma(const PlanesView& view, bool vFirst, const PixelRows& out) {
   const PlanesView ordered = withFirst(view, vFirst);
-  const uint8x16_t pairOrder = orderOf(2, false, view.firstIsV != vFirst);
-  const auto transpose = [&](auto pairs) {
+  const auto transpose = [&](auto pairs, auto swapped) {
     Scratch scratch;
     forEachTransposedBlock(ordered, [&](ptrdiff_t row, ptrdiff_t rows, ptrdiff_t column) {
       transposeChromaBlock<pairs>(ordered, row, column, rows, scratch);
-      copyChromaBlock<pairs>(scratch, rows / 2, pairOrder, out.data + row / 2 * out.stride + column,
-                             out.stride);
+      copyChromaBlock<pairs, swapped>(scratch, rows / 2, out.data + row / 2 * out.stride + column,
+                                      out.stride);
     });
   };
   if (ordered.second != nullptr) {
-    transpose(std::false_type{});
+    transpose(std::false_type{}, std::false_type{});
+  } else if (view.firstIsV == vFirst) {
+    transpose(std::true_type{}, std::false_type{});
   } else {
-    transpose(std::true_type{});
+    transpose(std::true_type{}, std::true_type{});
   }
 }
 

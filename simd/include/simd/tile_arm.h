@@ -91,6 +91,12 @@ TILE_INLINE void moveWordTriplets(const unsigned char* src, RowPairs& out) {
 
 }  // namespace detail
 
+/// Writes the bytes of two registers in turn.
+TILE_INLINE void storeInTurn(unsigned char* p, Part a, Part b) {
+  const uint8x16x2_t both = {{a, b}};
+  vst2q_u8(p, both);
+}
+
 /// Eight 3-byte pixels in reverse order.
 TILE_INLINE void reverseEightTriplets(const unsigned char* src, unsigned char* dst) {
   const uint8x8x3_t v = vld3_u8(src);

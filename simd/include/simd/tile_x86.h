@@ -88,4 +88,11 @@ TILE_INLINE void moveTripletTile(const unsigned char* src, const RowOffsets<8>& 
 }
 
 }  // namespace detail
+
+/// Writes the bytes of two registers in turn.
+TILE_INLINE void storeInTurn(unsigned char* p, Part a, Part b) {
+  storeAs(p, zip<1, false>(a, b));
+  storeAs(p + 16, zip<1, true>(a, b));
+}
+
 }  // namespace HPC::fastcv::arm
