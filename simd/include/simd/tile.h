@@ -60,7 +60,9 @@ inline constexpr bool kInterleaves = bytes < 16 && 16 % bytes == 0;
 
 /// Source columns behind a tile that `moveTile` of the largest size also reads when it may.
 template <int bytes>
-inline constexpr int kTileReadsPast = bytes == 3 ? 2 : 0;
+inline constexpr int kTileReadsPast = bytes == 3                          ? 2
+                                      : bytes == 12 && sizeof(Bytes) > 16 ? 1
+                                                                          : 0;
 
 namespace detail {
 
@@ -178,6 +180,8 @@ TILE_INLINE void moveTile(const unsigned char* src, const RowOffsets<count>& fro
   } else if constexpr (bytes == 12 && columns == kLargest.columns) {
     detail::moveWordTriplets(src, out);
 #else
+  } else if constexpr (bytes == 12 && rows == kLargest.rows && columns == kLargest.columns) {
+    detail::moveWordTriplets<past>(src, from, out);
   } else if constexpr (kInterleaves<bytes> && rows * bytes > 16 && columns < kLargest.columns) {
     RowPairs right = out;
     right.first += rows / 2 * bytes;

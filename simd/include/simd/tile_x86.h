@@ -87,6 +87,19 @@ TILE_INLINE void moveTripletTile(const unsigned char* src, const RowOffsets<8>& 
   });
 }
 
+/// Four rows by two columns of 12-byte pixels, of which all but the last of a row are moved with the four
+/// bytes behind them, and the next one over these.
+template <bool past>
+TILE_INLINE void moveWordTriplets(const unsigned char* src, const RowOffsets<4>& rows, RowPairs& out) {
+  unrolled<2>([&](auto c) TILE_LAMBDA {
+    unsigned char* const p = out.next<c>();
+    unrolled<4>([&](auto r) TILE_LAMBDA {
+      constexpr bool kWhole = r < 3 && (past || c < 1);
+      memcpy(p + r * 12, rows.of<r>(src) + c * 12, kWhole ? 16 : 12);
+    });
+  });
+}
+
 }  // namespace detail
 
 /// Writes the bytes of two registers in turn.
