@@ -12,7 +12,6 @@
 #include <type_traits>
 #include <utility>
 
-#include "simd/neon.h"
 #include "simd/overlap.h"
 #include "simd/pixel.h"
 #include "simd/registers.h"
@@ -83,34 +82,6 @@ inline void inFlight(const Load& load, const Compute& compute, const Store& stor
 
 namespace detail {
 
-/// Loads 8 pixels into both halves of a block.
-template <int nc>
-inline Pixels<uint8x16_t, nc> loadHalf(const unsigned char* p) {
-  static_assert(nc == 3 || nc == 4);
-  const auto twice = [](uint8x8_t v) { return vcombine_u8(v, v); };
-  if constexpr (nc == 3) {
-    const uint8x8x3_t v = vld3_u8(p);
-    return {{twice(v.val[0]), twice(v.val[1]), twice(v.val[2])}};
-  } else {
-    const uint8x8x4_t v = vld4_u8(p);
-    return {{twice(v.val[0]), twice(v.val[1]), twice(v.val[2]), twice(v.val[3])}};
-  }
-}
-
-/// Stores the first 8 pixels of a block.
-template <int nc>
-inline void storeHalf(unsigned char* p, const Pixels<uint8x16_t, nc>& v) {
-  static_assert(nc == 3 || nc == 4);
-  if constexpr (nc == 3) {
-    const uint8x8x3_t all = {{vget_low_u8(v.c[0]), vget_low_u8(v.c[1]), vget_low_u8(v.c[2])}};
-    vst3_u8(p, all);
-  } else {
-    const uint8x8x4_t all = {
-        {vget_low_u8(v.c[0]), vget_low_u8(v.c[1]), vget_low_u8(v.c[2]), vget_low_u8(v.c[3])}};
-    vst4_u8(p, all);
-  }
-}
-
 /// Where `n` neighbouring blocks of `nc`-channel pixels are, moved on together with every turn of a loop.
 ///
 /// Interleaved loads and stores take no address offset, so each block has a pointer of its own, advanced by
@@ -155,17 +126,6 @@ class Cursor {
   ptrdiff_t step_ = n * kElements;
 };
 
-/// The register that a kernel works with.
-template <typename Op, typename T>
-struct BlockIn {
-  using Type = BlockOf<T>;
-};
-template <typename Op, typename T>
-  requires requires { typename Op::Vector; }
-struct BlockIn<Op, T> {
-  using Type = typename Op::Vector;
-};
-
 /// One row of a per-pixel kernel.
 template <typename Op>
 class PixelRow {
@@ -196,8 +156,8 @@ class PixelRow {
  private:
   static constexpr int kSrc = Op::kSrcChannels;
   static constexpr int kDst = Op::kDstChannels;
-  using SrcBlock = typename BlockIn<Op, Src>::Type;
-  using DstBlock = typename BlockIn<Op, Dst>::Type;
+  using SrcBlock = BlockOf<Src>;
+  using DstBlock = BlockOf<Dst>;
   static constexpr int kBlock = kLanes<SrcBlock>;
   // Registers of 32 bytes.
   static constexpr bool kWide = sizeof(SrcBlock) > 16;
@@ -240,7 +200,9 @@ class PixelRow {
           op, [=](int i) { return src + i * (kBlock * kSrc); },
           [=](int i) { return dst + i * (kBlock * kDst); }, [=](int) { return alpha; });
     } else {
-      storeHalf(dst, withAlpha<kDst>(op.vector(loadHalf<kSrc>(src)), splat<DstBlock>(kOpaque<Dst>)));
+      Pixels<SrcBlock, kSrc> half;
+      loadHalfChannels(src, half.c);
+      storeHalfChannels(dst, withAlpha<kDst>(op.vector(half), splat<DstBlock>(kOpaque<Dst>)).c);
     }
   }
 
@@ -307,7 +269,6 @@ class PixelRow {
 ///   Of a destination with four channels it may give three, then alpha is opaque; of one with three or four,
 ///   one that is all colours;
 /// - `scalar(const Src*, Dst*)`, for one pixel;
-/// - `Vector`, the register of a block, if it is not that of BlockOf;
 /// - `kWeighs`, if `vector` takes Colours;
 /// - `kSwaps` instead of `vector`, if all that happens to a pixel is that its first and third channel change
 ///   places, where it is true, and that a fourth one comes, opaque, or goes;

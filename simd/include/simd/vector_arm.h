@@ -73,6 +73,26 @@ inline void storeParts(unsigned char* p, ptrdiff_t /*apart*/, Bytes v) { store(p
 inline void storeThrice(unsigned char* p, Bytes v) { storeChannels(p, {v, v, v}); }
 inline void storeThrice(float* p, Floats v) { storeChannels(p, {v, v, v}); }
 
+/// The channels of half a block, in both halves of their registers; and the first half stored.
+inline void loadHalfChannels(const unsigned char* p, Bytes (&c)[3]) {
+  const uint8x8x3_t v = vld3_u8(p);
+  c[0] = vcombine_u8(v.val[0], v.val[0]), c[1] = vcombine_u8(v.val[1], v.val[1]);
+  c[2] = vcombine_u8(v.val[2], v.val[2]);
+}
+inline void loadHalfChannels(const unsigned char* p, Bytes (&c)[4]) {
+  const uint8x8x4_t v = vld4_u8(p);
+  c[0] = vcombine_u8(v.val[0], v.val[0]), c[1] = vcombine_u8(v.val[1], v.val[1]);
+  c[2] = vcombine_u8(v.val[2], v.val[2]), c[3] = vcombine_u8(v.val[3], v.val[3]);
+}
+inline void storeHalfChannels(unsigned char* p, const Bytes (&c)[3]) {
+  const uint8x8x3_t v = {{vget_low_u8(c[0]), vget_low_u8(c[1]), vget_low_u8(c[2])}};
+  vst3_u8(p, v);
+}
+inline void storeHalfChannels(unsigned char* p, const Bytes (&c)[4]) {
+  const uint8x8x4_t v = {{vget_low_u8(c[0]), vget_low_u8(c[1]), vget_low_u8(c[2]), vget_low_u8(c[3])}};
+  vst4_u8(p, v);
+}
+
 // ---- lanes
 
 inline Bytes min(Bytes a, Bytes b) { return vminq_u8(a, b); }
