@@ -72,19 +72,21 @@ struct BgrToYCrCb8 {
   // floor(sum / 256). With unsigned parts the low sum is at most 256 * 255, the high one with the carried 255
   // at most 16320.
   static Two<Halves> lumaSum(Bytes b, Bytes g, Bytes r) {
-    Two<Halves> low = multiply(b, kYB % 256);
-    low = multiplyAdd(low, g, kYG % 256);
-    low = multiplyAdd(low, r, kYR % 256);
     Two<Halves> high = multiply(b, kYB / 256);
     high = multiplyAdd(high, g, kYG / 256);
     high = multiplyAdd(high, r, kYR / 256);
+    Two<Halves> low = multiply(b, kYB % 256);
+    low = multiplyAdd(low, g, kYG % 256);
+    low = multiplyAdd(low, r, kYR % 256);
     return addShifted<8>(high, low);
   }
 
   // The rounded product is (2 a b + 2^15) >> 16: with b = 2 weight that is (a weight + 2^13) >> 14. It is
   // -211 to 211, which saturates to a signed byte; 128 more is the clamped sum.
   static Bytes chromaOf(Bytes colour, Bytes y, int weight) {
-    const Two<SignedHalves> terms = multiplyRounded(difference(colour, y), static_cast<int16_t>(2 * weight));
+    Two<SignedHalves> differences = difference(colour, y);
+    forget(differences.low);  // in-order cores wait less where both halves are not made at once
+    const Two<SignedHalves> terms = multiplyRounded(differences, static_cast<int16_t>(2 * weight));
     return (Bytes)narrowSigned(terms) ^ splat<Bytes>(0x80);
   }
 };
@@ -103,7 +105,10 @@ struct YCrCbToBgr8 {
     const Bytes y = p.c[0];
     const SignedBytes cr = centred(p.c[1]);
     const SignedBytes cb = centred(p.c[2]);
-    return {{blueOrRed(y, cb, kBCb), narrowRounded<kShift - 8>(greenSum(y, cr, cb)), blueOrRed(y, cr, kRCr)}};
+    // Green takes longest.
+    const Bytes green = narrowRounded<kShift - 8>(greenSum(y, cr, cb));
+    const Bytes red = blueOrRed(y, cr, kRCr);
+    return {{blueOrRed(y, cb, kBCb), green, red}};
   }
 
   void scalar(const unsigned char* in, unsigned char* out) const {
