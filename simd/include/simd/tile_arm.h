@@ -5,8 +5,8 @@
 
 #include <cstddef>
 
-#include "simd/neon.h"
 #include "simd/shuffle.h"
+#include "simd/vector.h"
 
 namespace HPC::fastcv::arm {
 

@@ -6,8 +6,10 @@
 
 #include <bit>
 #include <cstddef>
+#include <cstring>
 
 #include "simd/shuffle.h"
+#include "simd/vector.h"
 
 namespace HPC::fastcv::arm {
 
@@ -45,7 +47,8 @@ TILE_INLINE Bytes joined(Part low, Part high) {
 /// Writes, of both halves, lane `lane` of 8 bytes of two registers, one behind the other.
 template <int lane, typename V>
 TILE_INLINE void storePair(unsigned char* p, V a, V b) {
-  storeAs(p, zip < 8, lane == 1 > (a, b));
+  constexpr bool kHigh = lane == 1;
+  storeAs(p, zip<8, kHigh>(a, b));
 }
 
 /// The 12 bytes of four 3-byte pixels; with `past` also the 4 bytes behind them.
@@ -83,7 +86,8 @@ TILE_INLINE void moveTripletTile(const unsigned char* src, const RowOffsets<8>& 
   });
   const auto columns = interleaved(in);
   unrolled<4>([&](auto c) TILE_LAMBDA {
-    storeEightPixels(out.next<c>(), zip < 8, c % 2 == 1 > (columns.v[c / 2], columns.v[c / 2 + 2]));
+    constexpr bool kHigh = c % 2 == 1;
+    storeEightPixels(out.next<c>(), zip<8, kHigh>(columns.v[c / 2], columns.v[c / 2 + 2]));
   });
 }
 
