@@ -80,7 +80,7 @@ std::function<void()> extracting(ky_handle_t verifier, const ky_face_t& face) {
 /// A verifier by a descriptor whose weights are random, or none.
 ky_handle_t randomVerifier() {
   using namespace kyengine;
-  const std::vector<uint8_t> model = test::FileOf(test::RandomModel(FaceDescriptorShape(), 1));
+  const std::vector<uint8_t> model = test::FileOf(test::RandomModel(faceDescriptorShape(), 1));
   char path[] = "/tmp/bench_engine.XXXXXX";
   const int file = mkstemp(path);
   ky_handle_t verifier = nullptr;

@@ -48,7 +48,7 @@ std::string someText(Input& input) {
     }
   }
   if (bytes.size() >= 4 && !input.seldom(16)) {
-    const uint32_t checksum = kyengine::Checksum(std::span(bytes).first(bytes.size() - 4));
+    const uint32_t checksum = kyengine::crcOf(std::span(bytes).first(bytes.size() - 4));
     std::memcpy(&bytes[bytes.size() - 4], &checksum, sizeof(checksum));
   }
   return kyengine::test::Base64(bytes);

@@ -195,14 +195,14 @@ std::string someDetector(Input& input) {
 void tryDetector(Input& input, const std::string& bytes) {
   const File file(bytes);
   try {
-    const kyengine::Model model = kyengine::LoadModel(file.path().c_str());
+    const kyengine::Model model = kyengine::loadModel(file.path().c_str());
     GrayImage picture = somePicture(input, input.in(1, 48));
     const dlib::drectangle box(input.in(-60, 60), input.in(-60, 60), input.in(-60, 60), input.in(-60, 60));
     if (model.landmarks != nullptr) {
-      const auto points = model.landmarks->Locate(picture, box);
+      const auto points = model.landmarks->locate(picture, box);
       FUZZ_CHECK(!points.empty() && points.size() <= KY_FACE_MAX_POINTS);
     } else {
-      kyengine::Scanner(model.detector).Find(picture, input.in(-3, 3));
+      kyengine::Scanner(model.detector).find(picture, input.in(-3, 3));
     }
   } catch (const Failure& failure) {
     FUZZ_CHECK(failure.code != KY_SUCCESS);
@@ -240,21 +240,21 @@ void tryDescriptor(Input& input) {
   }
   kyengine::DescriptorHeader header;
   const std::span<const uint8_t> bytes(file);
-  if (kyengine::DescriptorHeader::Read(bytes.first(std::min(bytes.size(), kyengine::DescriptorHeader::kSize)),
+  if (kyengine::DescriptorHeader::read(bytes.first(std::min(bytes.size(), kyengine::DescriptorHeader::kSize)),
                                        kShape, &header) != KY_SUCCESS) {
     return;
   }
   FUZZ_CHECK(header.length <= 2 * whole.size() * sizeof(float));
   const auto rest = bytes.subspan(kyengine::DescriptorHeader::kSize);
   kyengine::Descriptor descriptor;
-  if (kyengine::Descriptor::Read(header, rest.first(std::min<size_t>(rest.size(), header.length)), kShape,
+  if (kyengine::Descriptor::read(header, rest.first(std::min<size_t>(rest.size(), header.length)), kShape,
                                  &descriptor) != KY_SUCCESS) {
     return;
   }
   std::array<uint8_t, size_t{3} * 31 * 31> picture = {};
   std::generate(picture.begin(), picture.end(), [&] { return input.pixel(); });
   std::array<float, 16> numbers = {};
-  if (descriptor.Describe(picture.data(), numbers.data()) == KY_SUCCESS) {
+  if (descriptor.describe(picture.data(), numbers.data()) == KY_SUCCESS) {
     FUZZ_CHECK(std::all_of(numbers.begin(), numbers.end(), [](float x) { return std::isfinite(x); }));
   }
 }

@@ -22,7 +22,7 @@ struct Map {
 };
 
 /// The map of the aligned picture to the frame.
-Map ToFrame(const Eyes& eyes, int side) {
+Map mapToFrame(const Eyes& eyes, int side) {
   const double unit = side / 150.0;
   const dlib::dpoint left(46.6 * unit, 46.4 * unit);
   const dlib::dpoint right(99.95 * unit, 47.1 * unit);
@@ -42,23 +42,23 @@ class Means {
  public:
   /// Covers the rectangle from (left, top) to (right, bottom).
   Means(const Frame& frame, double left, double top, double right, double bottom, int step)
-      : step_(step), left_(Floor(left)), top_(Floor(top)) {
+      : step_(step), left_(floor(left)), top_(floor(top)) {
     columns_ = static_cast<int>((right - left_) / step) + 2;
     rows_ = static_cast<int>((bottom - top_) / step) + 2;
     means_.resize(static_cast<size_t>(rows_) * static_cast<size_t>(columns_));
-    const int first_x = std::max(left_, 0);
-    const int end_x = std::min(left_ + columns_ * step, frame.width());
-    const int first_y = std::max(top_, 0);
-    const int end_y = std::min(top_ + rows_ * step, frame.height());
-    if (first_x >= end_x) {
+    const int firstX = std::max(left_, 0);
+    const int endX = std::min(left_ + columns_ * step, frame.width());
+    const int firstY = std::max(top_, 0);
+    const int endY = std::min(top_ + rows_ * step, frame.height());
+    if (firstX >= endX) {
       return;
     }
-    std::vector<uint8_t> row(3 * static_cast<size_t>(end_x - first_x));
+    std::vector<uint8_t> row(3 * static_cast<size_t>(endX - firstX));
     // Sums are whole numbers below 2^24 for any step that a frame has room for: they are exact in any order.
-    for (int y = first_y; y < end_y; ++y) {
-      frame.ToRgb(first_x, y, end_x - first_x, 1, row.data());
+    for (int y = firstY; y < endY; ++y) {
+      frame.toRgb(firstX, y, endX - firstX, 1, row.data());
       const uint8_t* next = row.data();
-      for (int x = first_x; x < end_x; ++x) {
+      for (int x = firstX; x < endX; ++x) {
         Colours& sum = at((x - left_) / step, (y - top_) / step);
         for (float& colour : sum) {
           colour += static_cast<float>(*next++);
@@ -74,18 +74,18 @@ class Means {
   }
 
   /// Adds what the frame shows at `place`, interpolated.
-  void AddAt(const dlib::dpoint& place, Colours* sum) const {
+  void addAt(const dlib::dpoint& place, Colours* sum) const {
     const double half = (step_ - 1) / 2.0;
     const double x = (place.x() - left_ - half) / step_;
     const double y = (place.y() - top_ - half) / step_;
-    const int column = Floor(x);
-    const int row = Floor(y);
+    const int column = floor(x);
+    const int row = floor(y);
     const auto right = static_cast<float>(x - column);
     const auto down = static_cast<float>(y - row);
-    const Colours a = Or0(column, row);
-    const Colours b = Or0(column + 1, row);
-    const Colours c = Or0(column, row + 1);
-    const Colours d = Or0(column + 1, row + 1);
+    const Colours a = or0(column, row);
+    const Colours b = or0(column + 1, row);
+    const Colours c = or0(column, row + 1);
+    const Colours d = or0(column + 1, row + 1);
     for (size_t i = 0; i < a.size(); ++i) {
       const float above = a[i] + (b[i] - a[i]) * right;
       const float below = c[i] + (d[i] - c[i]) * right;
@@ -94,13 +94,13 @@ class Means {
   }
 
  private:
-  static int Floor(double x) { return static_cast<int>(std::floor(x)); }
+  static int floor(double x) { return static_cast<int>(std::floor(x)); }
 
   Colours& at(int column, int row) {
     return means_[static_cast<size_t>(row) * static_cast<size_t>(columns_) + static_cast<size_t>(column)];
   }
 
-  Colours Or0(int column, int row) const {
+  Colours or0(int column, int row) const {
     return column >= 0 && row >= 0 && column < columns_ && row < rows_
                ? means_[static_cast<size_t>(row) * static_cast<size_t>(columns_) +
                         static_cast<size_t>(column)]
@@ -117,16 +117,16 @@ class Means {
 
 }  // namespace
 
-std::vector<uint8_t> AlignedFace(const Frame& frame, const Eyes& eyes, int side) {
-  const Map to_frame = ToFrame(eyes, side);
+std::vector<uint8_t> alignedFace(const Frame& frame, const Eyes& eyes, int side) {
+  const Map toFrame = mapToFrame(eyes, side);
   // The frame's pixels for one of the aligned picture's: squares of whole pixels are averaged first, and four
   // places between them where that is not quite a pixel of the aligned picture.
   const double scale =
-      std::sqrt(to_frame.along.x() * to_frame.along.x() + to_frame.along.y() * to_frame.along.y());
+      std::sqrt(toFrame.along.x() * toFrame.along.x() + toFrame.along.y() * toFrame.along.y());
   const int step = std::max(1, static_cast<int>(scale));
   const double last = side - 0.5;
-  const std::array<dlib::dpoint, 4> corners = {to_frame(-0.5, -0.5), to_frame(last, -0.5),
-                                               to_frame(-0.5, last), to_frame(last, last)};
+  const std::array<dlib::dpoint, 4> corners = {toFrame(-0.5, -0.5), toFrame(last, -0.5), toFrame(-0.5, last),
+                                               toFrame(last, last)};
   const auto [left, right] = std::minmax({corners[0].x(), corners[1].x(), corners[2].x(), corners[3].x()});
   const auto [top, bottom] = std::minmax({corners[0].y(), corners[1].y(), corners[2].y(), corners[3].y()});
   // An interpolated place needs the squares around it, too.
@@ -139,12 +139,12 @@ std::vector<uint8_t> AlignedFace(const Frame& frame, const Eyes& eyes, int side)
       Colours sum = {};
       float places = 1;
       if (scale <= 1) {
-        means.AddAt(to_frame(x, y), &sum);
+        means.addAt(toFrame(x, y), &sum);
       } else {
         places = 4;
         for (const double dy : {-0.25, 0.25}) {
           for (const double dx : {-0.25, 0.25}) {
-            means.AddAt(to_frame(x + dx, y + dy), &sum);
+            means.addAt(toFrame(x + dx, y + dy), &sum);
           }
         }
       }

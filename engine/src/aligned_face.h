@@ -14,6 +14,6 @@ namespace kyengine {
 /// and blue: turned, scaled and moved so that the eyes come to where the descriptor's training had them, in
 /// 150ths of the side (46.6, 46.4) and (99.95, 47.1). A face that is scaled down is averaged, not sampled;
 /// what lies outside the frame is black. The result is the same on every machine.
-std::vector<uint8_t> AlignedFace(const Frame& frame, const Eyes& eyes, int side);
+std::vector<uint8_t> alignedFace(const Frame& frame, const Eyes& eyes, int side);
 
 }  // namespace kyengine

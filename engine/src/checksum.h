@@ -11,7 +11,7 @@
 namespace kyengine {
 
 /// CRC-32 as Ethernet and zlib have it.
-inline uint32_t Checksum(std::span<const uint8_t> bytes) {
+inline uint32_t crcOf(std::span<const uint8_t> bytes) {
   dlib::crc32 crc;
   for (const uint8_t byte : bytes) {
     crc.add(byte);

@@ -17,7 +17,7 @@ constexpr int kPixels = 5;
 
 /// Calls `some` with five at a time, as a constant, and with what is left at last.
 template <typename Some>
-void InFives(ptrdiff_t all, Some some) {
+void inFives(ptrdiff_t all, Some some) {
   static_assert(kPixels == 5);
   for (; all >= kPixels; all -= kPixels) {
     some(std::integral_constant<int, kPixels>());
@@ -43,11 +43,11 @@ void InFives(ptrdiff_t all, Some some) {
 /// The sums of the products of `rows` rows of `run` consecutive numbers, `row` apart, from each of `places`
 /// on, with their weights.
 template <int count>
-inline void SumWindow(Lanes (&sums)[count], const float* weights, const float* const (&places)[count],
+inline void sumWindow(Lanes (&sums)[count], const float* weights, const float* const (&places)[count],
                       int rows, int run, ptrdiff_t row) {
 #pragma GCC unroll 8
   for (Lanes& sum : sums) {
-    sum = Broadcast(0);
+    sum = broadcast(0);
   }
   const float* at[count];
   std::copy_n(places, count, at);
@@ -58,12 +58,12 @@ inline void SumWindow(Lanes (&sums)[count], const float* weights, const float* c
   };
   for (; rows > 0; --rows) {
     for (int fours = run / 4; fours > 0; --fours) {
-      AddFourProducts(sums, weights, at);
+      addFourProducts(sums, weights, at);
       weights += ptrdiff_t{4} * kLanes;
       advance(4);
     }
     for (int left = run % 4; left > 0; --left) {
-      AddProducts(sums, weights, at, 0);
+      addProducts(sums, weights, at, 0);
       weights += kLanes;
       advance(1);
     }
@@ -76,19 +76,19 @@ class Finisher {
  public:
   /// The sums are so many times too large as `scale` is less than 1.
   Finisher(const Convolution& c, const Finish& finish, const Map& to, int channel, float scale)
-      : factor_(Load(c.factors.data() + channel) * Broadcast(scale)),
-        offset_(Load(c.offsets.data() + channel)),
+      : factor_(load(c.factors.data() + channel) * broadcast(scale)),
+        offset_(load(c.offsets.data() + channel)),
         rectify_(finish.rectify),
         skip_(finish.skip == nullptr ? nullptr : finish.skip->data),
         to_(to.data) {}
 
   /// Stores the result of a sum; `at` is where, in the map and in the skip.
-  void Store(const Lanes& sum, ptrdiff_t at) const {
-    Lanes result = MultiplyAdd(offset_, sum, factor_);
+  void store(const Lanes& sum, ptrdiff_t at) const {
+    Lanes result = multiplyAdd(offset_, sum, factor_);
     if (skip_ != nullptr) {
-      result = result + Load(skip_ + at);
+      result = result + load(skip_ + at);
     }
-    kyengine::Store(rectify_ ? Max(result, Broadcast(0)) : result, to_ + at);
+    kyengine::store(rectify_ ? max(result, broadcast(0)) : result, to_ + at);
   }
 
  private:
@@ -100,44 +100,44 @@ class Finisher {
 };
 
 /// The weights that lead to 16 output channels.
-size_t GroupWeights(const Convolution& c) {
+size_t groupWeights(const Convolution& c) {
   return static_cast<size_t>(c.side) * static_cast<size_t>(c.side) * static_cast<size_t>(c.inputs) * kLanes;
 }
 
 /// Sixteen weights as floats.
-Lanes LoadWeights(const Convolution& c, size_t at) {
-  return c.floats.ok() ? Load(c.floats.data() + at) : LoadBytes(c.bytes.data() + at, c.zero);
+Lanes loadWeights(const Convolution& c, size_t at) {
+  return c.floats.ok() ? load(c.floats.data() + at) : loadBytes(c.bytes.data() + at, c.zero);
 }
 
 // ---- by definition
 
 /// The 16 weights of each product of a group of output channels, as floats: the model's own, or in `memory`.
-const float* WeightsOf(const Convolution& c, size_t first, float* memory) {
+const float* weightsOf(const Convolution& c, size_t first, float* memory) {
   if (c.floats.ok()) {
     return c.floats.data() + first;
   }
-  const size_t count = GroupWeights(c);
+  const size_t count = groupWeights(c);
 #pragma GCC unroll 4
   for (size_t i = 0; i < count; i += kLanes) {
-    Store(LoadBytes(c.bytes.data() + first + i, c.zero), memory + i);
+    store(loadBytes(c.bytes.data() + first + i, c.zero), memory + i);
   }
   return memory;
 }
 
-void ConvolveDirectly(const Convolution& c, const Map& from, const Finish& finish, const Map& to,
+void convolveDirectly(const Convolution& c, const Map& from, const Finish& finish, const Map& to,
                       float* memory) {
-  const int side = ResultSide(from.side, c.side, c.step);
+  const int side = resultSide(from.side, c.side, c.step);
   const int border = c.step == 1 ? c.side / 2 : 0;
   const float* const start = from.at(-border, -border);
   const ptrdiff_t step = static_cast<ptrdiff_t>(c.step) * c.inputs;
   size_t first = 0;
   for (int channel = 0; channel < c.outputs; channel += kLanes) {
-    const float* const weights = WeightsOf(c, first, memory);
-    first += GroupWeights(c);
+    const float* const weights = weightsOf(c, first, memory);
+    first += groupWeights(c);
     const Finisher finisher(c, finish, to, channel, 1);
     int y = 0;
     int x = 0;
-    InFives(ptrdiff_t{side} * side, [&]<int count>(std::integral_constant<int, count>) {
+    inFives(ptrdiff_t{side} * side, [&]<int count>(std::integral_constant<int, count>) {
       const float* places[count];
       ptrdiff_t at[count];
       for (int i = 0; i < count; ++i) {
@@ -149,10 +149,10 @@ void ConvolveDirectly(const Convolution& c, const Map& from, const Finish& finis
         }
       }
       Lanes sums[count];
-      SumWindow(sums, weights, places, c.side, c.side * c.inputs, from.row());
+      sumWindow(sums, weights, places, c.side, c.side * c.inputs, from.row());
 #pragma GCC unroll 8
       for (int i = 0; i < count; ++i) {
-        finisher.Store(sums[i], at[i]);
+        finisher.store(sums[i], at[i]);
       }
     });
   }
@@ -174,50 +174,50 @@ constexpr float kTileScale = 1.0F / (24 * 24);
 /// On fewer pixels transforming the weights takes what the products save.
 constexpr int kLeastTiledSide = 2 * kTile;
 
-void TransformWeights(const Lanes (&w)[kKernel], Lanes (&transformed)[kWindow]) {
-  const Lanes two = Broadcast(2);
+void transformWeights(const Lanes (&w)[kKernel], Lanes (&transformed)[kWindow]) {
+  const Lanes two = broadcast(2);
   const Lanes near = w[0] + w[2];
-  const Lanes far = MultiplyAdd(w[0], Broadcast(4), w[2]);
+  const Lanes far = multiplyAdd(w[0], broadcast(4), w[2]);
   transformed[0] = w[0];
   transformed[1] = near + w[1];
   transformed[2] = near - w[1];
-  transformed[3] = MultiplyAdd(far, two, w[1]);
-  transformed[4] = MultiplySubtract(far, two, w[1]);
+  transformed[3] = multiplyAdd(far, two, w[1]);
+  transformed[4] = multiplySubtract(far, two, w[1]);
   transformed[5] = w[2];
 }
 
-void TransformPixels(const Lanes (&p)[kWindow], Lanes (&transformed)[kWindow]) {
-  const Lanes two = Broadcast(2);
-  const Lanes four = Broadcast(4);
-  const Lanes five = Broadcast(5);
-  const Lanes near_even = MultiplySubtract(p[4], four, p[2]);
-  const Lanes near_odd = MultiplySubtract(p[3], four, p[1]);
-  const Lanes far_even = p[4] - p[2];
-  const Lanes far_odd = p[3] - p[1];
-  transformed[0] = MultiplyAdd(MultiplySubtract(p[4], five, p[2]), four, p[0]);
-  transformed[1] = near_even + near_odd;
-  transformed[2] = near_even - near_odd;
-  transformed[3] = MultiplyAdd(far_even, two, far_odd);
-  transformed[4] = MultiplySubtract(far_even, two, far_odd);
-  transformed[5] = MultiplyAdd(MultiplySubtract(p[5], five, p[3]), four, p[1]);
+void transformPixels(const Lanes (&p)[kWindow], Lanes (&transformed)[kWindow]) {
+  const Lanes two = broadcast(2);
+  const Lanes four = broadcast(4);
+  const Lanes five = broadcast(5);
+  const Lanes nearEven = multiplySubtract(p[4], four, p[2]);
+  const Lanes nearOdd = multiplySubtract(p[3], four, p[1]);
+  const Lanes farEven = p[4] - p[2];
+  const Lanes farOdd = p[3] - p[1];
+  transformed[0] = multiplyAdd(multiplySubtract(p[4], five, p[2]), four, p[0]);
+  transformed[1] = nearEven + nearOdd;
+  transformed[2] = nearEven - nearOdd;
+  transformed[3] = multiplyAdd(farEven, two, farOdd);
+  transformed[4] = multiplySubtract(farEven, two, farOdd);
+  transformed[5] = multiplyAdd(multiplySubtract(p[5], five, p[3]), four, p[1]);
 }
 
 /// The results, 24 times.
-void TransformSums(const Lanes (&s)[kWindow], Lanes (&results)[kTile]) {
-  const Lanes four = Broadcast(4);
-  const Lanes near_even = (s[1] + s[2]) * four;
-  const Lanes near_odd = (s[2] - s[1]) * four;
-  const Lanes far_even = s[3] + s[4];
-  const Lanes far_odd = s[3] - s[4];
-  results[0] = MultiplyAdd(far_even - near_even, Broadcast(6), s[0]);
-  results[1] = MultiplyAdd(near_odd, Broadcast(2), far_odd);
-  results[2] = far_even * four - near_even;
-  results[3] = MultiplyAdd(MultiplyAdd(near_odd, Broadcast(8), far_odd), Broadcast(24), s[5]);
+void transformSums(const Lanes (&s)[kWindow], Lanes (&results)[kTile]) {
+  const Lanes four = broadcast(4);
+  const Lanes nearEven = (s[1] + s[2]) * four;
+  const Lanes nearOdd = (s[2] - s[1]) * four;
+  const Lanes farEven = s[3] + s[4];
+  const Lanes farOdd = s[3] - s[4];
+  results[0] = multiplyAdd(farEven - nearEven, broadcast(6), s[0]);
+  results[1] = multiplyAdd(nearOdd, broadcast(2), farOdd);
+  results[2] = farEven * four - nearEven;
+  results[3] = multiplyAdd(multiplyAdd(nearOdd, broadcast(8), farOdd), broadcast(24), s[5]);
 }
 
 /// Transforms each column and then each row of what `load(y, x)` gives, and has `store(y, x, lanes)` take it.
 template <int from, int to, typename Load, typename Store>
-void TransformBothWays(void (*transform)(const Lanes (&)[from], Lanes (&)[to]), Load load, Store store) {
+void transformBothWays(void (*transform)(const Lanes (&)[from], Lanes (&)[to]), Load load, Store store) {
   Lanes rows[to][from];
   for (int x = 0; x < from; ++x) {
     Lanes column[from];
@@ -239,7 +239,7 @@ void TransformBothWays(void (*transform)(const Lanes (&)[from], Lanes (&)[to]), 
   }
 }
 
-constexpr int TilesAlong(int side) { return (side + kTile - 1) / kTile; }
+constexpr int tilesAlong(int side) { return (side + kTile - 1) / kTile; }
 
 /// The tiles of a map, and the memory in which their numbers at each of the points lie.
 struct Tiles {
@@ -250,20 +250,20 @@ struct Tiles {
   float* weights;  ///< [kPoints][inputs][16]
 
   Tiles(int side, ptrdiff_t inputs, float* memory)
-      : along(TilesAlong(side)),
+      : along(tilesAlong(side)),
         count(ptrdiff_t{along} * along),
         pixels(memory),
         sums(pixels + kPoints * count * inputs),
         weights(sums + kPoints * count * kLanes) {}
 
-  static size_t Size(int side, int inputs) {
-    const int count = TilesAlong(side) * TilesAlong(side);
+  static size_t size(int side, int inputs) {
+    const int count = tilesAlong(side) * tilesAlong(side);
     return static_cast<size_t>(kPoints) * static_cast<size_t>(count * (inputs + kLanes) + inputs * kLanes);
   }
 
   /// Calls `visit` with each tile's number and its first pixel.
   template <typename Visit>
-  void ForEach(Visit visit) const {
+  void forEach(Visit visit) const {
     ptrdiff_t tile = 0;
     for (int y = 0; y < along; ++y) {
       for (int x = 0; x < along; ++x) {
@@ -273,55 +273,55 @@ struct Tiles {
   }
 };
 
-void TransformPixelsOf(const Map& map, const Tiles& tiles) {
-  tiles.ForEach([&](ptrdiff_t tile, int top, int left) {
+void transformPixelsOf(const Map& map, const Tiles& tiles) {
+  tiles.forEach([&](ptrdiff_t tile, int top, int left) {
     for (int channel = 0; channel < map.channels; channel += kLanes) {
-      TransformBothWays(
-          TransformPixels,
+      transformBothWays(
+          transformPixels,
           [&](int dy, int dx) {
             const int y = top + dy - 1;
             const int x = left + dx - 1;
             // The last tiles reach beyond the border.
-            return y > map.side || x > map.side ? Broadcast(0) : Load(map.at(y, x) + channel);
+            return y > map.side || x > map.side ? broadcast(0) : load(map.at(y, x) + channel);
           },
           [&](int y, int x, const Lanes& transformed) {
-            Store(transformed,
+            store(transformed,
                   tiles.pixels + ((y * kWindow + x) * tiles.count + tile) * map.channels + channel);
           });
     }
   });
 }
 
-void TransformWeightsOf(const Convolution& c, size_t first, const Tiles& tiles) {
+void transformWeightsOf(const Convolution& c, size_t first, const Tiles& tiles) {
   const ptrdiff_t inputs = c.inputs;
   for (ptrdiff_t input = 0; input < inputs; ++input) {
-    TransformBothWays(
-        TransformWeights,
+    transformBothWays(
+        transformWeights,
         [&](int y, int x) {
-          return LoadWeights(c, first + static_cast<size_t>(((y * kKernel + x) * inputs + input) * kLanes));
+          return loadWeights(c, first + static_cast<size_t>(((y * kKernel + x) * inputs + input) * kLanes));
         },
         [&](int y, int x, const Lanes& transformed) {
-          Store(transformed, tiles.weights + ((y * kWindow + x) * inputs + input) * kLanes);
+          store(transformed, tiles.weights + ((y * kWindow + x) * inputs + input) * kLanes);
         });
   }
 }
 
-void SumProducts(int inputs, const Tiles& tiles) {
+void sumProducts(int inputs, const Tiles& tiles) {
   const float* pixels = tiles.pixels;
   const float* weights = tiles.weights;
   float* sum = tiles.sums;
   for (int point = 0; point < kPoints; ++point) {
-    InFives(tiles.count, [&]<int count>(std::integral_constant<int, count>) {
+    inFives(tiles.count, [&]<int count>(std::integral_constant<int, count>) {
       const float* places[count];
       for (const float*& place : places) {
         place = pixels;
         pixels += inputs;
       }
       Lanes sums[count];
-      SumWindow(sums, weights, places, 1, inputs, 0);
+      sumWindow(sums, weights, places, 1, inputs, 0);
 #pragma GCC unroll 8
       for (int i = 0; i < count; ++i) {
-        Store(sums[i], sum);
+        store(sums[i], sum);
         sum += kLanes;
       }
     });
@@ -329,44 +329,44 @@ void SumProducts(int inputs, const Tiles& tiles) {
   }
 }
 
-void ConvolveInTiles(const Convolution& c, const Map& from, const Finish& finish, const Map& to,
+void convolveInTiles(const Convolution& c, const Map& from, const Finish& finish, const Map& to,
                      float* memory) {
   const Tiles tiles(from.side, c.inputs, memory);
-  TransformPixelsOf(from, tiles);
+  transformPixelsOf(from, tiles);
   size_t first = 0;
   for (int channel = 0; channel < c.outputs; channel += kLanes) {
-    TransformWeightsOf(c, first, tiles);
-    first += GroupWeights(c);
-    SumProducts(c.inputs, tiles);
+    transformWeightsOf(c, first, tiles);
+    first += groupWeights(c);
+    sumProducts(c.inputs, tiles);
     const Finisher finisher(c, finish, to, channel, kTileScale);
-    tiles.ForEach([&](ptrdiff_t tile, int top, int left) {
-      TransformBothWays(
-          TransformSums,
-          [&](int y, int x) { return Load(tiles.sums + ((y * kWindow + x) * tiles.count + tile) * kLanes); },
+    tiles.forEach([&](ptrdiff_t tile, int top, int left) {
+      transformBothWays(
+          transformSums,
+          [&](int y, int x) { return load(tiles.sums + ((y * kWindow + x) * tiles.count + tile) * kLanes); },
           [&](int dy, int dx, const Lanes& result) {
             const int y = top + dy;
             const int x = left + dx;
             if (y < from.side && x < from.side) {
-              finisher.Store(result, to.at(y, x) - to.data + channel);
+              finisher.store(result, to.at(y, x) - to.data + channel);
             }
           });
     });
   }
 }
 
-constexpr bool InTiles(int kernel, int step, int side) {
+constexpr bool inTiles(int kernel, int step, int side) {
   return kernel == kKernel && step == 1 && side >= kLeastTiledSide;
 }
 
 }  // namespace
 
-size_t ConvolveMemory(int kernel, int step, int inputs, int side) {
-  return InTiles(kernel, step, side) ? Tiles::Size(side, inputs)
+size_t convolveMemory(int kernel, int step, int inputs, int side) {
+  return inTiles(kernel, step, side) ? Tiles::size(side, inputs)
                                      : static_cast<size_t>(kernel * kernel * inputs) * kLanes;
 }
 
-void Convolve(const Convolution& c, const Map& from, const Finish& finish, const Map& to, float* memory) {
-  const auto convolve = InTiles(c.side, c.step, from.side) ? ConvolveInTiles : ConvolveDirectly;
+void convolve(const Convolution& c, const Map& from, const Finish& finish, const Map& to, float* memory) {
+  const auto convolve = inTiles(c.side, c.step, from.side) ? convolveInTiles : convolveDirectly;
   convolve(c, from, finish, to, memory);
 }
 

@@ -51,7 +51,7 @@ struct Map {
   ptrdiff_t row() const { return static_cast<ptrdiff_t>(side + 2) * channels; }
   float* at(int y, int x) const { return data + (y + 1) * row() + static_cast<ptrdiff_t>(x + 1) * channels; }
 
-  static size_t Size(int side, int channels) {
+  static size_t size(int side, int channels) {
     return static_cast<size_t>(side + 2) * static_cast<size_t>(side + 2) * static_cast<size_t>(channels);
   }
 };
@@ -64,14 +64,14 @@ struct Finish {
 
 /// The side of the result where a kernel walks over a map of `side`. In steps of one the map's border takes
 /// part, and the result is as large as the map; in others it takes none.
-constexpr int ResultSide(int side, int kernel, int step) {
+constexpr int resultSide(int side, int kernel, int step) {
   return step == 1 ? side : (side - kernel) / step + 1;
 }
 
-/// The floats that Convolve takes for itself, for a kernel, its inputs and the side of the map.
-size_t ConvolveMemory(int kernel, int step, int inputs, int side);
+/// The floats that convolve takes for itself, for a kernel, its inputs and the side of the map.
+size_t convolveMemory(int kernel, int step, int inputs, int side);
 
 /// Convolves all of `from`. `to` is as large as the result, or larger.
-void Convolve(const Convolution& c, const Map& from, const Finish& finish, const Map& to, float* memory);
+void convolve(const Convolution& c, const Map& from, const Finish& finish, const Map& to, float* memory);
 
 }  // namespace kyengine

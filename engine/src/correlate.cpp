@@ -11,7 +11,7 @@ namespace {
 static_assert(kColumnsTogether == kLanes);
 
 template <int together>
-void ApplyRowsTogether(const float* from, ptrdiff_t stride, const float* weights, int taps, int rows,
+void applyRowsTogether(const float* from, ptrdiff_t stride, const float* weights, int taps, int rows,
                        int columns, float* to) {
   const ptrdiff_t part = static_cast<ptrdiff_t>(rows) * columns;
   for (int y = 0; y < rows; ++y) {
@@ -19,19 +19,19 @@ void ApplyRowsTogether(const float* from, ptrdiff_t stride, const float* weights
       const float* const place = from + y * stride + x;
       Lanes sums[together];
       for (Lanes& sum : sums) {
-        sum = Broadcast(0);
+        sum = broadcast(0);
       }
       for (int t = 0; t < taps; ++t) {
-        const Lanes numbers = Load(place + t);
+        const Lanes numbers = load(place + t);
 #pragma GCC unroll 4
         for (int i = 0; i < together; ++i) {
           sums[i] =
-              MultiplyAdd(sums[i], numbers, Broadcast(weights[static_cast<ptrdiff_t>(t) * together + i]));
+              multiplyAdd(sums[i], numbers, broadcast(weights[static_cast<ptrdiff_t>(t) * together + i]));
         }
       }
 #pragma GCC unroll 4
       for (int i = 0; i < together; ++i) {
-        Store(sums[i], to + i * part + static_cast<ptrdiff_t>(y) * columns + x);
+        store(sums[i], to + i * part + static_cast<ptrdiff_t>(y) * columns + x);
       }
     }
   }
@@ -40,7 +40,7 @@ void ApplyRowsTogether(const float* from, ptrdiff_t stride, const float* weights
 /// `fixed` is the number of taps where that is known when this is compiled, so that the rows that two sums
 /// share are read once; or else 0.
 template <int fixed>
-void AddColumnOf(const float* from, int columns, const float* weights, int taps, int rows, float* sums) {
+void addColumnOf(const float* from, int columns, const float* weights, int taps, int rows, float* sums) {
   const int count = fixed > 0 ? fixed : taps;
   for (int y = 0; y < rows; y += kRowsTogether) {
     for (int x = 0; x < columns; x += kColumnsTogether) {
@@ -48,18 +48,18 @@ void AddColumnOf(const float* from, int columns, const float* weights, int taps,
       float* const result = sums + static_cast<ptrdiff_t>(y) * columns + x;
       Lanes sum[kRowsTogether];
       for (int j = 0; j < kRowsTogether; ++j) {
-        sum[j] = Load(result + static_cast<ptrdiff_t>(j) * columns);
+        sum[j] = load(result + static_cast<ptrdiff_t>(j) * columns);
       }
 #pragma GCC unroll 10
       for (int t = 0; t < count; ++t) {
-        const Lanes weight = Broadcast(weights[t]);
+        const Lanes weight = broadcast(weights[t]);
 #pragma GCC unroll 4
         for (int j = 0; j < kRowsTogether; ++j) {
-          sum[j] = MultiplyAdd(sum[j], Load(place + static_cast<ptrdiff_t>(t + j) * columns), weight);
+          sum[j] = multiplyAdd(sum[j], load(place + static_cast<ptrdiff_t>(t + j) * columns), weight);
         }
       }
       for (int j = 0; j < kRowsTogether; ++j) {
-        Store(sum[j], result + static_cast<ptrdiff_t>(j) * columns);
+        store(sum[j], result + static_cast<ptrdiff_t>(j) * columns);
       }
     }
   }
@@ -67,26 +67,26 @@ void AddColumnOf(const float* from, int columns, const float* weights, int taps,
 
 }  // namespace
 
-void ApplyRows(const float* from, ptrdiff_t stride, const float* weights, int together, int taps, int rows,
+void applyRows(const float* from, ptrdiff_t stride, const float* weights, int together, int taps, int rows,
                int columns, float* to) {
   switch (together) {
     case 1:
-      return ApplyRowsTogether<1>(from, stride, weights, taps, rows, columns, to);
+      return applyRowsTogether<1>(from, stride, weights, taps, rows, columns, to);
     case 2:
-      return ApplyRowsTogether<2>(from, stride, weights, taps, rows, columns, to);
+      return applyRowsTogether<2>(from, stride, weights, taps, rows, columns, to);
     case 3:
-      return ApplyRowsTogether<3>(from, stride, weights, taps, rows, columns, to);
+      return applyRowsTogether<3>(from, stride, weights, taps, rows, columns, to);
     default:
-      return ApplyRowsTogether<4>(from, stride, weights, taps, rows, columns, to);
+      return applyRowsTogether<4>(from, stride, weights, taps, rows, columns, to);
   }
 }
 
-void AddColumn(const float* from, int columns, const float* weights, int taps, int rows, float* sums) {
+void addColumn(const float* from, int columns, const float* weights, int taps, int rows, float* sums) {
   constexpr int kUsualTaps = 10;
   if (taps == kUsualTaps) {
-    AddColumnOf<kUsualTaps>(from, columns, weights, taps, rows, sums);
+    addColumnOf<kUsualTaps>(from, columns, weights, taps, rows, sums);
   } else {
-    AddColumnOf<0>(from, columns, weights, taps, rows, sums);
+    addColumnOf<0>(from, columns, weights, taps, rows, sums);
   }
 }
 

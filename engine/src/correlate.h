@@ -17,11 +17,11 @@ constexpr int kRowsTogether = 4;
 /// numbers: the sum of the products with the numbers from there on, of which there are `taps - 1` more. Rows
 /// of `from` are `stride` numbers apart. What a row of weights gives follows, without gaps, what the one
 /// before it gives.
-void ApplyRows(const float* from, ptrdiff_t stride, const float* weights, int together, int taps, int rows,
+void applyRows(const float* from, ptrdiff_t stride, const float* weights, int together, int taps, int rows,
                int columns, float* to);
 
 /// Applies a column of weights to each place of `rows` rows of `columns` numbers, followed by `taps - 1` rows
 /// more, and adds the results to `sums`. There are no gaps in either.
-void AddColumn(const float* from, int columns, const float* weights, int taps, int rows, float* sums);
+void addColumn(const float* from, int columns, const float* weights, int taps, int rows, float* sums);
 
 }  // namespace kyengine

@@ -45,9 +45,9 @@ struct Expected {
 /// Calls `visit` with what each convolution of the network and its matrix must be, in their order, until one
 /// call returns something else than success.
 template <typename Visit>
-ky_result_t ForEachExpected(const DescriptorShape& shape, Visit visit) {
-  ky_result_t result = visit(Expected{kFirstSide, 2, kColours, shape.first_channels});
-  int channels = shape.first_channels;
+ky_result_t forEachExpected(const DescriptorShape& shape, Visit visit) {
+  ky_result_t result = visit(Expected{kFirstSide, 2, kColours, shape.firstChannels});
+  int channels = shape.firstChannels;
   for (const ResidualBlock& block : shape.blocks) {
     if (result == KY_SUCCESS) {
       result = visit(Expected{kSide, block.halves ? 2 : 1, channels, block.channels});
@@ -68,7 +68,7 @@ class Reader {
   explicit Reader(std::span<const uint8_t> bytes) : bytes_(bytes) {}
 
   template <typename T>
-  bool Take(T* values, size_t count) {
+  bool take(T* values, size_t count) {
     const size_t size = count * sizeof(T);
     if (bytes_.size() < size) {
       return false;
@@ -80,7 +80,7 @@ class Reader {
     return true;
   }
 
-  bool at_end() const { return bytes_.empty(); }
+  bool atEnd() const { return bytes_.empty(); }
 
  private:
   std::span<const uint8_t> bytes_;
@@ -89,14 +89,14 @@ class Reader {
 /// Larger numbers belong to no trained network, and sums of their products might overflow.
 constexpr float kMostWeight = 1e4F;
 
-bool AllSound(const Buffer<float>& numbers) {
+bool allSound(const Buffer<float>& numbers) {
   // NaN fails the comparison.
   return std::all_of(numbers.begin(), numbers.end(), [](float x) { return std::fabs(x) <= kMostWeight; });
 }
 
-ky_result_t ReadConvolution(Reader& reader, const Expected& expected, Convolution* convolution) {
+ky_result_t readConvolution(Reader& reader, const Expected& expected, Convolution* convolution) {
   std::array<uint32_t, 6> head = {};
-  if (!reader.Take(head.data(), head.size())) {
+  if (!reader.take(head.data(), head.size())) {
     return KY_ERROR_MODEL;
   }
   const auto is = [](uint32_t number, int wanted) { return number == static_cast<uint32_t>(wanted); };
@@ -123,24 +123,24 @@ ky_result_t ReadConvolution(Reader& reader, const Expected& expected, Convolutio
   if (!c.factors.ok() || !c.offsets.ok() || !(c.bytes.ok() || c.floats.ok())) {
     return KY_ERROR_MEMORY;
   }
-  const bool read = reader.Take(c.factors.data(), outputs) && reader.Take(c.offsets.data(), outputs) &&
-                    reader.Take(c.bytes.data(), c.bytes.size()) &&
-                    reader.Take(c.floats.data(), c.floats.size());
-  return read && AllSound(c.factors) && AllSound(c.offsets) && AllSound(c.floats) ? KY_SUCCESS
+  const bool read = reader.take(c.factors.data(), outputs) && reader.take(c.offsets.data(), outputs) &&
+                    reader.take(c.bytes.data(), c.bytes.size()) &&
+                    reader.take(c.floats.data(), c.floats.size());
+  return read && allSound(c.factors) && allSound(c.offsets) && allSound(c.floats) ? KY_SUCCESS
                                                                                   : KY_ERROR_MODEL;
 }
 
 // ---- the network at work
 
 /// A map in `memory`, all zeros.
-Map Cleared(float* memory, int side, int channels) {
-  std::fill_n(memory, Map::Size(side, channels), 0.0F);
+Map cleared(float* memory, int side, int channels) {
+  std::fill_n(memory, Map::size(side, channels), 0.0F);
   return {memory, side, channels};
 }
 
 /// Calls `work` for every pixel of `map` and 16 of its channels.
 template <typename Work>
-void ForEachGroup(const Map& map, Work work) {
+void forEachGroup(const Map& map, Work work) {
   for (int y = 0; y < map.side; ++y) {
     for (int x = 0; x < map.side; ++x) {
       for (int channel = 0; channel < map.channels; channel += kLanes) {
@@ -151,28 +151,28 @@ void ForEachGroup(const Map& map, Work work) {
 }
 
 /// The maximum of 3 x 3 in steps of two.
-void MaxPool(const Map& from, const Map& to) {
-  ForEachGroup(to, [&](int y, int x, int channel) {
-    Lanes most = Load(from.at(2 * y, 2 * x) + channel);
+void maxPool(const Map& from, const Map& to) {
+  forEachGroup(to, [&](int y, int x, int channel) {
+    Lanes most = load(from.at(2 * y, 2 * x) + channel);
     for (int dy = 0; dy < 3; ++dy) {
       for (int dx = 0; dx < 3; ++dx) {
-        most = Max(most, Load(from.at(2 * y + dy, 2 * x + dx) + channel));
+        most = max(most, load(from.at(2 * y + dy, 2 * x + dx) + channel));
       }
     }
-    Store(most, to.at(y, x) + channel);
+    store(most, to.at(y, x) + channel);
   });
 }
 
 /// Adds the mean of 2 x 2 of `from` in steps of two to `to`, and makes the negative 0. `from` has no more
 /// channels than `to`: the others it adds zeros to.
-void AddMeansAndRectify(const Map& from, const Map& to) {
-  ForEachGroup(to, [&](int y, int x, int channel) {
-    Lanes sum = Load(to.at(y, x) + channel);
+void addMeansAndRectify(const Map& from, const Map& to) {
+  forEachGroup(to, [&](int y, int x, int channel) {
+    Lanes sum = load(to.at(y, x) + channel);
     if (channel < from.channels) {
-      const auto at = [&](int dy, int dx) { return Load(from.at(2 * y + dy, 2 * x + dx) + channel); };
-      sum = MultiplyAdd(sum, (at(0, 0) + at(0, 1)) + (at(1, 0) + at(1, 1)), Broadcast(0.25F));
+      const auto at = [&](int dy, int dx) { return load(from.at(2 * y + dy, 2 * x + dx) + channel); };
+      sum = multiplyAdd(sum, (at(0, 0) + at(0, 1)) + (at(1, 0) + at(1, 1)), broadcast(0.25F));
     }
-    Store(Max(sum, Broadcast(0)), to.at(y, x) + channel);
+    store(max(sum, broadcast(0)), to.at(y, x) + channel);
   });
 }
 
@@ -185,22 +185,22 @@ struct Needs {
   size_t convolve = 0;
 
   explicit Needs(const DescriptorShape& shape) {
-    picture = Map::Size(shape.side, kColours);
-    int side = ResultSide(shape.side, kFirstSide, 2);
-    int channels = shape.first_channels;
-    first = Map::Size(side, channels);
-    convolve = ConvolveMemory(kFirstSide, 2, kColours, shape.side);
-    side = ResultSide(side, kSide, 2);
-    map = std::max(Map::Size(side, channels), Map::Size(1, shape.outputs));
+    picture = Map::size(shape.side, kColours);
+    int side = resultSide(shape.side, kFirstSide, 2);
+    int channels = shape.firstChannels;
+    first = Map::size(side, channels);
+    convolve = convolveMemory(kFirstSide, 2, kColours, shape.side);
+    side = resultSide(side, kSide, 2);
+    map = std::max(Map::size(side, channels), Map::size(1, shape.outputs));
     for (const ResidualBlock& block : shape.blocks) {
       const int step = block.halves ? 2 : 1;
-      convolve = std::max({convolve, ConvolveMemory(kSide, step, channels, side),
-                           ConvolveMemory(kSide, 1, block.channels, ResultSide(side, kSide, step))});
+      convolve = std::max({convolve, convolveMemory(kSide, step, channels, side),
+                           convolveMemory(kSide, 1, block.channels, resultSide(side, kSide, step))});
       side = block.halves ? side / 2 : side;
       channels = block.channels;
-      map = std::max(map, Map::Size(side, channels));
+      map = std::max(map, Map::size(side, channels));
     }
-    convolve = std::max(convolve, ConvolveMemory(1, 1, channels, 1));
+    convolve = std::max(convolve, convolveMemory(1, 1, channels, 1));
   }
 
   size_t sum() const { return picture + first + 3 * map + convolve; }
@@ -208,36 +208,36 @@ struct Needs {
 
 }  // namespace
 
-const DescriptorShape& FaceDescriptorShape() {
+const DescriptorShape& faceDescriptorShape() {
   static constexpr DescriptorShape kShape = {150, 32, kBlocks, 128};
   return kShape;
 }
 
-bool DescriptorHeader::Recognises(std::span<const uint8_t> start) {
+bool DescriptorHeader::recognises(std::span<const uint8_t> start) {
   return start.size() >= sizeof(kMagic) && std::equal(std::begin(kMagic), std::end(kMagic), start.begin());
 }
 
-ky_result_t DescriptorHeader::Read(std::span<const uint8_t> bytes, const DescriptorShape& shape,
+ky_result_t DescriptorHeader::read(std::span<const uint8_t> bytes, const DescriptorShape& shape,
                                    DescriptorHeader* header) {
-  if (bytes.size() < kSize || !Recognises(bytes)) {
+  if (bytes.size() < kSize || !recognises(bytes)) {
     return KY_ERROR_MODEL;
   }
   Reader reader(bytes.subspan(sizeof(kMagic), kSize - sizeof(kMagic)));
   uint32_t layout = 0;
-  uint32_t own_checksum = 0;
+  uint32_t ownChecksum = 0;
   DescriptorHeader h;
-  reader.Take(&layout, 1);
-  reader.Take(&h.count, 1);
-  reader.Take(&h.length, 1);
-  reader.Take(&h.following, 1);
-  reader.Take(&h.checksum, 1);
-  reader.Take(&own_checksum, 1);
+  reader.take(&layout, 1);
+  reader.take(&h.count, 1);
+  reader.take(&h.length, 1);
+  reader.take(&h.following, 1);
+  reader.take(&h.checksum, 1);
+  reader.take(&ownChecksum, 1);
   size_t most = 0;
-  ForEachExpected(shape, [&most](const Expected& e) {
+  forEachExpected(shape, [&most](const Expected& e) {
     most += kConvolutionHeader + (2 * static_cast<size_t>(e.outputs) + e.weights()) * sizeof(float);
     return KY_SUCCESS;
   });
-  if (layout != 1 || own_checksum != Checksum(bytes.first(kSize - sizeof(uint32_t))) ||
+  if (layout != 1 || ownChecksum != crcOf(bytes.first(kSize - sizeof(uint32_t))) ||
       h.count != static_cast<uint32_t>(shape.convolutions() + 1) || h.length > most) {
     return KY_ERROR_MODEL;
   }
@@ -245,9 +245,9 @@ ky_result_t DescriptorHeader::Read(std::span<const uint8_t> bytes, const Descrip
   return KY_SUCCESS;
 }
 
-ky_result_t Descriptor::Read(const DescriptorHeader& header, std::span<const uint8_t> bytes,
+ky_result_t Descriptor::read(const DescriptorHeader& header, std::span<const uint8_t> bytes,
                              const DescriptorShape& shape, Descriptor* descriptor) {
-  if (bytes.size() != header.length || Checksum(bytes) != header.checksum) {
+  if (bytes.size() != header.length || crcOf(bytes) != header.checksum) {
     return KY_ERROR_MODEL;
   }
   Descriptor read;
@@ -260,27 +260,27 @@ ky_result_t Descriptor::Read(const DescriptorHeader& header, std::span<const uin
   Reader reader(bytes);
   Convolution* next = read.convolutions_.begin();
   const ky_result_t result =
-      ForEachExpected(shape, [&](const Expected& e) { return ReadConvolution(reader, e, next++); });
-  if (result != KY_SUCCESS || !reader.at_end()) {
+      forEachExpected(shape, [&](const Expected& e) { return readConvolution(reader, e, next++); });
+  if (result != KY_SUCCESS || !reader.atEnd()) {
     return result != KY_SUCCESS ? result : KY_ERROR_MODEL;
   }
   *descriptor = std::move(read);
   return KY_SUCCESS;
 }
 
-ky_result_t Descriptor::Describe(const uint8_t* rgb, float* numbers) const {
+ky_result_t Descriptor::describe(const uint8_t* rgb, float* numbers) const {
   const Needs needs(shape_);
   const Buffer<float> memory(needs.sum());
   if (!memory.ok()) {
     return KY_ERROR_MEMORY;
   }
-  float* const picture_memory = memory.data();
-  float* const first_memory = picture_memory + needs.picture;
-  float* const maps = first_memory + needs.first;
+  float* const pictureMemory = memory.data();
+  float* const firstMemory = pictureMemory + needs.picture;
+  float* const maps = firstMemory + needs.first;
   float* const scratch = maps + 3 * needs.map;
   std::array<float*, 3> free = {maps, maps + needs.map, maps + 2 * needs.map};
 
-  const Map picture = Cleared(picture_memory, shape_.side, kColours);
+  const Map picture = cleared(pictureMemory, shape_.side, kColours);
   for (int y = 0; y < shape_.side; ++y) {
     float* const row = picture.at(y, 0);
     for (int i = 0; i < shape_.side * kColours; ++i) {
@@ -289,34 +289,34 @@ ky_result_t Descriptor::Describe(const uint8_t* rgb, float* numbers) const {
   }
 
   const Convolution* convolution = convolutions_.begin();
-  const Map first = Cleared(first_memory, ResultSide(shape_.side, kFirstSide, 2), shape_.first_channels);
-  Convolve(*convolution++, picture, {.rectify = true}, first, scratch);
-  Map now = Cleared(free[0], ResultSide(first.side, kSide, 2), shape_.first_channels);
-  MaxPool(first, now);
+  const Map first = cleared(firstMemory, resultSide(shape_.side, kFirstSide, 2), shape_.firstChannels);
+  convolve(*convolution++, picture, {.rectify = true}, first, scratch);
+  Map now = cleared(free[0], resultSide(first.side, kSide, 2), shape_.firstChannels);
+  maxPool(first, now);
 
   for (const ResidualBlock& block : shape_.blocks) {
-    const Map middle = Cleared(free[1], ResultSide(now.side, kSide, block.halves ? 2 : 1), block.channels);
-    Convolve(*convolution++, now, {.rectify = true}, middle, scratch);
+    const Map middle = cleared(free[1], resultSide(now.side, kSide, block.halves ? 2 : 1), block.channels);
+    convolve(*convolution++, now, {.rectify = true}, middle, scratch);
     // The mean may have a row and a column more than the convolutions, which have zeros there.
-    const Map after = Cleared(free[2], block.halves ? now.side / 2 : now.side, block.channels);
+    const Map after = cleared(free[2], block.halves ? now.side / 2 : now.side, block.channels);
     if (block.halves) {
-      Convolve(*convolution++, middle, {}, after, scratch);
-      AddMeansAndRectify(now, after);
+      convolve(*convolution++, middle, {}, after, scratch);
+      addMeansAndRectify(now, after);
     } else {
-      Convolve(*convolution++, middle, {.rectify = true, .skip = &now}, after, scratch);
+      convolve(*convolution++, middle, {.rectify = true, .skip = &now}, after, scratch);
     }
     now = after;
     std::swap(free[0], free[2]);
   }
 
-  const Map mean = Cleared(free[1], 1, now.channels);
-  const Lanes share = Broadcast(1 / static_cast<float>(now.side * now.side));
-  ForEachGroup(now, [&](int y, int x, int channel) {
+  const Map mean = cleared(free[1], 1, now.channels);
+  const Lanes share = broadcast(1 / static_cast<float>(now.side * now.side));
+  forEachGroup(now, [&](int y, int x, int channel) {
     float* const sum = mean.at(0, 0) + channel;
-    Store(MultiplyAdd(Load(sum), Load(now.at(y, x) + channel), share), sum);
+    store(multiplyAdd(load(sum), load(now.at(y, x) + channel), share), sum);
   });
-  const Map result = Cleared(free[2], 1, shape_.outputs);
-  Convolve(*convolution, mean, {}, result, scratch);
+  const Map result = cleared(free[2], 1, shape_.outputs);
+  convolve(*convolution, mean, {}, result, scratch);
   std::copy_n(result.at(0, 0), shape_.outputs, numbers);
   return std::all_of(numbers, numbers + shape_.outputs, [](float x) { return std::isfinite(x); })
              ? KY_SUCCESS

@@ -27,7 +27,7 @@ struct ResidualBlock {
 /// All numbers of channels, and of outputs, are multiples of 16.
 struct DescriptorShape {
   int side;  ///< of the square picture
-  int first_channels;
+  int firstChannels;
   std::span<const ResidualBlock> blocks;
   int outputs;
 
@@ -36,7 +36,7 @@ struct DescriptorShape {
 
 /// dlib's network for faces (`dlib_face_recognition_resnet_model_v1`): 150 x 150 pixels, 128 numbers, 270.8
 /// million multiply-adds.
-const DescriptorShape& FaceDescriptorShape();
+const DescriptorShape& faceDescriptorShape();
 
 /// The first bytes of a model file. All numbers are little-endian.
 ///
@@ -68,11 +68,11 @@ struct DescriptorHeader {
   uint32_t checksum = 0;
 
   /// Whether a file that starts like this means to be such a model.
-  static bool Recognises(std::span<const uint8_t> start);
+  static bool recognises(std::span<const uint8_t> start);
 
   /// Reads the first kSize bytes of a file. KY_ERROR_MODEL when they are not the header of a model of this
   /// shape, whose `length` then is no more than one of this shape can have.
-  static ky_result_t Read(std::span<const uint8_t> bytes, const DescriptorShape& shape,
+  static ky_result_t read(std::span<const uint8_t> bytes, const DescriptorShape& shape,
                           DescriptorHeader* header);
 };
 
@@ -80,12 +80,12 @@ class Descriptor {
  public:
   /// Reads the convolutions, `header.length` bytes. KY_ERROR_MODEL when they are damaged, not of this shape
   /// or hold what is no number; KY_ERROR_MEMORY.
-  static ky_result_t Read(const DescriptorHeader& header, std::span<const uint8_t> bytes,
+  static ky_result_t read(const DescriptorHeader& header, std::span<const uint8_t> bytes,
                           const DescriptorShape& shape, Descriptor* descriptor);
 
   /// Describes a picture of the shape's side, packed rows of red, green and blue, with `outputs` numbers.
   /// KY_ERROR_MEMORY; KY_ERROR_MODEL when the model gives what is no number. Any number of threads may call.
-  ky_result_t Describe(const uint8_t* rgb, float* numbers) const;
+  ky_result_t describe(const uint8_t* rgb, float* numbers) const;
 
   int outputs() const { return shape_.outputs; }
 

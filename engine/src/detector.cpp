@@ -16,26 +16,26 @@ namespace {
 
 class Detector {
  public:
-  Detector(const char* model_path, int config) : finder_(model_path, config, Use::kStills) {}
+  Detector(const char* modelPath, int config) : finder_(modelPath, config, Use::kStills) {}
 
   float threshold() const {
     const std::lock_guard lock(mutex_);
     return threshold_;
   }
 
-  void set_threshold(float threshold) {
+  void setThreshold(float threshold) {
     // Refuses NaN, too.
-    Require(threshold >= KY_MIN_THRESHOLD && threshold <= KY_MAX_THRESHOLD, KY_ERROR_RANGE);
+    require(threshold >= KY_MIN_THRESHOLD && threshold <= KY_MAX_THRESHOLD, KY_ERROR_RANGE);
     const std::lock_guard lock(mutex_);
     threshold_ = threshold;
   }
 
-  std::vector<ky_face_t> Detect(const Frame& frame) {
+  std::vector<ky_face_t> detect(const Frame& frame) {
     const std::lock_guard lock(mutex_);
-    frame.ToUprightGray(gray_);
+    frame.toUprightGray(gray_);
     std::vector<ky_face_t> records;
-    for (const FoundFace& face : finder_.Find(gray_, threshold_)) {
-      records.push_back(finder_.Record(gray_, face, frame));
+    for (const FoundFace& face : finder_.find(gray_, threshold_)) {
+      records.push_back(finder_.record(gray_, face, frame));
     }
     return records;
   }
@@ -54,37 +54,37 @@ using Detectors = Handles<Detector>;
 
 using kyengine::Detector;
 using kyengine::Detectors;
-using kyengine::Guarded;
-using kyengine::Require;
+using kyengine::guarded;
+using kyengine::require;
 
-int ky_face_create_detector(ky_handle_t* handle, const char* model_path, int config) {
-  return Detectors::Create(handle, model_path, config);
+int ky_face_create_detector(ky_handle_t* handle, const char* modelPath, int config) {
+  return Detectors::create(handle, modelPath, config);
 }
 
-void ky_face_destroy_detector(ky_handle_t handle) { Detectors::Destroy(handle); }
+void ky_face_destroy_detector(ky_handle_t handle) { Detectors::destroy(handle); }
 
 int ky_face_detect_get_threshold(ky_handle_t handle, float* threshold) {
-  return Guarded([&] {
-    const auto detector = Detectors::Find(handle);
-    Require(threshold != nullptr, KY_ERROR_NULL_POINTER);
+  return guarded([&] {
+    const auto detector = Detectors::find(handle);
+    require(threshold != nullptr, KY_ERROR_NULL_POINTER);
     *threshold = detector->threshold();
   });
 }
 
 int ky_face_detect_set_threshold(ky_handle_t handle, float threshold) {
-  return Guarded([&] { Detectors::Find(handle)->set_threshold(threshold); });
+  return guarded([&] { Detectors::find(handle)->setThreshold(threshold); });
 }
 
-int ky_face_detect(ky_handle_t handle, const unsigned char* image, int pixel_format, int width, int height,
+int ky_face_detect(ky_handle_t handle, const unsigned char* image, int pixelFormat, int width, int height,
                    int stride, int orientation, ky_face_t** faces, int* count) {
-  return kyengine::Search(&Detector::Detect, handle, image, pixel_format, width, height, stride, orientation,
+  return kyengine::search(&Detector::detect, handle, image, pixelFormat, width, height, stride, orientation,
                           faces, count);
 }
 
-void ky_face_release_detector_result(ky_face_t* faces, int /*count*/) { kyengine::ReleaseFaces(faces); }
+void ky_face_release_detector_result(ky_face_t* faces, int /*count*/) { kyengine::releaseFaces(faces); }
 
 int ky_face_algorithm_info() {
-  return Guarded([] {
+  return guarded([] {
     const int written = std::printf(
         "kyface open engine %s, dlib %d.%d.%d\n"
         "  detector: frontal faces by histograms of oriented gradients; built in\n"
@@ -94,6 +94,6 @@ int ky_face_algorithm_info() {
         "  verifier with a descriptor's model: %d numbers, version %d, %d bytes a feature\n",
         KY_ENGINE_VERSION, DLIB_MAJOR_VERSION, DLIB_MINOR_VERSION, DLIB_PATCH_VERSION, KY_VERIFY_VERSION,
         KY_FEATURE_LENGTH, KY_DESCRIPTOR_NUMBERS, KY_DESCRIPTOR_VERSION, KY_DESCRIPTOR_LENGTH);
-    Require(written > 0 && std::fflush(stdout) == 0, KY_ERROR_INTERNAL);
+    require(written > 0 && std::fflush(stdout) == 0, KY_ERROR_INTERNAL);
   });
 }

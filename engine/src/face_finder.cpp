@@ -13,25 +13,25 @@
 namespace kyengine {
 namespace {
 
-float ScoreOf(double confidence) { return static_cast<float>(1 / (1 + std::exp(-confidence))); }
+float scoreOf(double confidence) { return static_cast<float>(1 / (1 + std::exp(-confidence))); }
 
 /// The confidence that has this score: infinite for 1.
-double ConfidenceOf(double score) { return std::log(score / (1 - score)); }
+double confidenceOf(double score) { return std::log(score / (1 - score)); }
 
-void CheckConfig(int config) {
+void checkConfig(int config) {
   const bool size = config >= KY_MIN_SMALLEST_FACE && config <= KY_MAX_SMALLEST_FACE;
-  Require(size || config == KY_CONFIG_DEFAULT || config == KY_CONFIG_LARGE_FACES ||
+  require(size || config == KY_CONFIG_DEFAULT || config == KY_CONFIG_LARGE_FACES ||
               config == KY_CONFIG_SMALL_FACES,
           KY_ERROR_CONFIG);
 }
 
 /// The size of `pixels` in a picture that is enlarged by `scale`.
-int Scaled(int pixels, double scale) { return std::max(static_cast<int>(std::lround(pixels * scale)), 1); }
+int scaled(int pixels, double scale) { return std::max(static_cast<int>(std::lround(pixels * scale)), 1); }
 
 }  // namespace
 
-FaceFinder::FaceFinder(const char* model_path, int config, Use use)
-    : FaceFinder((CheckConfig(config), LoadModel(model_path)), config, use) {}
+FaceFinder::FaceFinder(const char* modelPath, int config, Use use)
+    : FaceFinder((checkConfig(config), loadModel(modelPath)), config, use) {}
 
 FaceFinder::FaceFinder(Model model, int config, Use use)
     : config_(config),
@@ -41,8 +41,8 @@ FaceFinder::FaceFinder(Model model, int config, Use use)
 
 /// By how much a frame is enlarged before it is searched, so that the smallest faces that are to be found
 /// fill the detector's window.
-double FaceFinder::Scale(int width, int height) const {
-  const double window = std::max(scanner_.filters().window_width, scanner_.filters().window_height);
+double FaceFinder::scaleFor(int width, int height) const {
+  const double window = std::max(scanner_.filters().windowWidth, scanner_.filters().windowHeight);
   switch (config_) {
     case KY_CONFIG_LARGE_FACES:
       return 1;
@@ -60,43 +60,43 @@ double FaceFinder::Scale(int width, int height) const {
   }
 }
 
-bool FaceFinder::HasRoom(int width, int height) const {
-  const double scale = Scale(width, height);
-  return Scaled(width, scale) >= scanner_.filters().window_width &&
-         Scaled(height, scale) >= scanner_.filters().window_height;
+bool FaceFinder::hasRoom(int width, int height) const {
+  const double scale = scaleFor(width, height);
+  return scaled(width, scale) >= scanner_.filters().windowWidth &&
+         scaled(height, scale) >= scanner_.filters().windowHeight;
 }
 
-std::vector<FoundFace> FaceFinder::Find(const GrayImage& upright, float threshold) {
+std::vector<FoundFace> FaceFinder::find(const GrayImage& upright, float threshold) {
   const int width = static_cast<int>(upright.nc());
   const int height = static_cast<int>(upright.nr());
-  if (!HasRoom(width, height) || threshold >= KY_MAX_THRESHOLD) {
+  if (!hasRoom(width, height) || threshold >= KY_MAX_THRESHOLD) {
     return {};
   }
-  const double scale = Scale(width, height);
-  const int scaled_width = Scaled(width, scale);
-  const int scaled_height = Scaled(height, scale);
+  const double scale = scaleFor(width, height);
+  const int scaledWidth = scaled(width, scale);
+  const int scaledHeight = scaled(height, scale);
   // What is to be reduced to less than half is halved first: every pixel counts.
   const GrayImage* source = &upright;
-  while (source->nc() > 2 * static_cast<long>(scaled_width) &&
-         source->nr() > 2 * static_cast<long>(scaled_height)) {
-    Halve(*source, searched_);
+  while (source->nc() > 2 * static_cast<long>(scaledWidth) &&
+         source->nr() > 2 * static_cast<long>(scaledHeight)) {
+    halve(*source, searched_);
     swap(searched_, halved_);
     source = &halved_;
   }
-  searched_.set_size(scaled_height, scaled_width);
-  resizer_.Resize(*source, searched_);
+  searched_.set_size(scaledHeight, scaledWidth);
+  resizer_.resize(*source, searched_);
 
   // The corners' pixels have stayed the corners'.
   const auto factor = [](int pixels, int scaled) {
     return scaled > 1 ? static_cast<double>(pixels - 1) / (scaled - 1) : 1.0;
   };
-  const double across = factor(width, scaled_width);
-  const double down = factor(height, scaled_height);
+  const double across = factor(width, scaledWidth);
+  const double down = factor(height, scaledHeight);
   std::vector<FoundFace> faces;
-  for (const dlib::rect_detection& d : scanner_.Find(searched_, ConfidenceOf(threshold))) {
+  for (const dlib::rect_detection& d : scanner_.find(searched_, confidenceOf(threshold))) {
     const dlib::drectangle box(d.rect);
     faces.push_back({{box.left() * across, box.top() * down, box.right() * across, box.bottom() * down},
-                     ScoreOf(d.detection_confidence)});
+                     scoreOf(d.detection_confidence)});
   }
   std::sort(faces.begin(), faces.end(), [](const FoundFace& a, const FoundFace& b) {
     return std::tuple(-a.score, a.box.top(), a.box.left()) < std::tuple(-b.score, b.box.top(), b.box.left());
@@ -104,11 +104,11 @@ std::vector<FoundFace> FaceFinder::Find(const GrayImage& upright, float threshol
   return faces;
 }
 
-ky_face_t FaceFinder::Record(const GrayImage& upright, const FoundFace& face, const Frame& frame) const {
+ky_face_t FaceFinder::record(const GrayImage& upright, const FoundFace& face, const Frame& frame) const {
   ky_face_t record = {};
-  record.rect = frame.ToFrame(face.box);
+  record.rect = frame.toFrame(face.box);
   record.score = face.score;
-  Describe(landmarks_.get(), upright, face.box, frame, &record);
+  describe(landmarks_.get(), upright, face.box, frame, &record);
   return record;
 }
 

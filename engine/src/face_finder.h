@@ -23,21 +23,21 @@ enum class Use { kStills, kVideo };
 class FaceFinder {
  public:
   /// Throws Failure when `model_path` or `config` is not one that `ky_engine.h` lists.
-  FaceFinder(const char* model_path, int config, Use use);
+  FaceFinder(const char* modelPath, int config, Use use);
 
   /// Finds faces with a score of at least `threshold`, the best first.
-  std::vector<FoundFace> Find(const GrayImage& upright, float threshold);
+  std::vector<FoundFace> find(const GrayImage& upright, float threshold);
 
   /// Whether a picture of this size has room for a face at all. Finding none in one that has not costs
   /// nothing.
-  bool HasRoom(int width, int height) const;
+  bool hasRoom(int width, int height) const;
 
   /// The record of a face, with its landmarks and without an identity.
-  ky_face_t Record(const GrayImage& upright, const FoundFace& face, const Frame& frame) const;
+  ky_face_t record(const GrayImage& upright, const FoundFace& face, const Frame& frame) const;
 
  private:
   FaceFinder(Model model, int config, Use use);
-  double Scale(int width, int height) const;
+  double scaleFor(int width, int height) const;
 
   int config_;
   Use use_;

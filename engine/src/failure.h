@@ -12,7 +12,7 @@ struct Failure {
 };
 
 /// Throws Failure{code} unless `condition` holds.
-inline void Require(bool condition, ky_result_t code) {
+inline void require(bool condition, ky_result_t code) {
   if (!condition) {
     throw Failure{code};
   }

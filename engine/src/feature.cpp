@@ -27,15 +27,15 @@ constexpr size_t kNumbersAt = kCountAt + sizeof(uint16_t);
 constexpr size_t kDescriptorLength = kNumbersAt + KY_DESCRIPTOR_NUMBERS * sizeof(float) + kChecksum;
 static_assert(kDescriptorLength == KY_DESCRIPTOR_LENGTH);
 
-constexpr size_t TextLength(size_t length) { return length / 3 * 4 + 1; }
+constexpr size_t textLength(size_t length) { return length / 3 * 4 + 1; }
 static_assert(kPatternLength % 3 == 0 && kDescriptorLength % 3 == 0, "texts need no padding");
-static_assert(TextLength(kPatternLength) == KY_FEATURE_TEXT_LENGTH);
-static_assert(TextLength(kDescriptorLength) == KY_DESCRIPTOR_TEXT_LENGTH);
+static_assert(textLength(kPatternLength) == KY_FEATURE_TEXT_LENGTH);
+static_assert(textLength(kDescriptorLength) == KY_DESCRIPTOR_TEXT_LENGTH);
 
 using Numbers = std::array<float, KY_DESCRIPTOR_NUMBERS>;
 
 /// The length of features that start like this; 0 when none do.
-size_t LengthOf(uint8_t first, uint8_t second, uint8_t version) {
+size_t lengthOf(uint8_t first, uint8_t second, uint8_t version) {
   if (first != 'K' || second != 'Y') {
     return 0;
   }
@@ -44,22 +44,22 @@ size_t LengthOf(uint8_t first, uint8_t second, uint8_t version) {
                                             : 0;
 }
 
-void Append(std::vector<uint8_t>& bytes, const void* value, size_t size) {
+void append(std::vector<uint8_t>& bytes, const void* value, size_t size) {
   const auto* const first = static_cast<const uint8_t*>(value);
   bytes.insert(bytes.end(), first, first + size);
 }
 
-uint32_t ChecksumOf(const std::vector<uint8_t>& bytes) {
-  return Checksum(std::span(bytes).first(bytes.size() - kChecksum));
+uint32_t checksumOf(const std::vector<uint8_t>& bytes) {
+  return crcOf(std::span(bytes).first(bytes.size() - kChecksum));
 }
 
-Numbers NumbersOf(const Feature& feature) {
+Numbers numbersOf(const Feature& feature) {
   Numbers numbers;
   std::memcpy(numbers.data(), &feature.bytes()[kNumbersAt], sizeof(numbers));
   return numbers;
 }
 
-std::span<const uint8_t, kPatternBytes> HistogramsOf(const Feature& feature) {
+std::span<const uint8_t, kPatternBytes> histogramsOf(const Feature& feature) {
   return std::span(feature.bytes()).subspan<kMark, kPatternBytes>();
 }
 
@@ -80,38 +80,38 @@ constexpr std::array<int16_t, 256> kValueOf = [] {
 Feature::Feature(const Patterns& patterns) : bytes_({'K', 'Y', KY_VERIFY_VERSION}) {
   bytes_.reserve(kPatternLength);
   bytes_.insert(bytes_.end(), patterns.begin(), patterns.end());
-  Seal();
+  seal();
 }
 
 Feature::Feature(std::span<const float, KY_DESCRIPTOR_NUMBERS> numbers, uint32_t tag)
     : bytes_({'K', 'Y', KY_DESCRIPTOR_VERSION}) {
   constexpr uint16_t kCount = KY_DESCRIPTOR_NUMBERS;
   bytes_.reserve(kDescriptorLength);
-  Append(bytes_, &tag, sizeof(tag));
-  Append(bytes_, &kCount, sizeof(kCount));
-  Append(bytes_, numbers.data(), numbers.size_bytes());
-  Seal();
+  append(bytes_, &tag, sizeof(tag));
+  append(bytes_, &kCount, sizeof(kCount));
+  append(bytes_, numbers.data(), numbers.size_bytes());
+  seal();
 }
 
-void Feature::Seal() {
-  const uint32_t checksum = Checksum(bytes_);
-  Append(bytes_, &checksum, sizeof(checksum));
+void Feature::seal() {
+  const uint32_t checksum = crcOf(bytes_);
+  append(bytes_, &checksum, sizeof(checksum));
 }
 
-std::optional<Feature> Feature::Of(std::vector<uint8_t> bytes) {
-  if (bytes.size() < kMark || bytes.size() != LengthOf(bytes[0], bytes[1], bytes[2])) {
+std::optional<Feature> Feature::of(std::vector<uint8_t> bytes) {
+  if (bytes.size() < kMark || bytes.size() != lengthOf(bytes[0], bytes[1], bytes[2])) {
     return std::nullopt;
   }
   uint32_t checksum = 0;
   std::memcpy(&checksum, &bytes[bytes.size() - kChecksum], kChecksum);
-  if (checksum != ChecksumOf(bytes)) {
+  if (checksum != checksumOf(bytes)) {
     return std::nullopt;
   }
   Feature feature(std::move(bytes));
   if (feature.version() == KY_DESCRIPTOR_VERSION) {
     uint16_t count = 0;
     std::memcpy(&count, &feature.bytes_[kCountAt], sizeof(count));
-    const Numbers numbers = NumbersOf(feature);
+    const Numbers numbers = numbersOf(feature);
     if (count != numbers.size() ||
         !std::all_of(numbers.begin(), numbers.end(), [](float x) { return std::isfinite(x); })) {
       return std::nullopt;
@@ -128,12 +128,12 @@ uint32_t Feature::tag() const {
   return tag;
 }
 
-float Similarity(const Feature& a, const Feature& b) {
+float similarity(const Feature& a, const Feature& b) {
   if (a.version() == KY_VERIFY_VERSION) {
-    return Similarity(HistogramsOf(a), HistogramsOf(b));
+    return similarity(histogramsOf(a), histogramsOf(b));
   }
-  const Numbers x = NumbersOf(a);
-  const Numbers y = NumbersOf(b);
+  const Numbers x = numbersOf(a);
+  const Numbers y = numbersOf(b);
   double square = 0;
   for (size_t i = 0; i < x.size(); ++i) {
     const double difference = static_cast<double>(x[i]) - static_cast<double>(y[i]);
@@ -143,7 +143,7 @@ float Similarity(const Feature& a, const Feature& b) {
   return static_cast<float>(std::max(similarity, 0.0));
 }
 
-void WriteText(const Feature& feature, char* text) {
+void writeText(const Feature& feature, char* text) {
   const std::vector<uint8_t>& bytes = feature.bytes();
   for (size_t i = 0; i < bytes.size(); i += 3) {
     const unsigned bits = static_cast<unsigned>(bytes[i]) << 16 | static_cast<unsigned>(bytes[i + 1]) << 8 |
@@ -155,7 +155,7 @@ void WriteText(const Feature& feature, char* text) {
   *text = '\0';
 }
 
-std::optional<Feature> ReadText(const char* text) {
+std::optional<Feature> readText(const char* text) {
   std::vector<uint8_t> bytes;
   // The first three bytes tell the length.
   size_t length = kMark;
@@ -172,11 +172,11 @@ std::optional<Feature> ReadText(const char* text) {
       bytes.push_back(static_cast<uint8_t>(bits >> shift));
     }
     if (bytes.size() == kMark) {
-      length = LengthOf(bytes[0], bytes[1], bytes[2]);
+      length = lengthOf(bytes[0], bytes[1], bytes[2]);
       bytes.reserve(length);
     }
   }
-  return *text == '\0' ? Feature::Of(std::move(bytes)) : std::nullopt;
+  return *text == '\0' ? Feature::of(std::move(bytes)) : std::nullopt;
 }
 
 }  // namespace kyengine

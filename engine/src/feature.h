@@ -25,7 +25,7 @@ class Feature {
   Feature(std::span<const float, KY_DESCRIPTOR_NUMBERS> numbers, uint32_t tag);
 
   /// The feature with these bytes, if they are one.
-  static std::optional<Feature> Of(std::vector<uint8_t> bytes);
+  static std::optional<Feature> of(std::vector<uint8_t> bytes);
 
   const std::vector<uint8_t>& bytes() const { return bytes_; }
 
@@ -37,19 +37,19 @@ class Feature {
 
  private:
   explicit Feature(std::vector<uint8_t> bytes) : bytes_(std::move(bytes)) {}
-  void Seal();
+  void seal();
 
   std::vector<uint8_t> bytes_;
 };
 
 /// How alike two features of one version and tag are, from 0 to 1; symmetric, and 1 for a feature and itself.
-float Similarity(const Feature& a, const Feature& b);
+float similarity(const Feature& a, const Feature& b);
 
 /// Writes the text of a feature with its terminating zero: base64.
-void WriteText(const Feature& feature, char* text);
+void writeText(const Feature& feature, char* text);
 
 /// The feature that has this text, if it is one. Reads up to the first character that cannot be, and never
 /// more than KY_FEATURE_TEXT_LENGTH bytes.
-std::optional<Feature> ReadText(const char* text);
+std::optional<Feature> readText(const char* text);
 
 }  // namespace kyengine

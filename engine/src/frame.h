@@ -23,36 +23,36 @@ using GrayImage = dlib::array2d<unsigned char>;
 class Frame {
  public:
   /// Throws Failure when an argument is out of its range; reads no pixels.
-  Frame(const unsigned char* image, int pixel_format, int width, int height, int stride, int orientation);
+  Frame(const unsigned char* image, int pixelFormat, int width, int height, int stride, int orientation);
 
   /// Writes the luma of the frame, turned upright, into `gray`. The 4:2:0 formats carry it; of colours it is
   /// 0.299 R + 0.587 G + 0.114 B.
-  void ToUprightGray(GrayImage& gray) const;
+  void toUprightGray(GrayImage& gray) const;
 
   /// Writes the colours of a rectangle of the frame as it was handed over, which lies within it, into `rgb`:
   /// packed rows of red, green and blue. Gray has three equal colours; the 4:2:0 formats are full range, as
   /// cameras and JFIF have them (R = Y + 1.402 V, G = Y - 0.344 U - 0.714 V, B = Y + 1.772 U).
-  void ToRgb(int left, int top, int width, int height, uint8_t* rgb) const;
+  void toRgb(int left, int top, int width, int height, uint8_t* rgb) const;
 
   int width() const { return width_; }
   int height() const { return height_; }
 
   /// Size of the upright picture.
-  int upright_width() const { return quarter_turned() ? height_ : width_; }
-  int upright_height() const { return quarter_turned() ? width_ : height_; }
+  int uprightWidth() const { return quarterTurned() ? height_ : width_; }
+  int uprightHeight() const { return quarterTurned() ? width_ : height_; }
 
   /// The frame's rectangle that covers the pixels of `upright`, cut to the frame. A rectangle outside the
   /// frame comes back empty, on its border.
-  ky_rect_t ToFrame(const dlib::drectangle& upright) const;
+  ky_rect_t toFrame(const dlib::drectangle& upright) const;
 
   /// The frame's point that shows `upright`.
-  ky_pointf_t ToFrame(const dlib::dpoint& upright) const;
+  ky_pointf_t toFrame(const dlib::dpoint& upright) const;
 
  private:
-  bool quarter_turned() const { return orientation_ == 90 || orientation_ == 270; }
+  bool quarterTurned() const { return orientation_ == 90 || orientation_ == 270; }
 
   template <typename Luma>
-  void Turn(int bytes_per_pixel, Luma luma, GrayImage& gray) const;
+  void turn(int bytesPerPixel, Luma luma, GrayImage& gray) const;
 
   const unsigned char* image_;
   int format_;

@@ -34,13 +34,13 @@ constexpr Boundary kBoundaries[] = {
 /// The direction of a gradient that has `beyond` boundaries of its quarter behind it, counted from the
 /// horizontal; of bytes, or of 16 of them.
 template <typename Truth, typename Number>
-Number DirectionOf(Truth upwards, Truth to_the_left, Number beyond) {
+Number directionOf(Truth upwards, Truth toTheLeft, Number beyond) {
   constexpr int kLeft = kDirections / 2;
   const Number right = upwards ? kDirections - beyond : beyond;
-  return to_the_left ? (upwards ? kLeft + beyond : kLeft - beyond) : right == kDirections ? Number{} : right;
+  return toTheLeft ? (upwards ? kLeft + beyond : kLeft - beyond) : right == kDirections ? Number{} : right;
 }
 
-void FindGradient(const uint8_t* above, const uint8_t* row, const uint8_t* below, ptrdiff_t x,
+void findGradient(const uint8_t* above, const uint8_t* row, const uint8_t* below, ptrdiff_t x,
                   uint8_t* direction, float* length) {
   const int dx = row[x + 1] - row[x - 1];
   const int dy = below[x] - above[x];
@@ -51,21 +51,21 @@ void FindGradient(const uint8_t* above, const uint8_t* row, const uint8_t* below
     beyond += along * b.q > across * b.p ? 1 : 0;
   }
   const bool upwards = dy < 0;
-  const bool to_the_left = upwards ? dx <= 0 : dx < 0;
-  *direction = static_cast<uint8_t>(DirectionOf(upwards, to_the_left, beyond));
+  const bool toTheLeft = upwards ? dx <= 0 : dx < 0;
+  *direction = static_cast<uint8_t>(directionOf(upwards, toTheLeft, beyond));
   *length = std::sqrt(static_cast<float>(dx * dx + dy * dy));
 }
 
 /// The gradients of 16 pixels from `x` on.
-void FindGradients16(const uint8_t* above, const uint8_t* row, const uint8_t* below, ptrdiff_t x,
+void findGradients16(const uint8_t* above, const uint8_t* row, const uint8_t* below, ptrdiff_t x,
                      uint8_t* directions, float* lengths) {
   using Bytes = Sixteen<uint8_t>;
   using Halves = Sixteen<uint16_t>;
   using Words = Sixteen<int32_t>;
-  const Bytes left = LoadSixteen(row + x - 1);
-  const Bytes right = LoadSixteen(row + x + 1);
-  const Bytes up = LoadSixteen(above + x);
-  const Bytes down = LoadSixteen(below + x);
+  const Bytes left = loadSixteen(row + x - 1);
+  const Bytes right = loadSixteen(row + x + 1);
+  const Bytes up = loadSixteen(above + x);
+  const Bytes down = loadSixteen(below + x);
   const auto distance = [](Bytes a, Bytes b) {
     return __builtin_convertvector(a > b ? a - b : b - a, Halves);
   };
@@ -78,13 +78,13 @@ void FindGradients16(const uint8_t* above, const uint8_t* row, const uint8_t* be
     beyond -= (Halves)(along * b.q > across * b.p);
   }
   const auto upwards = down < up;
-  const auto to_the_left = upwards ? right <= left : right < left;
-  const Bytes direction = DirectionOf(upwards, to_the_left, __builtin_convertvector(beyond, Bytes));
+  const auto toTheLeft = upwards ? right <= left : right < left;
+  const Bytes direction = directionOf(upwards, toTheLeft, __builtin_convertvector(beyond, Bytes));
   std::memcpy(directions + x, &direction, sizeof(direction));
 
   const auto squares =
       __builtin_convertvector(across * across, Words) + __builtin_convertvector(along * along, Words);
-  Store(Root(LanesOf(squares)), lengths + x);
+  store(root(lanesOf(squares)), lengths + x);
 }
 
 // ---- votes
@@ -98,10 +98,10 @@ struct Votes {
   float of[2][kSlots][4];
 };
 
-void StoreFour(float* p, Four four) { std::memcpy(p, &four, sizeof(four)); }
+void storeFour(float* p, Four four) { std::memcpy(p, &four, sizeof(four)); }
 
 /// sum + a b of each, rounded once.
-Four MultiplyAdd(Four sum, Four a, float b) {
+Four multiplyAdd(Four sum, Four a, float b) {
   for (int i = 0; i < 4; ++i) {
     sum[i] = std::fma(a[i], b, sum[i]);
   }
@@ -109,26 +109,26 @@ Four MultiplyAdd(Four sum, Four a, float b) {
 }
 
 /// Votes `length` times `weight` for each direction, of one pixel for each half.
-void VoteOfTwo(Votes& votes, uint8_t direction0, const float* weight0, float length0, uint8_t direction1,
+void voteOfTwo(Votes& votes, uint8_t direction0, const float* weight0, float length0, uint8_t direction1,
                const float* weight1, float length1) {
   float* const slot0 = votes.of[0][direction0];
   float* const slot1 = votes.of[1][direction1];
-  const Four sum0 = MultiplyAdd(LoadFour(slot0), LoadFour(weight0), length0);
-  const Four sum1 = MultiplyAdd(LoadFour(slot1), LoadFour(weight1), length1);
-  StoreFour(slot0, sum0);
-  StoreFour(slot1, sum1);
+  const Four sum0 = multiplyAdd(loadFour(slot0), loadFour(weight0), length0);
+  const Four sum1 = multiplyAdd(loadFour(slot1), loadFour(weight1), length1);
+  storeFour(slot0, sum0);
+  storeFour(slot1, sum1);
 }
 
 /// Adds the votes to the four cells' histograms, the upper two and the lower two being neighbours, and clears
 /// them.
-void Cast(Votes& votes, float* top, float* bottom) {
-  const auto add = [](float* to, Four v) { StoreFour(to, LoadFour(to) + v); };
+void cast(Votes& votes, float* top, float* bottom) {
+  const auto add = [](float* to, Four v) { storeFour(to, loadFour(to) + v); };
   for (int d = 0; d < Votes::kSlots; d += 4) {
     Four sum[4];
     for (int i = 0; i < 4; ++i) {
-      sum[i] = LoadFour(votes.of[0][d + i]) + LoadFour(votes.of[1][d + i]);
-      StoreFour(votes.of[0][d + i], Four{});
-      StoreFour(votes.of[1][d + i], Four{});
+      sum[i] = loadFour(votes.of[0][d + i]) + loadFour(votes.of[1][d + i]);
+      storeFour(votes.of[0][d + i], Four{});
+      storeFour(votes.of[1][d + i], Four{});
     }
     const Four left02 = __builtin_shufflevector(sum[0], sum[2], 0, 4, 1, 5);
     const Four left13 = __builtin_shufflevector(sum[1], sum[3], 0, 4, 1, 5);
@@ -142,7 +142,7 @@ void Cast(Votes& votes, float* top, float* bottom) {
 }
 
 /// For every place in a square between the centres of four cells, how its pixel's vote is shared among them.
-void Share(int cell, std::vector<float>& weights) {
+void share(int cell, std::vector<float>& weights) {
   // How far pixel i behind the centre of one cell is on its way to the next one's.
   const int half = cell / 2;
   const auto way = [cell, half](int i) {
@@ -159,78 +159,78 @@ void Share(int cell, std::vector<float>& weights) {
 
 }  // namespace
 
-void FindGradients(const uint8_t* above, const uint8_t* row, const uint8_t* below, int first, int last,
+void findGradients(const uint8_t* above, const uint8_t* row, const uint8_t* below, int first, int last,
                    uint8_t* directions, float* lengths) {
   const auto tail = last - first >= kLanes ? simd::Tail::kOverlap : simd::Tail::kSteps;
   simd::walk<kLanes, 1, 1>(
       last, tail,
-      [=](ptrdiff_t x, simd::Blocks<1>) { FindGradients16(above, row, below, x, directions, lengths); },
-      [=](ptrdiff_t x) { FindGradient(above, row, below, x, directions + x, lengths + x); }, first);
+      [=](ptrdiff_t x, simd::Blocks<1>) { findGradients16(above, row, below, x, directions, lengths); },
+      [=](ptrdiff_t x) { findGradient(above, row, below, x, directions + x, lengths + x); }, first);
 }
 
-void FeatureMap::Vote(const GrayImage& picture, int cell, int first, int rows) {
+void FeatureMap::vote(const GrayImage& picture, int cell, int first, int rows) {
   // The gradients at the picture's border are not known.
-  const int cell_rows = CellsOf(static_cast<int>(picture.nr()), cell) + 2;
-  const int last_x = std::min(columns_ * cell, static_cast<int>(picture.nc())) - 1;
-  const int last_y = std::min(cell_rows * cell, static_cast<int>(picture.nr())) - 1;
+  const int cellRows = cellsOf(static_cast<int>(picture.nr()), cell) + 2;
+  const int lastX = std::min(columns_ * cell, static_cast<int>(picture.nc())) - 1;
+  const int lastY = std::min(cellRows * cell, static_cast<int>(picture.nr())) - 1;
   const auto pitch = static_cast<size_t>(picture.nc());
   directions_.resize(static_cast<size_t>(cell) * pitch);
   lengths_.resize(static_cast<size_t>(cell) * pitch);
-  Share(cell, weights_);
+  share(cell, weights_);
   votes_.assign(static_cast<size_t>(rows + 2) * static_cast<size_t>(columns_ + 2) * kSlots, 0);
   static_assert(kSlots == Votes::kSlots);
   Votes votes = {};
 
   // Squares between the centres of cells, by the cell at their top left.
   for (int row = first - 1; row < first + rows; ++row) {
-    const int square_top = cell / 2 + row * cell;
-    const int top = std::max(square_top, 1);
-    const int bottom = std::min(square_top + cell, last_y);
+    const int squareTop = cell / 2 + row * cell;
+    const int top = std::max(squareTop, 1);
+    const int bottom = std::min(squareTop + cell, lastY);
     for (int y = top; y < bottom; ++y) {
-      const size_t line = static_cast<size_t>(y - square_top) * pitch;
+      const size_t line = static_cast<size_t>(y - squareTop) * pitch;
       const uint8_t* const pixels = &picture[y][0];
-      FindGradients(pixels - pitch, pixels, pixels + pitch, 1, last_x, &directions_[line], &lengths_[line]);
+      findGradients(pixels - pitch, pixels, pixels + pitch, 1, lastX, &directions_[line], &lengths_[line]);
     }
     for (int column = -1; column < columns_; ++column) {
-      const int square_left = cell / 2 + column * cell;
-      const int left = std::max(square_left, 1);
-      const int right = std::min(square_left + cell, last_x);
+      const int squareLeft = cell / 2 + column * cell;
+      const int left = std::max(squareLeft, 1);
+      const int right = std::min(squareLeft + cell, lastX);
       if (left >= right) {
         continue;
       }
       for (int y = top; y < bottom; y += 2) {
-        const size_t line = static_cast<size_t>(y - square_top);
+        const size_t line = static_cast<size_t>(y - squareTop);
         const float* const weights = &weights_[line * static_cast<size_t>(cell) * 4];
         const uint8_t* const directions = &directions_[line * pitch];
         const float* const lengths = &lengths_[line * pitch];
         if (y + 1 < bottom) {
-          const float* const next_weights = weights + static_cast<ptrdiff_t>(cell) * 4;
+          const float* const nextWeights = weights + static_cast<ptrdiff_t>(cell) * 4;
           for (int x = left; x < right; ++x) {
-            const ptrdiff_t place = static_cast<ptrdiff_t>(x - square_left) * 4;
-            VoteOfTwo(votes, directions[x], weights + place, lengths[x],
-                      directions[x + static_cast<ptrdiff_t>(pitch)], next_weights + place,
+            const ptrdiff_t place = static_cast<ptrdiff_t>(x - squareLeft) * 4;
+            voteOfTwo(votes, directions[x], weights + place, lengths[x],
+                      directions[x + static_cast<ptrdiff_t>(pitch)], nextWeights + place,
                       lengths[x + static_cast<ptrdiff_t>(pitch)]);
           }
         } else {
           for (int x = left; x < right; ++x) {
-            const Four weight = LoadFour(weights + static_cast<ptrdiff_t>(x - square_left) * 4);
+            const Four weight = loadFour(weights + static_cast<ptrdiff_t>(x - squareLeft) * 4);
             float* const slot = votes.of[0][directions[x]];
-            StoreFour(slot, MultiplyAdd(LoadFour(slot), weight, lengths[x]));
+            storeFour(slot, multiplyAdd(loadFour(slot), weight, lengths[x]));
           }
         }
       }
-      Cast(votes, Histogram(row - first + 1, column + 1), Histogram(row - first + 2, column + 1));
+      cast(votes, histogram(row - first + 1, column + 1), histogram(row - first + 2, column + 1));
     }
   }
 }
 
-void FeatureMap::Normalise(int rows) {
+void FeatureMap::normalise(int rows) {
   // A cell's energy is that of its votes without their sign.
   constexpr int kAxes = kDirections / 2;
   energies_.resize(static_cast<size_t>(rows) * static_cast<size_t>(columns_));
   for (int r = 0; r < rows; ++r) {
     for (int c = 0; c < columns_; ++c) {
-      const float* const votes = Histogram(r + 1, c + 1);
+      const float* const votes = histogram(r + 1, c + 1);
       float energy = 0;
       for (int d = 0; d < kAxes; ++d) {
         const float both = votes[d] + votes[d + kAxes];
@@ -257,7 +257,7 @@ void FeatureMap::Normalise(int rows) {
   }
 }
 
-void FeatureMap::Describe(int first_row, int rows, int left) {
+void FeatureMap::describe(int firstRow, int rows, int left) {
   using simd::Floats;
   constexpr int kCells = sizeof(Floats) / sizeof(float);
   constexpr int kAxes = kDirections / 2;
@@ -284,7 +284,7 @@ void FeatureMap::Describe(int first_row, int rows, int left) {
         limits[i] = simd::load(&limits_[blocks[i]]);
         factors[i] = simd::load(&factors_[blocks[i]]);
       }
-      const auto* const rows_of_four = reinterpret_cast<const float(*)[4]>(Histogram(r + 2, c + 2));
+      const auto* const rowsOfFour = reinterpret_cast<const float(*)[4]>(histogram(r + 2, c + 2));
       float* const out = &described_[static_cast<size_t>(c)];
 
       // Every fourth direction's shares are summed up apart.
@@ -292,7 +292,7 @@ void FeatureMap::Describe(int first_row, int rows, int left) {
       Floats shares[4][4] = {};
       for (int d = 0; d < kSlots; d += 4) {
         Floats four[4];
-        simd::lookUpRows(rows_of_four + d / 4, histograms, four);
+        simd::lookUpRows(rowsOfFour + d / 4, histograms, four);
         for (int k = 0; k < 4; ++k) {
           votes[d + k] = four[k];
           Floats sum = {};
@@ -321,7 +321,7 @@ void FeatureMap::Describe(int first_row, int rows, int left) {
 
     const size_t plane = static_cast<size_t>(rows_) * static_cast<size_t>(stride_);
     const size_t begin =
-        static_cast<size_t>(first_row + r) * static_cast<size_t>(stride_) + static_cast<size_t>(left);
+        static_cast<size_t>(firstRow + r) * static_cast<size_t>(stride_) + static_cast<size_t>(left);
     for (int f = 0; f < kFeatures; ++f) {
       std::copy_n(&described_[static_cast<size_t>(f * pitch)], cells,
                   &features_[static_cast<size_t>(f) * plane + begin]);
@@ -329,24 +329,24 @@ void FeatureMap::Describe(int first_row, int rows, int left) {
   }
 }
 
-void FeatureMap::Compute(const GrayImage& picture, int cell, int first, int rows, int left, int right) {
-  const int cells_down = CellsOf(static_cast<int>(picture.nr()), cell);
-  const int cells_across = std::max(CellsOf(static_cast<int>(picture.nc()), cell), 0);
-  columns_ = cells_across + 2;
+void FeatureMap::compute(const GrayImage& picture, int cell, int first, int rows, int left, int right) {
+  const int cellsDown = cellsOf(static_cast<int>(picture.nr()), cell);
+  const int cellsAcross = std::max(cellsOf(static_cast<int>(picture.nc()), cell), 0);
+  columns_ = cellsAcross + 2;
   rows_ = rows;
-  stride_ = left + cells_across + right;
+  stride_ = left + cellsAcross + right;
   features_.assign(static_cast<size_t>(kFeatures) * static_cast<size_t>(rows_) * static_cast<size_t>(stride_),
                    0);
   const int begin = std::max(first, 0);
-  const int end = std::min(first + rows, cells_down);
-  if (begin >= end || cells_across == 0) {
+  const int end = std::min(first + rows, cellsDown);
+  if (begin >= end || cellsAcross == 0) {
     return;
   }
   // A cell's features depend on the cells around it.
   const int neighbours = 2;
-  Vote(picture, cell, begin, end - begin + neighbours);
-  Normalise(end - begin + neighbours);
-  Describe(begin - first, end - begin, left);
+  vote(picture, cell, begin, end - begin + neighbours);
+  normalise(end - begin + neighbours);
+  describe(begin - first, end - begin, left);
 }
 
 }  // namespace kyengine

@@ -31,7 +31,7 @@ constexpr int kLargestCell = 64;
 /// `below` minus `above`, so that `first` is at least 1 and the rows have a pixel `last`. Directions are
 /// numbered in steps of 20 degrees from 0, to the right, over 4.5, downwards; what lies in the middle of two
 /// goes to the one nearer to 0 or 9. Of no gradient the length is 0 and the direction any.
-void FindGradients(const uint8_t* above, const uint8_t* row, const uint8_t* below, int first, int last,
+void findGradients(const uint8_t* above, const uint8_t* row, const uint8_t* below, int first, int last,
                    uint8_t* directions, float* lengths);
 
 /// The features of some rows of cells of a picture, one plane for each, with a margin of zeros around. Its
@@ -40,17 +40,17 @@ class FeatureMap {
  public:
   /// Cells in the result for a picture of `pixels` in that direction: those that have neighbours on all
   /// sides. Not positive when there are none.
-  static int CellsOf(int pixels, int cell) {
+  static int cellsOf(int pixels, int cell) {
     // NOLINTNEXTLINE(bugprone-incorrect-roundings): as dlib counts them
     return static_cast<int>(static_cast<float>(pixels) / static_cast<float>(cell) + 0.5F) - 2;
   }
 
   /// Computes the rows of cells from `first` to `first + rows - 1` of the picture. Rows outside of it are
   /// zero, as are `left` columns before and at least `right` columns behind its cells.
-  void Compute(const GrayImage& picture, int cell, int first, int rows, int left, int right);
+  void compute(const GrayImage& picture, int cell, int first, int rows, int left, int right);
 
   /// A row of a feature's plane, from the margin on.
-  const float* Row(int feature, int row) const {
+  const float* row(int feature, int row) const {
     return &features_[(static_cast<size_t>(feature) * static_cast<size_t>(rows_) + static_cast<size_t>(row)) *
                       static_cast<size_t>(stride_)];
   }
@@ -62,10 +62,10 @@ class FeatureMap {
   /// The numbers of a cell's histogram, filled up to whole vectors.
   static constexpr int kSlots = 20;
 
-  void Vote(const GrayImage& picture, int cell, int first, int rows);
-  void Normalise(int rows);
-  void Describe(int first_row, int rows, int left);
-  float* Histogram(int row, int column) {
+  void vote(const GrayImage& picture, int cell, int first, int rows);
+  void normalise(int rows);
+  void describe(int firstRow, int rows, int left);
+  float* histogram(int row, int column) {
     return &votes_[(static_cast<size_t>(row) * static_cast<size_t>(columns_ + 2) +
                     static_cast<size_t>(column)) *
                    kSlots];

@@ -11,7 +11,7 @@ namespace kyengine {
 
 /// Runs `work` and turns how it ends into a result code: no exception passes.
 template <typename Work>
-int Guarded(Work work) noexcept {
+int guarded(Work work) noexcept {
   try {
     work();
     return KY_SUCCESS;

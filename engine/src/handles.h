@@ -16,7 +16,7 @@ namespace kyengine {
 
 /// A value that no handle of any kind has had before: a count, so that the handle of what has been destroyed
 /// never comes to name something newer. Its 64 bits do not run out.
-inline void* NewHandle() noexcept {
+inline void* newHandle() noexcept {
   static_assert(sizeof(uintptr_t) == 8);
   static std::atomic<uintptr_t> last = 0;
   return reinterpret_cast<void*>(++last);  // NOLINT(performance-no-int-to-ptr): callers hold pointers
@@ -28,9 +28,9 @@ template <typename T>
 class Handles {
  public:
   /// Takes an object in and returns its handle, which is never null.
-  static void* Add(std::shared_ptr<T> object) {
-    void* const handle = NewHandle();
-    Table& table = Get();
+  static void* add(std::shared_ptr<T> object) {
+    void* const handle = newHandle();
+    Table& table = get();
     const std::lock_guard lock(table.mutex);
     table.objects.emplace(handle, std::move(object));
     return handle;
@@ -38,27 +38,27 @@ class Handles {
 
   /// Makes an object and stores its handle in `*handle`; null there and a result code on failure.
   template <typename... Arguments>
-  static int Create(void** handle, const Arguments&... arguments) noexcept {
-    return Guarded([&] {
-      Require(handle != nullptr, KY_ERROR_NULL_POINTER);
+  static int create(void** handle, const Arguments&... arguments) noexcept {
+    return guarded([&] {
+      require(handle != nullptr, KY_ERROR_NULL_POINTER);
       *handle = nullptr;
-      *handle = Add(std::make_shared<T>(arguments...));
+      *handle = add(std::make_shared<T>(arguments...));
     });
   }
 
   /// Throws Failure{code} when `handle` names no object.
-  static std::shared_ptr<T> Find(void* handle, ky_result_t code = KY_ERROR_HANDLE) {
-    Table& table = Get();
+  static std::shared_ptr<T> find(void* handle, ky_result_t code = KY_ERROR_HANDLE) {
+    Table& table = get();
     const std::lock_guard lock(table.mutex);
     const auto found = table.objects.find(handle);
-    Require(found != table.objects.end(), code);
+    require(found != table.objects.end(), code);
     return found->second;
   }
 
   /// Forgets the object that `handle` names, if any.
-  static void Destroy(void* handle) noexcept {
-    Guarded([&] {
-      Table& table = Get();
+  static void destroy(void* handle) noexcept {
+    guarded([&] {
+      Table& table = get();
       std::shared_ptr<T> last;  // outlives the lock, as taking an object down takes time
       const std::lock_guard lock(table.mutex);
       if (const auto found = table.objects.find(handle); found != table.objects.end()) {
@@ -75,7 +75,7 @@ class Handles {
   };
 
   /// The one table of this type. It is never destroyed: threads may call until the process is gone.
-  static Table& Get() {
+  static Table& get() {
     static auto& table = *new Table;
     return table;
   }

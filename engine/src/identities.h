@@ -15,7 +15,7 @@ class Identities {
 
   /// A number that `taken(number)` is false for; there must be one.
   template <typename Taken>
-  int32_t Next(const Taken& taken) {
+  int32_t next(const Taken& taken) {
     do {
       last_ = last_ == std::numeric_limits<int32_t>::max() ? 1 : last_ + 1;
     } while (taken(last_));

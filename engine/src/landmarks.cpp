@@ -15,10 +15,10 @@
 namespace kyengine {
 namespace {
 
-double Degrees(double radians) { return radians * 180 / dlib::pi; }
+double degrees(double radians) { return radians * 180 / dlib::pi; }
 
 /// Mean of the `count` points from `first` on.
-dlib::dpoint Centre(const std::vector<dlib::dpoint>& points, size_t first, size_t count) {
+dlib::dpoint centre(const std::vector<dlib::dpoint>& points, size_t first, size_t count) {
   dlib::dpoint sum(0, 0);
   for (size_t i = first; i < first + count; ++i) {
     sum += points[i];
@@ -45,24 +45,24 @@ constexpr std::array<HeadPoint, 5> kHead = {{{30, 0, 0, 0},
 
 }  // namespace
 
-bool FindEyes(const std::vector<dlib::dpoint>& points, Eyes* eyes) {
+bool findEyes(const std::vector<dlib::dpoint>& points, Eyes* eyes) {
   if (points.size() == 68) {
-    *eyes = {Centre(points, 36, 6), Centre(points, 42, 6)};
+    *eyes = {centre(points, 36, 6), centre(points, 42, 6)};
   } else if (points.size() == 5) {
     // The corners of the eye on the viewer's right come first.
-    *eyes = {Centre(points, 2, 2), Centre(points, 0, 2)};
+    *eyes = {centre(points, 2, 2), centre(points, 0, 2)};
   } else {
     return false;
   }
   return dlib::length(eyes->right - eyes->left) > 0;
 }
 
-double RollOf(const Eyes& eyes) {
+double rollOf(const Eyes& eyes) {
   const dlib::dpoint across = eyes.right - eyes.left;
-  return Degrees(std::atan2(across.y(), across.x()));
+  return degrees(std::atan2(across.y(), across.x()));
 }
 
-bool EstimatePose(const std::vector<dlib::dpoint>& points, Pose* pose) {
+bool estimatePose(const std::vector<dlib::dpoint>& points, Pose* pose) {
   if (points.size() != 68) {
     return false;
   }
@@ -78,14 +78,14 @@ bool EstimatePose(const std::vector<dlib::dpoint>& points, Pose* pose) {
     seen(row, 0) = p.x();
     seen(row, 1) = p.y();
   }
-  const auto about_mean = [](auto m) {
+  const auto aboutMean = [](auto m) {
     for (long c = 0; c < m.nc(); ++c) {
       dlib::set_colm(m, c) = dlib::colm(m, c) - dlib::mean(dlib::colm(m, c));
     }
     return m;
   };
-  head = about_mean(head);
-  seen = about_mean(seen);
+  head = aboutMean(head);
+  seen = aboutMean(seen);
   const dlib::matrix<double, 3, 2> map = dlib::inv(dlib::trans(head) * head) * dlib::trans(head) * seen;
 
   // Its columns are the first two rows of the rotation, scaled and not quite at right angles.
@@ -99,16 +99,16 @@ bool EstimatePose(const std::vector<dlib::dpoint>& points, Pose* pose) {
   const dlib::vector<double, 3> towards = right.cross(down);
 
   // Where the head's axis towards the viewer points to, seen from the viewer: (right.z, down.z, towards.z).
-  *pose = {Degrees(std::atan2(right.z(), towards.z())), Degrees(std::asin(std::clamp(down.z(), -1.0, 1.0)))};
+  *pose = {degrees(std::atan2(right.z(), towards.z())), degrees(std::asin(std::clamp(down.z(), -1.0, 1.0)))};
   return true;
 }
 
 LandmarkModel::LandmarkModel(std::istream& in) {
-  CheckLandmarks(in);
+  checkLandmarks(in);
   deserialize(predictor_, in);
 }
 
-std::vector<dlib::dpoint> LandmarkModel::Locate(const GrayImage& upright, const dlib::drectangle& box) const {
+std::vector<dlib::dpoint> LandmarkModel::locate(const GrayImage& upright, const dlib::drectangle& box) const {
   const dlib::full_object_detection shape = predictor_(upright, dlib::rectangle(box));
   std::vector<dlib::dpoint> points(shape.num_parts());
   for (size_t i = 0; i < points.size(); ++i) {
@@ -117,23 +117,23 @@ std::vector<dlib::dpoint> LandmarkModel::Locate(const GrayImage& upright, const 
   return points;
 }
 
-void Describe(const LandmarkModel* model, const GrayImage& upright, const dlib::drectangle& box,
+void describe(const LandmarkModel* model, const GrayImage& upright, const dlib::drectangle& box,
               const Frame& frame, ky_face_t* face) {
   face->points_count = 0;
   face->yaw = face->pitch = face->roll = face->eye_dist = 0;
   if (model == nullptr) {
     return;
   }
-  const std::vector<dlib::dpoint> points = model->Locate(upright, box);
+  const std::vector<dlib::dpoint> points = model->locate(upright, box);
   face->points_count = static_cast<int32_t>(points.size());
   for (size_t i = 0; i < points.size(); ++i) {
-    face->points_array[i] = frame.ToFrame(points[i]);
+    face->points_array[i] = frame.toFrame(points[i]);
   }
-  if (Eyes eyes; FindEyes(points, &eyes)) {
+  if (Eyes eyes; findEyes(points, &eyes)) {
     face->eye_dist = static_cast<float>(dlib::length(eyes.right - eyes.left));
-    face->roll = static_cast<float>(RollOf(eyes));
+    face->roll = static_cast<float>(rollOf(eyes));
   }
-  if (Pose pose; EstimatePose(points, &pose)) {
+  if (Pose pose; estimatePose(points, &pose)) {
     face->yaw = static_cast<float>(pose.yaw);
     face->pitch = static_cast<float>(pose.pitch);
   }

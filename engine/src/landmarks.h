@@ -27,15 +27,15 @@ struct Pose {
 
 /// Finds the eyes among the points of a model of 68 or of 5; false for any other number of points, and when
 /// both eyes are in one place.
-bool FindEyes(const std::vector<dlib::dpoint>& points, Eyes* eyes);
+bool findEyes(const std::vector<dlib::dpoint>& points, Eyes* eyes);
 
 /// The roll of the line through the eyes, in degrees.
-double RollOf(const Eyes& eyes);
+double rollOf(const Eyes& eyes);
 
 /// Estimates the pose from 68 points: the turn that brings a generic head's eye corners, mouth corners, nose
 /// tip and chin closest to where they are seen, at a distance that makes perspective negligible. False for
 /// any other number of points and for points that no head shows.
-bool EstimatePose(const std::vector<dlib::dpoint>& points, Pose* pose);
+bool estimatePose(const std::vector<dlib::dpoint>& points, Pose* pose);
 
 /// A landmark model; immutable and shared by the handles that were created from one file.
 class LandmarkModel {
@@ -45,7 +45,7 @@ class LandmarkModel {
   explicit LandmarkModel(std::istream& in);
 
   /// The points of the face in `box` of the upright picture.
-  std::vector<dlib::dpoint> Locate(const GrayImage& upright, const dlib::drectangle& box) const;
+  std::vector<dlib::dpoint> locate(const GrayImage& upright, const dlib::drectangle& box) const;
 
  private:
   dlib::shape_predictor predictor_;
@@ -53,7 +53,7 @@ class LandmarkModel {
 
 /// Fills the landmark points and the pose of `face`. What the model cannot tell is 0, as is all of it without
 /// a model.
-void Describe(const LandmarkModel* model, const GrayImage& upright, const dlib::drectangle& box,
+void describe(const LandmarkModel* model, const GrayImage& upright, const dlib::drectangle& box,
               const Frame& frame, ky_face_t* face);
 
 }  // namespace kyengine

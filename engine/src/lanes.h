@@ -26,21 +26,21 @@ struct Lanes {
 
 /// A result of each register, by its number.
 template <typename Operation>
-inline Lanes EachOf(Operation operation) {
+inline Lanes eachOf(Operation operation) {
   return [&]<size_t... i>(std::index_sequence<i...>) -> Lanes {
     return {{operation(i)...}};
   }(std::make_index_sequence<std::size(Lanes{}.v)>());
 }
 
-inline Lanes Broadcast(float x) {
-  return EachOf([x](size_t) { return simd::splat<simd::Floats>(x); });
+inline Lanes broadcast(float x) {
+  return eachOf([x](size_t) { return simd::splat<simd::Floats>(x); });
 }
 
-inline Lanes Load(const float* p) {
-  return EachOf([p](size_t i) { return simd::load(p + i * (sizeof(simd::Floats) / sizeof(float))); });
+inline Lanes load(const float* p) {
+  return eachOf([p](size_t i) { return simd::load(p + i * (sizeof(simd::Floats) / sizeof(float))); });
 }
 
-inline void Store(const Lanes& a, float* p) {
+inline void store(const Lanes& a, float* p) {
   for (const simd::Floats& v : a.v) {
     simd::store(p, v);
     p += sizeof(v) / sizeof(float);
@@ -53,12 +53,12 @@ template <typename T>
 using Sixteen __attribute__((vector_size(kLanes * sizeof(T)))) = T;
 typedef float Four __attribute__((vector_size(16)));
 
-inline Sixteen<uint8_t> LoadSixteen(const uint8_t* p) {
+inline Sixteen<uint8_t> loadSixteen(const uint8_t* p) {
   Sixteen<uint8_t> bytes;
   std::memcpy(&bytes, p, sizeof(bytes));
   return bytes;
 }
-inline Four LoadFour(const float* p) {
+inline Four loadFour(const float* p) {
   Four four;
   std::memcpy(&four, p, sizeof(four));
   return four;
@@ -66,20 +66,20 @@ inline Four LoadFour(const float* p) {
 
 /// Whole numbers as floats.
 template <typename T>
-inline Lanes LanesOf(const T& numbers) {
+inline Lanes lanesOf(const T& numbers) {
   return std::bit_cast<Lanes>(
       __builtin_convertvector(__builtin_convertvector(numbers, Sixteen<int32_t>), Sixteen<float>));
 }
 
 /// Sixteen bytes less `zero`.
-inline Lanes LoadBytes(const uint8_t* p, uint8_t zero = 0) {
+inline Lanes loadBytes(const uint8_t* p, uint8_t zero = 0) {
   using Numbers = Sixteen<int16_t>;
-  return LanesOf(__builtin_convertvector(LoadSixteen(p), Numbers) -
+  return lanesOf(__builtin_convertvector(loadSixteen(p), Numbers) -
                  __builtin_convertvector(Sixteen<uint8_t>{} + zero, Numbers));
 }
 
 /// Stores the whole parts of numbers from 0 to 255.
-inline void StoreBytes(const Lanes& a, uint8_t* p) {
+inline void storeBytes(const Lanes& a, uint8_t* p) {
   Sixteen<float> numbers;
   std::memcpy(&numbers, &a, sizeof(numbers));
   const auto whole = __builtin_convertvector(numbers, Sixteen<int32_t>);
@@ -89,61 +89,61 @@ inline void StoreBytes(const Lanes& a, uint8_t* p) {
 }
 
 inline Lanes operator+(const Lanes& a, const Lanes& b) {
-  return EachOf([&](size_t i) { return a.v[i] + b.v[i]; });
+  return eachOf([&](size_t i) { return a.v[i] + b.v[i]; });
 }
 inline Lanes operator-(const Lanes& a, const Lanes& b) {
-  return EachOf([&](size_t i) { return a.v[i] - b.v[i]; });
+  return eachOf([&](size_t i) { return a.v[i] - b.v[i]; });
 }
 inline Lanes operator*(const Lanes& a, const Lanes& b) {
-  return EachOf([&](size_t i) { return a.v[i] * b.v[i]; });
+  return eachOf([&](size_t i) { return a.v[i] * b.v[i]; });
 }
 
 /// Of a NaN in `b` it makes one.
-inline Lanes Max(const Lanes& a, const Lanes& b) {
-  return EachOf([&](size_t i) { return simd::max(b.v[i], a.v[i]); });
+inline Lanes max(const Lanes& a, const Lanes& b) {
+  return eachOf([&](size_t i) { return simd::max(b.v[i], a.v[i]); });
 }
 
 /// Square roots of whole numbers.
-inline Lanes Root(const Lanes& a) {
-  return EachOf([&](size_t i) { return simd::rootOfWhole(a.v[i]); });
+inline Lanes root(const Lanes& a) {
+  return eachOf([&](size_t i) { return simd::rootOfWhole(a.v[i]); });
 }
 
 /// sum + a b, rounded once.
-inline Lanes MultiplyAdd(const Lanes& sum, const Lanes& a, const Lanes& b) {
-  return EachOf([&](size_t i) { return simd::multiplyAdd(sum.v[i], a.v[i], b.v[i]); });
+inline Lanes multiplyAdd(const Lanes& sum, const Lanes& a, const Lanes& b) {
+  return eachOf([&](size_t i) { return simd::multiplyAdd(sum.v[i], a.v[i], b.v[i]); });
 }
 
 /// sum - a b, rounded once.
-inline Lanes MultiplySubtract(const Lanes& sum, const Lanes& a, const Lanes& b) {
-  return EachOf([&](size_t i) { return simd::multiplySubtract(sum.v[i], a.v[i], b.v[i]); });
+inline Lanes multiplySubtract(const Lanes& sum, const Lanes& a, const Lanes& b) {
+  return eachOf([&](size_t i) { return simd::multiplySubtract(sum.v[i], a.v[i], b.v[i]); });
 }
 
 /// sums[i] += weights x[i][at] for the sixteen weights at `weights`.
 template <int count>
-inline void AddProducts(Lanes (&sums)[count], const float* weights, const float* const (&x)[count],
+inline void addProducts(Lanes (&sums)[count], const float* weights, const float* const (&x)[count],
                         ptrdiff_t at) {
-  const Lanes w = Load(weights);
+  const Lanes w = load(weights);
 #pragma GCC unroll 8
   for (int i = 0; i < count; ++i) {
-    sums[i] = MultiplyAdd(sums[i], w, Broadcast(x[i][at]));
+    sums[i] = multiplyAdd(sums[i], w, broadcast(x[i][at]));
   }
 }
 
 /// The same of four consecutive `at`, each with its sixteen weights, one after the other.
 template <int count>
-inline void AddFourProducts(Lanes (&sums)[count], const float* weights, const float* const (&x)[count]) {
+inline void addFourProducts(Lanes (&sums)[count], const float* weights, const float* const (&x)[count]) {
   // On Arm the four numbers of a pixel come with one load and are multiplied from their lanes.
   Four four[count];
 #pragma GCC unroll 8
   for (int i = 0; i < count; ++i) {
-    four[i] = LoadFour(x[i]);
+    four[i] = loadFour(x[i]);
   }
 #pragma GCC unroll 4
   for (int k = 0; k < 4; ++k) {
-    const Lanes w = Load(weights + static_cast<ptrdiff_t>(kLanes) * k);
+    const Lanes w = load(weights + static_cast<ptrdiff_t>(kLanes) * k);
 #pragma GCC unroll 8
     for (int i = 0; i < count; ++i) {
-      sums[i] = MultiplyAdd(sums[i], w, Broadcast(four[i][k]));
+      sums[i] = multiplyAdd(sums[i], w, broadcast(four[i][k]));
     }
   }
 }

@@ -19,11 +19,11 @@ struct Model {
 };
 
 /// Loads what `path` names, as `ky_engine.h` describes; throws Failure.
-Model LoadModel(const char* path);
+Model loadModel(const char* path);
 
 /// Loads a landmark model; throws Failure, with the code `misfit` when the file holds something else. Handles
 /// created from one file share it: such models are large. The model starts at byte `start` of the file.
-std::shared_ptr<const LandmarkModel> LoadLandmarks(const char* path, ky_result_t misfit,
+std::shared_ptr<const LandmarkModel> loadLandmarks(const char* path, ky_result_t misfit,
                                                    std::streamoff start = 0);
 
 struct VerifierModel {
@@ -32,6 +32,6 @@ struct VerifierModel {
 };
 
 /// Loads what `path` names for a verifier, as `ky_engine.h` describes; throws Failure.
-VerifierModel LoadVerifierModel(const char* path);
+VerifierModel loadVerifierModel(const char* path);
 
 }  // namespace kyengine

@@ -45,7 +45,7 @@ constexpr std::array<uint8_t, 256> kBinOf = [] {
 
 /// The crop, smoothed by the binomial filter 1 4 6 4 1 in both directions, in 256ths. Whole numbers keep
 /// areas of one gray exactly even.
-Patch Smoothed(const GrayImage& picture, const FaceCrop& crop) {
+Patch smoothed(const GrayImage& picture, const FaceCrop& crop) {
   GrayImage chip;
   dlib::extract_image_chip(picture,
                            dlib::chip_details(dlib::centered_drect(crop.centre, crop.side, crop.side),
@@ -70,7 +70,7 @@ Patch Smoothed(const GrayImage& picture, const FaceCrop& crop) {
 }
 
 /// Which of the eight neighbours on the circle of radius 2 are at least as bright as the pixel.
-unsigned PatternAt(const Patch& p, int y, int x) {
+unsigned patternAt(const Patch& p, int y, int x) {
   // A diagonal neighbour lies sqrt(2) away in both directions, 106 / 256 of the way from the first pixel to
   // the second; in 65536ths.
   const auto diagonal = [&](int dy, int dx) {
@@ -97,7 +97,7 @@ struct Share {
   int here;
   int next;
 };
-Share ShareOf(int at) {
+Share shareOf(int at) {
   constexpr int kParts = 2 * kCellSide;
   const int offset = 2 * at + 1 - kCellSide + kParts;  // from the centre of cell -1, in halves of a pixel
   return {offset / kParts - 1, kParts - offset % kParts, offset % kParts};
@@ -105,8 +105,8 @@ Share ShareOf(int at) {
 
 }  // namespace
 
-Patterns PatternsOf(const GrayImage& picture, const FaceCrop& crop) {
-  const Patch patch = Smoothed(picture, crop);
+Patterns patternsOf(const GrayImage& picture, const FaceCrop& crop) {
+  const Patch patch = smoothed(picture, crop);
   std::vector<int> histograms(kHistograms, 0);
   const auto add = [&histograms](int row, int column, int bin, int weight) {
     if (row >= 0 && row < kCells && column >= 0 && column < kCells) {
@@ -115,10 +115,10 @@ Patterns PatternsOf(const GrayImage& picture, const FaceCrop& crop) {
     }
   };
   for (int y = 0; y < kSide; ++y) {
-    const Share row = ShareOf(y);
+    const Share row = shareOf(y);
     for (int x = 0; x < kSide; ++x) {
-      const Share column = ShareOf(x);
-      const int bin = kBinOf[PatternAt(patch, y + kBorder, x + kBorder)];
+      const Share column = shareOf(x);
+      const int bin = kBinOf[patternAt(patch, y + kBorder, x + kBorder)];
       add(row.cell, column.cell, bin, row.here * column.here);
       add(row.cell, column.cell + 1, bin, row.here * column.next);
       add(row.cell + 1, column.cell, bin, row.next * column.here);
@@ -140,7 +140,7 @@ Patterns PatternsOf(const GrayImage& picture, const FaceCrop& crop) {
   return patterns;
 }
 
-float Similarity(std::span<const uint8_t, kPatternBytes> a, std::span<const uint8_t, kPatternBytes> b) {
+float similarity(std::span<const uint8_t, kPatternBytes> a, std::span<const uint8_t, kPatternBytes> b) {
   int64_t ab = 0;
   int64_t aa = 0;
   int64_t bb = 0;

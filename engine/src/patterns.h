@@ -23,9 +23,9 @@ constexpr int kPatternBytes = 64 * 59;
 using Patterns = std::array<uint8_t, kPatternBytes>;
 
 /// Describes what the crop shows. What lies outside the picture counts as black.
-Patterns PatternsOf(const GrayImage& picture, const FaceCrop& crop);
+Patterns patternsOf(const GrayImage& picture, const FaceCrop& crop);
 
 /// How alike two faces are, from 0 to 1; symmetric, and 1 for patterns and themselves.
-float Similarity(std::span<const uint8_t, kPatternBytes> a, std::span<const uint8_t, kPatternBytes> b);
+float similarity(std::span<const uint8_t, kPatternBytes> a, std::span<const uint8_t, kPatternBytes> b);
 
 }  // namespace kyengine

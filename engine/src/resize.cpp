@@ -23,7 +23,7 @@ struct Place {
 };
 
 /// Where number `i` of `count` lies among `among`, the first and the last upon the first and the last.
-Place PlaceOf(int i, int count, int among) {
+Place placeOf(int i, int count, int among) {
   if (among == 1) {
     return {0, 0};
   }
@@ -35,18 +35,18 @@ Place PlaceOf(int i, int count, int among) {
 /// Works on blocks of 16 of `count` results, the last of which may be done again, or on single ones where
 /// there are fewer.
 template <typename Block, typename Single>
-void InBlocks(int count, Block block, Single single) {
+void inBlocks(int count, Block block, Single single) {
   simd::walk<kLanes, 1, 1>(
       count, simd::Tail::kOverlap, [&](ptrdiff_t x, simd::Blocks<1>) { block(x); }, single);
 }
 
 /// a + (b - a) way of each of `count` bytes.
-void Blend(const uint8_t* a, const uint8_t* b, float way, int count, float* result) {
-  InBlocks(
+void blend(const uint8_t* a, const uint8_t* b, float way, int count, float* result) {
+  inBlocks(
       count,
       [=](ptrdiff_t x) {
-        const Lanes from = LoadBytes(a + x);
-        Store(MultiplyAdd(from, LoadBytes(b + x) - from, Broadcast(way)), result + x);
+        const Lanes from = loadBytes(a + x);
+        store(multiplyAdd(from, loadBytes(b + x) - from, broadcast(way)), result + x);
       },
       [=](ptrdiff_t x) {
         result[x] = std::fma(static_cast<float>(b[x] - a[x]), way, static_cast<float>(a[x]));
@@ -58,7 +58,7 @@ struct Neighbours {
   Lanes left;
   Lanes right;
 };
-Neighbours LoadNeighbours(const float* row, const int* columns) {
+Neighbours loadNeighbours(const float* row, const int* columns) {
   typedef uint64_t Pairs __attribute__((vector_size(32)));
   typedef float Eight __attribute__((vector_size(32)));
   const auto pair = [=](int i) {
@@ -80,13 +80,13 @@ Neighbours LoadNeighbours(const float* row, const int* columns) {
 }
 
 /// The same between neighbours of a row, rounded to bytes.
-void Between(const float* row, const int* columns, const float* ways, int count, uint8_t* result) {
-  InBlocks(
+void between(const float* row, const int* columns, const float* ways, int count, uint8_t* result) {
+  inBlocks(
       count,
       [=](ptrdiff_t x) {
-        const Neighbours of = LoadNeighbours(row, columns + x);
-        const Lanes value = MultiplyAdd(of.left, of.right - of.left, Load(ways + x));
-        StoreBytes(value + Broadcast(0.5F), result + x);
+        const Neighbours of = loadNeighbours(row, columns + x);
+        const Lanes value = multiplyAdd(of.left, of.right - of.left, load(ways + x));
+        storeBytes(value + broadcast(0.5F), result + x);
       },
       [=](ptrdiff_t x) {
         const float* const left = row + columns[x];
@@ -96,30 +96,30 @@ void Between(const float* row, const int* columns, const float* ways, int count,
 
 }  // namespace
 
-void Resizer::Resize(const GrayImage& from, GrayImage& to) {
-  const int width_in = static_cast<int>(from.nc());
-  const int height_in = static_cast<int>(from.nr());
+void Resizer::resize(const GrayImage& from, GrayImage& to) {
+  const int widthIn = static_cast<int>(from.nc());
+  const int heightIn = static_cast<int>(from.nr());
   const int width = static_cast<int>(to.nc());
   const int height = static_cast<int>(to.nr());
   columns_.resize(static_cast<size_t>(width));
   ways_.resize(static_cast<size_t>(width));
   for (int x = 0; x < width; ++x) {
-    const Place place = PlaceOf(x, width, width_in);
+    const Place place = placeOf(x, width, widthIn);
     columns_[static_cast<size_t>(x)] = place.first;
     ways_[static_cast<size_t>(x)] = place.way;
   }
   // A column more for a picture of one.
-  blended_.assign(static_cast<size_t>(width_in) + 1, 0);
+  blended_.assign(static_cast<size_t>(widthIn) + 1, 0);
   for (int y = 0; y < height; ++y) {
-    const Place place = PlaceOf(y, height, height_in);
+    const Place place = placeOf(y, height, heightIn);
     const uint8_t* const upper = &from[place.first][0];
-    const uint8_t* const lower = height_in > 1 ? upper + width_in : upper;
-    Blend(upper, lower, place.way, width_in, blended_.data());
-    Between(blended_.data(), columns_.data(), ways_.data(), width, &to[y][0]);
+    const uint8_t* const lower = heightIn > 1 ? upper + widthIn : upper;
+    blend(upper, lower, place.way, widthIn, blended_.data());
+    between(blended_.data(), columns_.data(), ways_.data(), width, &to[y][0]);
   }
 }
 
-void Halve(const GrayImage& from, GrayImage& to) {
+void halve(const GrayImage& from, GrayImage& to) {
   const int width = static_cast<int>(from.nc() / 2);
   const int height = static_cast<int>(from.nr() / 2);
   to.set_size(height, width);

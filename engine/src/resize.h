@@ -14,7 +14,7 @@ namespace kyengine {
 class Resizer {
  public:
   /// Fills `to`, of a size of its own, with `from`. Neither is empty, and they are not the same.
-  void Resize(const GrayImage& from, GrayImage& to);
+  void resize(const GrayImage& from, GrayImage& to);
 
  private:
   std::vector<int> columns_;    ///< where the left one of a pixel's two columns is
@@ -24,6 +24,6 @@ class Resizer {
 
 /// Halves a picture in both directions: a pixel is the mean of four, rounded to nearest. An odd last row or
 /// column is left out. `from` has at least two rows and two columns.
-void Halve(const GrayImage& from, GrayImage& to);
+void halve(const GrayImage& from, GrayImage& to);
 
 }  // namespace kyengine

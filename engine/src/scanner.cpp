@@ -22,14 +22,14 @@ constexpr size_t kMostFound = size_t{1} << 20;
 Filters::Filters(const Detector& detector) : overlap(detector.get_overlap_tester()) {
   const auto& scanner = detector.get_scanner();
   cell = static_cast<int>(scanner.get_cell_size());
-  window_width = static_cast<int>(scanner.get_detection_window_width());
-  window_height = static_cast<int>(scanner.get_detection_window_height());
-  taps_across = static_cast<int>(scanner.get_fhog_window_width());
-  taps_down = static_cast<int>(scanner.get_fhog_window_height());
+  windowWidth = static_cast<int>(scanner.get_detection_window_width());
+  windowHeight = static_cast<int>(scanner.get_detection_window_height());
+  tapsAcross = static_cast<int>(scanner.get_fhog_window_width());
+  tapsDown = static_cast<int>(scanner.get_fhog_window_height());
   padding = scanner.get_padding();
-  most_levels = scanner.get_max_pyramid_levels();
-  least_width = scanner.get_min_pyramid_layer_width();
-  least_height = scanner.get_min_pyramid_layer_height();
+  mostLevels = scanner.get_max_pyramid_levels();
+  leastWidth = scanner.get_min_pyramid_layer_width();
+  leastHeight = scanner.get_min_pyramid_layer_height();
 
   struct Part {
     size_t filter;
@@ -51,76 +51,76 @@ Filters::Filters(const Detector& detector) : overlap(detector.get_overlap_tester
   }
 
   for (size_t feature = 0; feature < parts.size(); ++feature) {
-    const std::vector<Part>& of_feature = parts[feature];
-    for (size_t first = 0; first < of_feature.size(); first += kMostTogether) {
+    const std::vector<Part>& ofFeature = parts[feature];
+    for (size_t first = 0; first < ofFeature.size(); first += kMostTogether) {
       Group& group = groups.emplace_back();
       group.feature = static_cast<int>(feature);
-      group.size = std::min(kMostTogether, of_feature.size() - first);
-      for (size_t tap = 0; tap < static_cast<size_t>(taps_across); ++tap) {
+      group.size = std::min(kMostTogether, ofFeature.size() - first);
+      for (size_t tap = 0; tap < static_cast<size_t>(tapsAcross); ++tap) {
         for (size_t i = 0; i < group.size; ++i) {
-          group.rows.push_back(of_feature[first + i].row[tap]);
+          group.rows.push_back(ofFeature[first + i].row[tap]);
         }
       }
       for (size_t i = 0; i < group.size; ++i) {
-        group.filters[i] = of_feature[first + i].filter;
-        group.columns[i] = of_feature[first + i].column;
+        group.filters[i] = ofFeature[first + i].filter;
+        group.columns[i] = ofFeature[first + i].column;
       }
     }
   }
 }
 
-void Scanner::ScanTile(int rows, int column) {
-  const int taps = filters_->taps_down;
-  const int rows_in = rows + taps - 1;
-  const size_t part = static_cast<size_t>(rows_in) * kTileColumns;
+void Scanner::scanTile(int rows, int column) {
+  const int taps = filters_->tapsDown;
+  const int rowsIn = rows + taps - 1;
+  const size_t part = static_cast<size_t>(rowsIn) * kTileColumns;
   const size_t tile = static_cast<size_t>(rows) * kTileColumns;
   rows_.resize(kMostTogether * part);
   sums_.assign(filters_->biases.size() * tile, 0);
   for (const Filters::Group& group : filters_->groups) {
-    ApplyRows(map_.Row(group.feature, 0) + column, map_.stride(), group.rows.data(),
-              static_cast<int>(group.size), filters_->taps_across, rows_in, kTileColumns, rows_.data());
+    applyRows(map_.row(group.feature, 0) + column, map_.stride(), group.rows.data(),
+              static_cast<int>(group.size), filters_->tapsAcross, rowsIn, kTileColumns, rows_.data());
     for (size_t i = 0; i < group.size; ++i) {
-      AddColumn(&rows_[i * part], kTileColumns, group.columns[i].data(), taps, rows,
+      addColumn(&rows_[i * part], kTileColumns, group.columns[i].data(), taps, rows,
                 &sums_[group.filters[i] * tile]);
     }
   }
 }
 
-void Scanner::ScanLevel(const GrayImage& picture, unsigned int level, double least) {
+void Scanner::scanLevel(const GrayImage& picture, unsigned int level, double least) {
   const Filters& f = *filters_;
-  const int cells_down = FeatureMap::CellsOf(static_cast<int>(picture.nr()), f.cell);
-  const int cells_across = FeatureMap::CellsOf(static_cast<int>(picture.nc()), f.cell);
-  if (cells_down < 1 || cells_across < 1) {
+  const int cellsDown = FeatureMap::cellsOf(static_cast<int>(picture.nr()), f.cell);
+  const int cellsAcross = FeatureMap::cellsOf(static_cast<int>(picture.nc()), f.cell);
+  if (cellsDown < 1 || cellsAcross < 1) {
     return;
   }
   const Pyramid pyramid;
   const dlib::default_fhog_feature_extractor features;
   // The filters are centred, on the later of two middle cells where their size is even.
-  const int above = (f.taps_down - 1) / 2;
-  const int before = (f.taps_across - 1) / 2;
-  const int across = (cells_across + kTileColumns - 1) / kTileColumns * kTileColumns;
-  for (int top = 0; top < cells_down; top += kTileRows) {
-    const int rows = std::min(kTileRows, cells_down - top);
-    const int whole_rows = (rows + kRowsTogether - 1) / kRowsTogether * kRowsTogether;
-    map_.Compute(picture, f.cell, top - above, whole_rows + f.taps_down - 1, before,
-                 across - cells_across + f.taps_across - 1 - before);
+  const int above = (f.tapsDown - 1) / 2;
+  const int before = (f.tapsAcross - 1) / 2;
+  const int across = (cellsAcross + kTileColumns - 1) / kTileColumns * kTileColumns;
+  for (int top = 0; top < cellsDown; top += kTileRows) {
+    const int rows = std::min(kTileRows, cellsDown - top);
+    const int wholeRows = (rows + kRowsTogether - 1) / kRowsTogether * kRowsTogether;
+    map_.compute(picture, f.cell, top - above, wholeRows + f.tapsDown - 1, before,
+                 across - cellsAcross + f.tapsAcross - 1 - before);
     for (int left = 0; left < across; left += kTileColumns) {
-      ScanTile(whole_rows, left);
-      const int columns = std::min(kTileColumns, cells_across - left);
+      scanTile(wholeRows, left);
+      const int columns = std::min(kTileColumns, cellsAcross - left);
       for (size_t filter = 0; filter < f.biases.size(); ++filter) {
         for (int y = 0; y < rows; ++y) {
           const float* const scores =
-              &sums_[(filter * static_cast<size_t>(whole_rows) + static_cast<size_t>(y)) * kTileColumns];
+              &sums_[(filter * static_cast<size_t>(wholeRows) + static_cast<size_t>(y)) * kTileColumns];
           for (int x = 0; x < columns; ++x) {
             if (scores[x] < f.biases[filter] + least) {
               continue;
             }
-            const dlib::point centre(left + x + f.taps_across / 2, top + y + f.taps_down / 2);
+            const dlib::point centre(left + x + f.tapsAcross / 2, top + y + f.tapsDown / 2);
             const dlib::rectangle box = features.feats_to_image(
-                dlib::centered_rect(centre, static_cast<unsigned long>(f.taps_across) - 2 * f.padding,
-                                    static_cast<unsigned long>(f.taps_down) - 2 * f.padding),
-                f.cell, f.taps_down, f.taps_across);
-            Require(found_.size() < kMostFound, KY_ERROR_MEMORY);
+                dlib::centered_rect(centre, static_cast<unsigned long>(f.tapsAcross) - 2 * f.padding,
+                                    static_cast<unsigned long>(f.tapsDown) - 2 * f.padding),
+                f.cell, f.tapsDown, f.tapsAcross);
+            require(found_.size() < kMostFound, KY_ERROR_MEMORY);
             dlib::rect_detection& detection = found_.emplace_back();
             detection.detection_confidence = scores[x] - f.biases[filter];
             detection.weight_index = filter;
@@ -132,16 +132,16 @@ void Scanner::ScanLevel(const GrayImage& picture, unsigned int level, double lea
   }
 }
 
-std::vector<dlib::rect_detection> Scanner::Find(GrayImage& picture, double least) {
+std::vector<dlib::rect_detection> Scanner::find(GrayImage& picture, double least) {
   found_.clear();
   const Pyramid pyramid;
   dlib::rectangle size = dlib::get_rect(picture);
   for (unsigned int level = 0;;) {
-    ScanLevel(picture, level, least);
+    scanLevel(picture, level, least);
     size = pyramid.rect_down(dlib::drectangle(size));
     ++level;
-    if (size.width() < filters_->least_width || size.height() < filters_->least_height ||
-        level >= filters_->most_levels) {
+    if (size.width() < filters_->leastWidth || size.height() < filters_->leastHeight ||
+        level >= filters_->mostLevels) {
       break;
     }
     // A level is the one before in 5/6 of its size.
@@ -151,7 +151,7 @@ std::vector<dlib::rect_detection> Scanner::Find(GrayImage& picture, double least
       break;
     }
     next_.set_size(rows, columns);
-    resizer_.Resize(picture, next_);
+    resizer_.resize(picture, next_);
     swap(picture, next_);
   }
 

@@ -33,14 +33,14 @@ struct Filters {
   };
 
   int cell;
-  int window_width;   ///< what is searched for has this size, in pixels,
-  int window_height;  ///< or is larger
-  int taps_across;
-  int taps_down;
+  int windowWidth;   ///< what is searched for has this size, in pixels,
+  int windowHeight;  ///< or is larger
+  int tapsAcross;
+  int tapsDown;
   unsigned long padding;
-  unsigned long most_levels;
-  unsigned long least_width;
-  unsigned long least_height;
+  unsigned long mostLevels;
+  unsigned long leastWidth;
+  unsigned long leastHeight;
   dlib::test_box_overlap overlap;
   std::vector<double> biases;  ///< by filter
   std::vector<Group> groups;
@@ -57,15 +57,15 @@ class Scanner {
 
   /// Finds everything in `picture` whose confidence is at least `least`, the surest first. `picture` is
   /// changed.
-  std::vector<dlib::rect_detection> Find(GrayImage& picture, double least);
+  std::vector<dlib::rect_detection> find(GrayImage& picture, double least);
 
  private:
   /// A picture is scanned in tiles of so many cells; sums and rows of a tile stay in the nearest cache.
   static constexpr int kTileRows = 32;
   static constexpr int kTileColumns = 16;
 
-  void ScanLevel(const GrayImage& picture, unsigned int level, double least);
-  void ScanTile(int rows, int column);
+  void scanLevel(const GrayImage& picture, unsigned int level, double least);
+  void scanTile(int rows, int column);
 
   std::shared_ptr<const Filters> filters_;
   FeatureMap map_;

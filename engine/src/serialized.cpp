@@ -38,81 +38,81 @@ constexpr uint64_t kMostCells = 128;
 class Reader {
  public:
   explicit Reader(std::istream& in) : in_(in), start_(in.tellg()) {
-    Expect(start_ != std::streampos(-1) && in.seekg(0, std::ios::end));
+    expect(start_ != std::streampos(-1) && in.seekg(0, std::ios::end));
     const std::streamoff length = in.tellg() - start_;
-    Expect(length >= 0 && in.seekg(start_));
+    expect(length >= 0 && in.seekg(start_));
     left_ = static_cast<uint64_t>(length);
   }
 
   /// Puts the stream back to where it was.
-  void Rewind() { Expect(static_cast<bool>(in_.seekg(start_))); }
+  void rewind() { expect(static_cast<bool>(in_.seekg(start_))); }
 
-  static void Expect(bool condition) { Require(condition, KY_ERROR_MODEL); }
+  static void expect(bool condition) { require(condition, KY_ERROR_MODEL); }
 
   /// A number with a sign.
-  int64_t Integer() {
-    const uint8_t control = Byte();
-    Expect((control & 0x70) == 0);
-    const uint64_t magnitude = Magnitude(control & 0x0F);
-    Expect(magnitude <= static_cast<uint64_t>(std::numeric_limits<int64_t>::max()));
+  int64_t integer() {
+    const uint8_t control = byte();
+    expect((control & 0x70) == 0);
+    const uint64_t magnitude = magnitudeOf(control & 0x0F);
+    expect(magnitude <= static_cast<uint64_t>(std::numeric_limits<int64_t>::max()));
     const auto value = static_cast<int64_t>(magnitude);
     return (control & 0x80) != 0 ? -value : value;
   }
 
   /// A number without one.
-  uint64_t Natural() {
-    const uint8_t control = Byte();
-    Expect(control <= 8);
-    return Magnitude(control);
+  uint64_t natural() {
+    const uint8_t control = byte();
+    expect(control <= 8);
+    return magnitudeOf(control);
   }
 
   /// A number with a fraction: mantissa and exponent.
-  double Real() {
-    const int64_t mantissa = Integer();
-    const int64_t exponent = Integer();
+  double real() {
+    const int64_t mantissa = integer();
+    const int64_t exponent = integer();
     // Infinities and what is no number have exponents beyond.
-    Expect(exponent >= -2000 && exponent <= 2000);
+    expect(exponent >= -2000 && exponent <= 2000);
     const double value = std::ldexp(static_cast<double>(mantissa), static_cast<int>(exponent));
-    Expect(std::fabs(value) <= kLargestNumber);
+    expect(std::fabs(value) <= kLargestNumber);
     return value;
   }
 
   /// How many of something follow, each at least `smallest` bytes of the file.
-  uint64_t Count(uint64_t smallest) {
-    const uint64_t count = Natural();
-    Expect(count <= left_ / smallest);
+  uint64_t count(uint64_t smallest) {
+    const uint64_t count = natural();
+    expect(count <= left_ / smallest);
     return count;
   }
 
   /// The length of a column of numbers, which follows.
-  uint64_t Column() {
-    int64_t rows = Integer();
-    int64_t columns = Integer();
+  uint64_t column() {
+    int64_t rows = integer();
+    int64_t columns = integer();
     if (rows < 0 || columns < 0) {
       rows = -rows;
       columns = -columns;
     }
-    Expect(rows >= 0 && columns == 1 && static_cast<uint64_t>(rows) <= left_ / kSmallestReal);
+    expect(rows >= 0 && columns == 1 && static_cast<uint64_t>(rows) <= left_ / kSmallestReal);
     for (int64_t i = 0; i < rows; ++i) {
-      Real();
+      real();
     }
     return static_cast<uint64_t>(rows);
   }
 
  private:
-  uint8_t Byte() {
-    Expect(left_ > 0);
+  uint8_t byte() {
+    expect(left_ > 0);
     --left_;
     const int byte = in_.rdbuf()->sbumpc();
-    Expect(byte != std::char_traits<char>::eof());
+    expect(byte != std::char_traits<char>::eof());
     return static_cast<uint8_t>(byte);
   }
 
-  uint64_t Magnitude(int bytes) {
-    Expect(bytes >= 1 && bytes <= 8);
+  uint64_t magnitudeOf(int bytes) {
+    expect(bytes >= 1 && bytes <= 8);
     uint64_t value = 0;
     for (int i = 0; i < bytes; ++i) {
-      value |= uint64_t{Byte()} << (8 * i);
+      value |= uint64_t{byte()} << (8 * i);
     }
     return value;
   }
@@ -122,113 +122,113 @@ class Reader {
   uint64_t left_ = 0;  ///< bytes to the end of the file
 };
 
-void Expect(bool condition) { Reader::Expect(condition); }
+void expect(bool condition) { Reader::expect(condition); }
 
 /// Reads the part of a detector that says how pictures are scanned; how many numbers its filters have.
-uint64_t ReadScanner(Reader& reader) {
-  Expect(reader.Integer() == 1);
+uint64_t readScanner(Reader& reader) {
+  expect(reader.integer() == 1);
   // The features of a picture, which no file has.
-  Expect(reader.Natural() == 0 && reader.Natural() == 0);
-  const uint64_t cell = reader.Natural();
-  const uint64_t padding = reader.Natural();
-  Expect(cell >= kSmallestCell && cell <= kLargestCell && padding <= kMostCells);
+  expect(reader.natural() == 0 && reader.natural() == 0);
+  const uint64_t cell = reader.natural();
+  const uint64_t padding = reader.natural();
+  expect(cell >= kSmallestCell && cell <= kLargestCell && padding <= kMostCells);
   const auto side = [&] {
-    const uint64_t pixels = reader.Natural();
-    Expect(pixels >= cell && pixels <= KY_MAX_FRAME_SIDE && pixels / cell + 2 * padding <= kMostCells);
+    const uint64_t pixels = reader.natural();
+    expect(pixels >= cell && pixels <= KY_MAX_FRAME_SIDE && pixels / cell + 2 * padding <= kMostCells);
   };
   side();
   side();
-  const uint64_t levels = reader.Natural();
-  Expect(levels >= 1 && levels <= kMostPyramidLevels);
+  const uint64_t levels = reader.natural();
+  expect(levels >= 1 && levels <= kMostPyramidLevels);
   for (int i = 0; i < 2; ++i) {
-    const uint64_t smallest_level = reader.Natural();
-    Expect(smallest_level >= 1 && smallest_level <= KY_MAX_FRAME_SIDE);
+    const uint64_t smallestLevel = reader.natural();
+    expect(smallestLevel >= 1 && smallestLevel <= KY_MAX_FRAME_SIDE);
   }
-  reader.Real();
-  const int64_t numbers = reader.Integer();
-  Expect(numbers >= 1);
+  reader.real();
+  const int64_t numbers = reader.integer();
+  expect(numbers >= 1);
   return static_cast<uint64_t>(numbers);
 }
 
-void ReadOverlap(Reader& reader) {
+void readOverlap(Reader& reader) {
   for (int i = 0; i < 2; ++i) {
-    const double share = reader.Real();
-    Expect(share >= 0 && share <= 1);
+    const double share = reader.real();
+    expect(share >= 0 && share <= 1);
   }
 }
 
 /// Reads a tree: decisions, each between two pixels, and for each way through them what to add to the
 /// `numbers` of a shape. Raises `pixels` to the count that its decisions ask for.
-void ReadTree(Reader& reader, uint64_t numbers, uint64_t* pixels) {
-  const uint64_t splits = reader.Count(2 * kSmallestInteger + kSmallestReal);
+void readTree(Reader& reader, uint64_t numbers, uint64_t* pixels) {
+  const uint64_t splits = reader.count(2 * kSmallestInteger + kSmallestReal);
   for (uint64_t i = 0; i < splits; ++i) {
     for (int side = 0; side < 2; ++side) {
-      const uint64_t pixel = reader.Natural();
-      Expect(pixel < std::numeric_limits<uint32_t>::max());
+      const uint64_t pixel = reader.natural();
+      expect(pixel < std::numeric_limits<uint32_t>::max());
       *pixels = std::max(*pixels, pixel + 1);
     }
-    reader.Real();
+    reader.real();
   }
-  const uint64_t leaves = reader.Count(2 * kSmallestInteger + numbers * kSmallestReal);
-  Expect(leaves == splits + 1 && leaves <= kMostLeaves && (leaves & splits) == 0);
+  const uint64_t leaves = reader.count(2 * kSmallestInteger + numbers * kSmallestReal);
+  expect(leaves == splits + 1 && leaves <= kMostLeaves && (leaves & splits) == 0);
   for (uint64_t i = 0; i < leaves; ++i) {
-    Expect(reader.Column() == numbers);
+    expect(reader.column() == numbers);
   }
 }
 
 }  // namespace
 
-void CheckDetector(std::istream& in) {
+void checkDetector(std::istream& in) {
   Reader reader(in);
-  const int64_t version = reader.Integer();
-  Expect(version == 1 || version == 2);
-  const uint64_t numbers = ReadScanner(reader);
-  const auto read_filter = [&] { Expect(reader.Column() == numbers + 1); };
+  const int64_t version = reader.integer();
+  expect(version == 1 || version == 2);
+  const uint64_t numbers = readScanner(reader);
+  const auto readFilter = [&] { expect(reader.column() == numbers + 1); };
   if (version == 1) {
-    read_filter();
-    ReadOverlap(reader);
+    readFilter();
+    readOverlap(reader);
   } else {
-    ReadOverlap(reader);
-    const uint64_t filters = reader.Count(kSmallestReal);
-    Expect(filters >= 1 && filters <= kMostFilters);
+    readOverlap(reader);
+    const uint64_t filters = reader.count(kSmallestReal);
+    expect(filters >= 1 && filters <= kMostFilters);
     for (uint64_t i = 0; i < filters; ++i) {
-      read_filter();
+      readFilter();
     }
   }
-  reader.Rewind();
+  reader.rewind();
 }
 
-void CheckLandmarks(std::istream& in) {
+void checkLandmarks(std::istream& in) {
   Reader reader(in);
-  Expect(reader.Integer() == 1);
-  const uint64_t numbers = reader.Column();
-  Expect(numbers >= 2 && numbers <= 2 * uint64_t{KY_FACE_MAX_POINTS} && numbers % 2 == 0);
+  expect(reader.integer() == 1);
+  const uint64_t numbers = reader.column();
+  expect(numbers >= 2 && numbers <= 2 * uint64_t{KY_FACE_MAX_POINTS} && numbers % 2 == 0);
 
   // How many pixels the trees of each cascade ask for, and then its pixels: each so far from one of the
   // points.
-  std::vector<uint64_t> pixels(reader.Count(kSmallestInteger));
+  std::vector<uint64_t> pixels(reader.count(kSmallestInteger));
   for (uint64_t& asked : pixels) {
-    for (uint64_t trees = reader.Count(2 * kSmallestInteger); trees > 0; --trees) {
-      ReadTree(reader, numbers, &asked);
+    for (uint64_t trees = reader.count(2 * kSmallestInteger); trees > 0; --trees) {
+      readTree(reader, numbers, &asked);
     }
   }
-  Expect(reader.Count(kSmallestInteger) == pixels.size());
+  expect(reader.count(kSmallestInteger) == pixels.size());
   for (uint64_t& asked : pixels) {
-    const uint64_t anchors = reader.Count(kSmallestInteger);
-    Expect(anchors >= asked);
+    const uint64_t anchors = reader.count(kSmallestInteger);
+    expect(anchors >= asked);
     for (uint64_t i = 0; i < anchors; ++i) {
-      Expect(reader.Natural() < numbers / 2);
+      expect(reader.natural() < numbers / 2);
     }
     asked = anchors;
   }
-  Expect(reader.Count(kSmallestInteger) == pixels.size());
+  expect(reader.count(kSmallestInteger) == pixels.size());
   for (const uint64_t anchors : pixels) {
-    Expect(reader.Count(2 * kSmallestReal) == anchors);
+    expect(reader.count(2 * kSmallestReal) == anchors);
     for (uint64_t i = 0; i < 2 * anchors; ++i) {
-      reader.Real();
+      reader.real();
     }
   }
-  reader.Rewind();
+  reader.rewind();
 }
 
 }  // namespace kyengine

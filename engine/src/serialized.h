@@ -11,10 +11,10 @@ namespace kyengine {
 
 /// Checks that a `dlib::frontal_face_detector` comes next. Throws Failure when none does; the stream is where
 /// it was.
-void CheckDetector(std::istream& in);
+void checkDetector(std::istream& in);
 
 /// Checks that a `dlib::shape_predictor` comes next, of 1 to KY_FACE_MAX_POINTS points. Throws Failure when
 /// none does; the stream is where it was.
-void CheckLandmarks(std::istream& in);
+void checkLandmarks(std::istream& in);
 
 }  // namespace kyengine

@@ -26,15 +26,15 @@ constexpr float kConfirmingScore = 0.4F;
 /// Boxes that shrink below this, in pixels, hold nothing to follow.
 constexpr double kSmallestBox = 16;
 
-double Overlap(const dlib::drectangle& a, const dlib::drectangle& b) {
+double overlapOf(const dlib::drectangle& a, const dlib::drectangle& b) {
   const double both = a.intersect(b).area();
   return both / (a.area() + b.area() - both);
 }
 
 /// A peak-to-side-lobe ratio in percent. Not a number, as in a picture without any contrast, is no agreement.
-double Alignment(double peak_to_side_lobe) {
+double alignmentOf(double peakToSideLobe) {
   constexpr double kFullRatio = 20;
-  return std::isnan(peak_to_side_lobe) ? -1 : std::clamp(100 * peak_to_side_lobe / kFullRatio, 0.0, 100.0);
+  return std::isnan(peakToSideLobe) ? -1 : std::clamp(100 * peakToSideLobe / kFullRatio, 0.0, 100.0);
 }
 
 /// A face with an identity.
@@ -48,71 +48,71 @@ struct TrackedFace {
 
 class Tracker {
  public:
-  Tracker(const char* model_path, int config) : finder_(model_path, config, Use::kVideo) {}
+  Tracker(const char* modelPath, int config) : finder_(modelPath, config, Use::kVideo) {}
 
-  std::vector<ky_face_t> Track(const Frame& frame) {
+  std::vector<ky_face_t> track(const Frame& frame) {
     const std::lock_guard lock(mutex_);
-    Resize(frame.upright_width(), frame.upright_height());
-    const bool due = frames_to_detection_ == 0;
-    frames_to_detection_ = due ? detect_interval_ - 1 : frames_to_detection_ - 1;
-    const bool detects = due && finder_.HasRoom(width_, height_);
+    resize(frame.uprightWidth(), frame.uprightHeight());
+    const bool due = framesToDetection_ == 0;
+    framesToDetection_ = due ? detectInterval_ - 1 : framesToDetection_ - 1;
+    const bool detects = due && finder_.hasRoom(width_, height_);
     if (!detects && std::none_of(faces_.begin(), faces_.end(), [](const TrackedFace& f) { return f.seen; })) {
       return {};
     }
 
-    frame.ToUprightGray(gray_);
+    frame.toUprightGray(gray_);
     for (TrackedFace& face : faces_) {
       if (face.seen) {
-        Follow(face);
+        follow(face);
       }
     }
     if (detects) {
-      Detect();
+      detect();
     }
-    return Records(frame);
+    return records(frame);
   }
 
-  void Reset() {
+  void reset() {
     const std::lock_guard lock(mutex_);
-    Clear();
+    clear();
   }
 
   /// The setters throw Failure when a value is out of its range, and return the one before.
-  int SetFaceLimit(int limit) {
-    Require(limit >= KY_MIN_FACE_LIMIT && limit <= KY_MAX_FACE_LIMIT, KY_ERROR_RANGE);
+  int setFaceLimit(int limit) {
+    require(limit >= KY_MIN_FACE_LIMIT && limit <= KY_MAX_FACE_LIMIT, KY_ERROR_RANGE);
     const std::lock_guard lock(mutex_);
     while (faces_.size() > static_cast<size_t>(limit)) {
-      faces_.erase(Weakest());
+      faces_.erase(findWeakest());
     }
-    return std::exchange(face_limit_, limit);
+    return std::exchange(faceLimit_, limit);
   }
 
-  int SetDetectInterval(int interval) {
-    Require(interval >= KY_MIN_DETECT_INTERVAL && interval <= KY_MAX_DETECT_INTERVAL, KY_ERROR_RANGE);
+  int setDetectInterval(int interval) {
+    require(interval >= KY_MIN_DETECT_INTERVAL && interval <= KY_MAX_DETECT_INTERVAL, KY_ERROR_RANGE);
     const std::lock_guard lock(mutex_);
-    frames_to_detection_ = std::min(frames_to_detection_, interval - 1);
-    return std::exchange(detect_interval_, interval);
+    framesToDetection_ = std::min(framesToDetection_, interval - 1);
+    return std::exchange(detectInterval_, interval);
   }
 
-  int SetAlignmentThreshold(int threshold) {
-    Require(threshold >= KY_MIN_ALIGNMENT_THRESHOLD && threshold <= KY_MAX_ALIGNMENT_THRESHOLD,
+  int setAlignmentThreshold(int threshold) {
+    require(threshold >= KY_MIN_ALIGNMENT_THRESHOLD && threshold <= KY_MAX_ALIGNMENT_THRESHOLD,
             KY_ERROR_RANGE);
     const std::lock_guard lock(mutex_);
-    return std::exchange(alignment_threshold_, threshold);
+    return std::exchange(alignmentThreshold_, threshold);
   }
 
  private:
   using Faces = std::vector<TrackedFace>;
 
-  void Clear() {
+  void clear() {
     faces_.clear();
-    frames_to_detection_ = 0;
+    framesToDetection_ = 0;
   }
 
   /// Where faces were means nothing in frames of another size.
-  void Resize(int width, int height) {
+  void resize(int width, int height) {
     if (width != width_ || height != height_) {
-      Clear();
+      clear();
       width_ = width;
       height_ = height;
     }
@@ -120,7 +120,7 @@ class Tracker {
 
   /// The face to evict first: one that is out of sight before one that is not, then the one of the lowest
   /// score.
-  Faces::iterator Weakest() {
+  Faces::iterator findWeakest() {
     return std::min_element(faces_.begin(), faces_.end(), [](const TrackedFace& a, const TrackedFace& b) {
       return std::tuple(a.seen, a.face.score) < std::tuple(b.seen, b.face.score);
     });
@@ -128,10 +128,10 @@ class Tracker {
 
   /// Moves a face to where it is in this picture. A face that is lost stays where it was seen last: what the
   /// follower learns elsewhere would only lead it astray.
-  void Follow(TrackedFace& face) {
-    const double alignment = Alignment(face.follower.update(gray_));
+  void follow(TrackedFace& face) {
+    const double alignment = alignmentOf(face.follower.update(gray_));
     const dlib::drectangle box = face.follower.get_position();
-    face.seen = alignment >= alignment_threshold_ && box.width() >= kSmallestBox &&
+    face.seen = alignment >= alignmentThreshold_ && box.width() >= kSmallestBox &&
                 box.height() >= kSmallestBox &&
                 dlib::drectangle(dlib::get_rect(gray_)).contains(dlib::center(box));
     if (face.seen) {
@@ -140,7 +140,7 @@ class Tracker {
   }
 
   /// Sets a face to where it was detected.
-  void Confirm(TrackedFace& face, const FoundFace& found) {
+  void confirm(TrackedFace& face, const FoundFace& found) {
     face.follower.start_track(gray_, found.box);
     face.face = found;
     face.seen = true;
@@ -148,8 +148,8 @@ class Tracker {
   }
 
   /// Detects faces, known and new.
-  void Detect() {
-    std::vector<FoundFace> found = finder_.Find(gray_, kConfirmingScore);
+  void detect() {
+    std::vector<FoundFace> found = finder_.find(gray_, kConfirmingScore);
 
     // Each known face takes the detection that overlaps with it most, the closest pair first.
     std::vector<TrackedFace*> unmatched;
@@ -162,7 +162,7 @@ class Tracker {
       auto shown = found.end();
       for (auto face = unmatched.begin(); face != unmatched.end(); ++face) {
         for (auto detection = found.begin(); detection != found.end(); ++detection) {
-          if (const double overlap = Overlap((*face)->face.box, detection->box); overlap >= most) {
+          if (const double overlap = overlapOf((*face)->face.box, detection->box); overlap >= most) {
             most = overlap;
             known = face;
             shown = detection;
@@ -172,7 +172,7 @@ class Tracker {
       if (known == unmatched.end()) {
         break;
       }
-      Confirm(**known, *shown);
+      confirm(**known, *shown);
       unmatched.erase(known);
       found.erase(shown);
     }
@@ -182,37 +182,37 @@ class Tracker {
     }
     std::erase_if(faces_, [](const TrackedFace& face) { return face.misses > KY_FORGIVEN_MISSES; });
     for (const FoundFace& face : found) {
-      Spawn(face);
+      spawn(face);
     }
   }
 
   /// Spawns a track for a new face if it is certain enough and there is room, made at the cost of one out of
   /// sight.
-  void Spawn(const FoundFace& found) {
+  void spawn(const FoundFace& found) {
     if (found.score < KY_DEFAULT_THRESHOLD) {
       return;
     }
-    if (faces_.size() >= static_cast<size_t>(face_limit_)) {
-      const auto weakest = Weakest();
+    if (faces_.size() >= static_cast<size_t>(faceLimit_)) {
+      const auto weakest = findWeakest();
       if (weakest->seen) {
         return;
       }
       faces_.erase(weakest);
     }
-    const int32_t id = identities_.Next([this](int32_t number) {
+    const int32_t id = identities_.next([this](int32_t number) {
       return std::any_of(faces_.begin(), faces_.end(),
                          [number](const TrackedFace& face) { return face.id == number; });
     });
     TrackedFace& face = faces_.emplace_back();
     face.id = id;
-    Confirm(face, found);
+    confirm(face, found);
   }
 
-  std::vector<ky_face_t> Records(const Frame& frame) const {
+  std::vector<ky_face_t> records(const Frame& frame) const {
     std::vector<ky_face_t> records;
     for (const TrackedFace& face : faces_) {
       if (face.seen) {
-        records.push_back(finder_.Record(gray_, face.face, frame));
+        records.push_back(finder_.record(gray_, face.face, frame));
         records.back().id = face.id;
       }
     }
@@ -224,13 +224,13 @@ class Tracker {
 
   std::mutex mutex_;
   FaceFinder finder_;
-  int face_limit_ = KY_DEFAULT_FACE_LIMIT;
-  int detect_interval_ = KY_DEFAULT_DETECT_INTERVAL;
-  int alignment_threshold_ = KY_DEFAULT_ALIGNMENT_THRESHOLD;
+  int faceLimit_ = KY_DEFAULT_FACE_LIMIT;
+  int detectInterval_ = KY_DEFAULT_DETECT_INTERVAL;
+  int alignmentThreshold_ = KY_DEFAULT_ALIGNMENT_THRESHOLD;
 
   int width_ = 0;
   int height_ = 0;
-  int frames_to_detection_ = 0;
+  int framesToDetection_ = 0;
   Identities identities_;
   Faces faces_;
   GrayImage gray_;
@@ -239,9 +239,9 @@ class Tracker {
 using Trackers = Handles<Tracker>;
 
 /// Changes a setting of a tracker and tells the caller, who need not ask, what it was.
-int Set(int (Tracker::*setter)(int), ky_handle_t handle, int value, int* previous) {
-  return Guarded([&] {
-    const int before = (*Trackers::Find(handle).*setter)(value);
+int set(int (Tracker::*setter)(int), ky_handle_t handle, int value, int* previous) {
+  return guarded([&] {
+    const int before = (*Trackers::find(handle).*setter)(value);
     if (previous != nullptr) {
       *previous = before;
     }
@@ -254,32 +254,32 @@ int Set(int (Tracker::*setter)(int), ky_handle_t handle, int value, int* previou
 using kyengine::Tracker;
 using kyengine::Trackers;
 
-int ky_face_create_tracker(ky_handle_t* handle, const char* model_path, int config) {
-  return Trackers::Create(handle, model_path, config);
+int ky_face_create_tracker(ky_handle_t* handle, const char* modelPath, int config) {
+  return Trackers::create(handle, modelPath, config);
 }
 
-void ky_face_destroy_tracker(ky_handle_t handle) { Trackers::Destroy(handle); }
+void ky_face_destroy_tracker(ky_handle_t handle) { Trackers::destroy(handle); }
 
-int ky_face_track(ky_handle_t handle, const unsigned char* image, int pixel_format, int width, int height,
+int ky_face_track(ky_handle_t handle, const unsigned char* image, int pixelFormat, int width, int height,
                   int stride, int orientation, ky_face_t** faces, int* count) {
-  return kyengine::Search(&Tracker::Track, handle, image, pixel_format, width, height, stride, orientation,
+  return kyengine::search(&Tracker::track, handle, image, pixelFormat, width, height, stride, orientation,
                           faces, count);
 }
 
-void ky_face_release_tracker_result(ky_face_t* faces, int /*count*/) { kyengine::ReleaseFaces(faces); }
+void ky_face_release_tracker_result(ky_face_t* faces, int /*count*/) { kyengine::releaseFaces(faces); }
 
 void ky_face_reset_tracker(ky_handle_t handle) {
-  kyengine::Guarded([&] { Trackers::Find(handle)->Reset(); });
+  kyengine::guarded([&] { Trackers::find(handle)->reset(); });
 }
 
 int ky_face_track_set_detect_face_cnt_limit(ky_handle_t handle, int limit, int* previous) {
-  return kyengine::Set(&Tracker::SetFaceLimit, handle, limit, previous);
+  return kyengine::set(&Tracker::setFaceLimit, handle, limit, previous);
 }
 
 int ky_face_track_set_detect_interval(ky_handle_t handle, int interval, int* previous) {
-  return kyengine::Set(&Tracker::SetDetectInterval, handle, interval, previous);
+  return kyengine::set(&Tracker::setDetectInterval, handle, interval, previous);
 }
 
 int ky_face_track_set_alignment_threshold(ky_handle_t handle, int threshold, int* previous) {
-  return kyengine::Set(&Tracker::SetAlignmentThreshold, handle, threshold, previous);
+  return kyengine::set(&Tracker::setAlignmentThreshold, handle, threshold, previous);
 }

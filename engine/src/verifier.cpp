@@ -20,7 +20,7 @@ namespace {
 constexpr double kEyeDistance = 0.49;  // of the side of the crop
 constexpr double kEyesAboveCentre = 0.235;
 
-FaceCrop CropByEyes(const Eyes& eyes) {
+FaceCrop cropByEyes(const Eyes& eyes) {
   const dlib::dpoint across = eyes.right - eyes.left;
   const double side = dlib::length(across) / kEyeDistance;
   const dlib::dpoint down = dlib::dpoint(-across.y(), across.x()) / dlib::length(across);
@@ -29,19 +29,19 @@ FaceCrop CropByEyes(const Eyes& eyes) {
 }
 
 /// The box of a record, with its last row and column as dlib has them. Throws Failure when it is empty.
-dlib::drectangle BoxOf(const ky_face_t& face) {
-  Require(face.rect.left < face.rect.right && face.rect.top < face.rect.bottom, KY_ERROR_FACE);
+dlib::drectangle boxOf(const ky_face_t& face) {
+  require(face.rect.left < face.rect.right && face.rect.top < face.rect.bottom, KY_ERROR_FACE);
   return {static_cast<double>(face.rect.left), static_cast<double>(face.rect.top), face.rect.right - 1.0,
           face.rect.bottom - 1.0};
 }
 
 /// The points of a record. Throws Failure when they cannot be.
-std::vector<dlib::dpoint> PointsOf(const ky_face_t& face) {
-  Require(face.points_count >= 0 && face.points_count <= KY_FACE_MAX_POINTS, KY_ERROR_FACE);
+std::vector<dlib::dpoint> pointsOf(const ky_face_t& face) {
+  require(face.points_count >= 0 && face.points_count <= KY_FACE_MAX_POINTS, KY_ERROR_FACE);
   std::vector<dlib::dpoint> points;
   for (int i = 0; i < face.points_count; ++i) {
     const ky_pointf_t p = face.points_array[i];
-    Require(std::isfinite(p.x) && std::isfinite(p.y), KY_ERROR_FACE);
+    require(std::isfinite(p.x) && std::isfinite(p.y), KY_ERROR_FACE);
     points.emplace_back(p.x, p.y);
   }
   return points;
@@ -50,9 +50,9 @@ std::vector<dlib::dpoint> PointsOf(const ky_face_t& face) {
 /// Takes features. Holds nothing that a call changes, so that calls need not wait for one another.
 class Verifier {
  public:
-  explicit Verifier(const char* model_path) {
-    if (model_path != nullptr) {
-      model_ = LoadVerifierModel(model_path);
+  explicit Verifier(const char* modelPath) {
+    if (modelPath != nullptr) {
+      model_ = loadVerifierModel(modelPath);
     }
   }
 
@@ -60,47 +60,47 @@ class Verifier {
   int length() const { return model_.descriptor != nullptr ? KY_DESCRIPTOR_LENGTH : KY_FEATURE_LENGTH; }
 
   /// Whether a feature is one of this verifier's, or of one like it.
-  bool Knows(const Feature& feature) const {
+  bool knows(const Feature& feature) const {
     const uint32_t tag = model_.descriptor != nullptr ? model_.descriptor->fingerprint() : 0;
     return feature.version() == version() && feature.tag() == tag;
   }
 
-  Feature Extract(const Frame& frame, const ky_face_t& face) const {
-    const dlib::drectangle box = BoxOf(face);
-    const dlib::drectangle view(0, 0, frame.upright_width() - 1.0, frame.upright_height() - 1.0);
+  Feature extract(const Frame& frame, const ky_face_t& face) const {
+    const dlib::drectangle box = boxOf(face);
+    const dlib::drectangle view(0, 0, frame.uprightWidth() - 1.0, frame.uprightHeight() - 1.0);
     const double longest = 2 * std::max(view.width(), view.height());
-    Require(view.contains(dlib::center(box)), KY_ERROR_FACE);
-    Require(std::max(box.width(), box.height()) <= longest, KY_ERROR_FACE);
+    require(view.contains(dlib::center(box)), KY_ERROR_FACE);
+    require(std::max(box.width(), box.height()) <= longest, KY_ERROR_FACE);
 
     GrayImage gray;
     Eyes eyes;
-    bool aligned = FindEyes(PointsOf(face), &eyes);
+    bool aligned = findEyes(pointsOf(face), &eyes);
     if (!aligned && model_.landmarks != nullptr) {
-      frame.ToUprightGray(gray);
-      aligned = FindEyes(model_.landmarks->Locate(gray, box), &eyes);
+      frame.toUprightGray(gray);
+      aligned = findEyes(model_.landmarks->locate(gray, box), &eyes);
     }
-    Require(aligned || model_.descriptor == nullptr, KY_ERROR_EYES);
+    require(aligned || model_.descriptor == nullptr, KY_ERROR_EYES);
     const FaceCrop crop =
-        aligned ? CropByEyes(eyes) : FaceCrop{dlib::center(box), std::max(box.width(), box.height()), 0};
+        aligned ? cropByEyes(eyes) : FaceCrop{dlib::center(box), std::max(box.width(), box.height()), 0};
     const double smallest = model_.descriptor != nullptr ? KY_SMALLEST_EYE_DISTANCE / kEyeDistance
                                                          : double{KY_SMALLEST_VERIFIED_FACE};
-    Require(crop.side >= smallest && view.contains(crop.centre), KY_ERROR_FACE);
-    Require(crop.side <= longest, KY_ERROR_FACE);
+    require(crop.side >= smallest && view.contains(crop.centre), KY_ERROR_FACE);
+    require(crop.side <= longest, KY_ERROR_FACE);
     if (model_.descriptor != nullptr) {
-      return Describe(frame, eyes);
+      return describe(frame, eyes);
     }
     if (gray.size() == 0) {
-      frame.ToUprightGray(gray);
+      frame.toUprightGray(gray);
     }
-    return Feature(PatternsOf(gray, crop));
+    return Feature(patternsOf(gray, crop));
   }
 
  private:
-  Feature Describe(const Frame& frame, const Eyes& eyes) const {
-    const std::vector<uint8_t> picture = AlignedFace(frame, eyes, FaceDescriptorShape().side);
+  Feature describe(const Frame& frame, const Eyes& eyes) const {
+    const std::vector<uint8_t> picture = alignedFace(frame, eyes, faceDescriptorShape().side);
     std::array<float, KY_DESCRIPTOR_NUMBERS> numbers = {};
-    const ky_result_t result = model_.descriptor->Describe(picture.data(), numbers.data());
-    Require(result == KY_SUCCESS, result);
+    const ky_result_t result = model_.descriptor->describe(picture.data(), numbers.data());
+    require(result == KY_SUCCESS, result);
     return {numbers, model_.descriptor->fingerprint()};
   }
 
@@ -111,9 +111,9 @@ using Verifiers = Handles<Verifier>;
 using Features = Handles<Feature>;
 
 /// What a verifier says of itself, or KY_ERROR_HANDLE when `handle` names none.
-int Constant(ky_handle_t handle, int (Verifier::*value)() const) {
+int constant(ky_handle_t handle, int (Verifier::*value)() const) {
   int answer = 0;
-  const int result = Guarded([&] { answer = (*Verifiers::Find(handle).*value)(); });
+  const int result = guarded([&] { answer = (*Verifiers::find(handle).*value)(); });
   return result == KY_SUCCESS ? answer : result;
 }
 
@@ -123,34 +123,34 @@ int Constant(ky_handle_t handle, int (Verifier::*value)() const) {
 using kyengine::Feature;
 using kyengine::Features;
 using kyengine::Frame;
-using kyengine::Guarded;
-using kyengine::Require;
+using kyengine::guarded;
+using kyengine::require;
 using kyengine::Verifiers;
 
-int ky_verify_create_handle(ky_handle_t* handle, const char* model_path) {
-  return Verifiers::Create(handle, model_path);
+int ky_verify_create_handle(ky_handle_t* handle, const char* modelPath) {
+  return Verifiers::create(handle, modelPath);
 }
 
-void ky_verify_destroy_handle(ky_handle_t handle) { Verifiers::Destroy(handle); }
+void ky_verify_destroy_handle(ky_handle_t handle) { Verifiers::destroy(handle); }
 
 int ky_verify_get_version(ky_handle_t handle) {
-  return kyengine::Constant(handle, &kyengine::Verifier::version);
+  return kyengine::constant(handle, &kyengine::Verifier::version);
 }
 
 int ky_verify_get_feature_length(ky_handle_t handle) {
-  return kyengine::Constant(handle, &kyengine::Verifier::length);
+  return kyengine::constant(handle, &kyengine::Verifier::length);
 }
 
-int ky_verify_get_feature(ky_handle_t handle, const unsigned char* image, int pixel_format, int width,
+int ky_verify_get_feature(ky_handle_t handle, const unsigned char* image, int pixelFormat, int width,
                           int height, int stride, const ky_face_t* face, ky_feature_t* feature, int* length) {
-  return Guarded([&] {
-    Require(feature != nullptr && length != nullptr, KY_ERROR_NULL_POINTER);
+  return guarded([&] {
+    require(feature != nullptr && length != nullptr, KY_ERROR_NULL_POINTER);
     *feature = nullptr;
     *length = 0;
-    const auto verifier = Verifiers::Find(handle);
-    Require(face != nullptr, KY_ERROR_NULL_POINTER);
-    const Frame frame(image, pixel_format, width, height, stride, KY_ORIENTATION_0);
-    *feature = Features::Add(std::make_shared<Feature>(verifier->Extract(frame, *face)));
+    const auto verifier = Verifiers::find(handle);
+    require(face != nullptr, KY_ERROR_NULL_POINTER);
+    const Frame frame(image, pixelFormat, width, height, stride, KY_ORIENTATION_0);
+    *feature = Features::add(std::make_shared<Feature>(verifier->extract(frame, *face)));
     *length = verifier->length();
   });
 }
@@ -160,31 +160,31 @@ void ky_verify_serialize_feature(ky_feature_t feature, char* text) {
     return;
   }
   *text = '\0';  // what is no feature has the empty text
-  Guarded([&] { kyengine::WriteText(*Features::Find(feature, KY_ERROR_FEATURE), text); });
+  guarded([&] { kyengine::writeText(*Features::find(feature, KY_ERROR_FEATURE), text); });
 }
 
 ky_feature_t ky_verify_deserialize_feature(const char* text) {
   ky_feature_t feature = nullptr;
-  Guarded([&] {
-    Require(text != nullptr, KY_ERROR_NULL_POINTER);
-    const std::optional<Feature> read = kyengine::ReadText(text);
-    Require(read.has_value(), KY_ERROR_FEATURE);
-    feature = Features::Add(std::make_shared<Feature>(*read));
+  guarded([&] {
+    require(text != nullptr, KY_ERROR_NULL_POINTER);
+    const std::optional<Feature> read = kyengine::readText(text);
+    require(read.has_value(), KY_ERROR_FEATURE);
+    feature = Features::add(std::make_shared<Feature>(*read));
   });
   return feature;
 }
 
 int ky_verify_compare_feature(ky_handle_t handle, ky_feature_t feature1, ky_feature_t feature2,
                               float* score) {
-  return Guarded([&] {
-    Require(score != nullptr, KY_ERROR_NULL_POINTER);
+  return guarded([&] {
+    require(score != nullptr, KY_ERROR_NULL_POINTER);
     *score = 0;
-    const auto verifier = Verifiers::Find(handle);
-    const auto a = Features::Find(feature1, KY_ERROR_FEATURE);
-    const auto b = Features::Find(feature2, KY_ERROR_FEATURE);
-    Require(verifier->Knows(*a) && verifier->Knows(*b), KY_ERROR_FEATURE_KIND);
-    *score = kyengine::Similarity(*a, *b);
+    const auto verifier = Verifiers::find(handle);
+    const auto a = Features::find(feature1, KY_ERROR_FEATURE);
+    const auto b = Features::find(feature2, KY_ERROR_FEATURE);
+    require(verifier->knows(*a) && verifier->knows(*b), KY_ERROR_FEATURE_KIND);
+    *score = kyengine::similarity(*a, *b);
   });
 }
 
-void ky_verify_release_feature(ky_feature_t feature) { Features::Destroy(feature); }
+void ky_verify_release_feature(ky_feature_t feature) { Features::destroy(feature); }

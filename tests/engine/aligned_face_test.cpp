@@ -32,7 +32,7 @@ struct Similarity {
 std::vector<uint8_t> Aligned(const TestFrame& f, const Similarity& map) {
   const Frame frame(f.bytes.data(), f.format, f.width, f.height, f.stride, KY_ORIENTATION_0);
   const auto point = [](Point z) { return dlib::dpoint(z.real(), z.imag()); };
-  return AlignedFace(frame, {point(map(kLeft)), point(map(kRight))}, kSide);
+  return alignedFace(frame, {point(map(kLeft)), point(map(kRight))}, kSide);
 }
 
 std::vector<uint8_t> Aligned(const Picture& picture, const Similarity& map) {

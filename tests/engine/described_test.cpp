@@ -82,7 +82,7 @@ class DescribedTest : public testing::Test {
  protected:
   // The model, its file and the verifier are large, and the same for all tests.
   static void SetUpTestSuite() {
-    convolutions_ = new auto(RandomModel(FaceDescriptorShape(), 21));
+    convolutions_ = new auto(RandomModel(faceDescriptorShape(), 21));
     model_ = new std::vector<uint8_t>(FileOf(*convolutions_));
     files_ = new Files;
     path_ = new std::string(files_->Write("model", *model_));
@@ -278,7 +278,7 @@ TEST_F(DescribedTest, SimilarityIsHalfAtTheThresholdsDistance) {
 TEST_F(DescribedTest, KindsNeverCompare) {
   Files files;
   const Verifier patterns(nullptr);
-  const Verifier other(files.Write("second", FileOf(RandomModel(FaceDescriptorShape(), 22))));
+  const Verifier other(files.Write("second", FileOf(RandomModel(faceDescriptorShape(), 22))));
   const Verifier same(files.Write("copy", *model_));
   const TestFrame frame(Portrait(), KY_PIXEL_RGB);
   const ky_face_t face = FaceWithEyes(kLeftEye, kRightEye);

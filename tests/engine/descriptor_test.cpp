@@ -28,12 +28,12 @@ DescriptorShape SmallShape(int side) { return {side, 16, kFewBlocks, 32}; }
 
 ky_result_t Read(const std::vector<uint8_t>& file, const DescriptorShape& shape, Descriptor* descriptor) {
   DescriptorHeader header;
-  const ky_result_t result = DescriptorHeader::Read(file, shape, &header);
+  const ky_result_t result = DescriptorHeader::read(file, shape, &header);
   if (result != KY_SUCCESS) {
     return result;
   }
   const std::span<const uint8_t> rest = std::span(file).subspan(DescriptorHeader::kSize);
-  return Descriptor::Read(header, rest.first(std::min<size_t>(rest.size(), header.length)), shape,
+  return Descriptor::read(header, rest.first(std::min<size_t>(rest.size(), header.length)), shape,
                           descriptor);
 }
 
@@ -50,7 +50,7 @@ std::vector<float> Describe(const Descriptor& descriptor, const std::vector<uint
   kyface::test::GuardedImage<uint8_t> picture(1, size, size);
   std::copy(rgb.begin(), rgb.end(), picture.data());
   kyface::test::GuardedImage<float> numbers(1, descriptor.outputs(), descriptor.outputs());
-  EXPECT_EQ(KY_SUCCESS, descriptor.Describe(picture.data(), numbers.data()));
+  EXPECT_EQ(KY_SUCCESS, descriptor.describe(picture.data(), numbers.data()));
   return numbers.contents();
 }
 
@@ -80,10 +80,10 @@ TEST(DescriptorTest, SmallNetworksOfEverySizeAreAsDefined) {
   }
 }
 
-TEST(DescriptorTest, TheFullNetworkIsAsDefined) { ExpectAsDefined(FaceDescriptorShape(), 1); }
+TEST(DescriptorTest, TheFullNetworkIsAsDefined) { ExpectAsDefined(faceDescriptorShape(), 1); }
 
 TEST(DescriptorTest, CountsOfTheFullNetwork) {
-  const DescriptorShape& shape = FaceDescriptorShape();
+  const DescriptorShape& shape = faceDescriptorShape();
   EXPECT_EQ(150, shape.side);
   EXPECT_EQ(128, shape.outputs);
   EXPECT_EQ(29, shape.convolutions());
@@ -95,7 +95,7 @@ TEST(DescriptorTest, CountsOfTheFullNetwork) {
 }
 
 TEST(DescriptorTest, EveryMachineGivesTheSameBits) {
-  const DescriptorShape& shape = FaceDescriptorShape();
+  const DescriptorShape& shape = faceDescriptorShape();
   Descriptor descriptor;
   ASSERT_EQ(KY_SUCCESS, Read(FileOf(RandomModel(shape, 3)), shape, &descriptor));
   uint32_t hash = 2166136261;
@@ -137,11 +137,11 @@ constexpr size_t kFirstFactor = kFirstConvolution + 24;
 
 TEST_F(ModelFileTest, IsRecognisedByItsFirstBytes) {
   EXPECT_EQ(KY_SUCCESS, Read(file_));
-  EXPECT_TRUE(DescriptorHeader::Recognises(file_));
-  EXPECT_FALSE(DescriptorHeader::Recognises(std::span(file_).first(7)));
-  EXPECT_FALSE(DescriptorHeader::Recognises({}));
+  EXPECT_TRUE(DescriptorHeader::recognises(file_));
+  EXPECT_FALSE(DescriptorHeader::recognises(std::span(file_).first(7)));
+  EXPECT_FALSE(DescriptorHeader::recognises({}));
   for (size_t i = 0; i < 8; ++i) {
-    EXPECT_FALSE(DescriptorHeader::Recognises(With(i, uint8_t{'x'})));
+    EXPECT_FALSE(DescriptorHeader::recognises(With(i, uint8_t{'x'})));
     EXPECT_EQ(KY_ERROR_MODEL, Read(With(i, uint8_t{'x'})));
   }
 }
@@ -182,7 +182,7 @@ TEST_F(ModelFileTest, TruncatedFilesAreRefused) {
 TEST_F(ModelFileTest, LengthsBeyondTheNetworksAreRefusedUnseen) {
   for (const uint64_t length : {uint64_t{1} << 63, ~uint64_t{0}, uint64_t{1} << 32, uint64_t{100000000}}) {
     DescriptorHeader header;
-    EXPECT_EQ(KY_ERROR_MODEL, DescriptorHeader::Read(With(16, length), shape_, &header));
+    EXPECT_EQ(KY_ERROR_MODEL, DescriptorHeader::read(With(16, length), shape_, &header));
   }
 }
 
@@ -199,9 +199,9 @@ TEST_F(ModelFileTest, OtherNetworksAreRefused) {
   for (const uint32_t zero : {256U, 0x80000000U}) {
     EXPECT_EQ(KY_ERROR_MODEL, Read(With(kFirstConvolution + 20, zero)));
   }
-  EXPECT_EQ(KY_ERROR_MODEL, Read(FileOf(RandomModel(FaceDescriptorShape(), 1))));
+  EXPECT_EQ(KY_ERROR_MODEL, Read(FileOf(RandomModel(faceDescriptorShape(), 1))));
   Descriptor descriptor;
-  EXPECT_EQ(KY_ERROR_MODEL, test::Read(file_, FaceDescriptorShape(), &descriptor));
+  EXPECT_EQ(KY_ERROR_MODEL, test::Read(file_, faceDescriptorShape(), &descriptor));
 }
 
 TEST_F(ModelFileTest, WhatIsNoNumberIsRefused) {
@@ -235,7 +235,7 @@ TEST_F(ModelFileTest, NumbersThatOverflowAreAFailure) {
   ASSERT_EQ(KY_SUCCESS, test::Read(FileOf(model), shape_, &descriptor));
   std::vector<float> numbers(32);
   const std::vector<uint8_t> white(static_cast<size_t>(kSide) * kSide * 3, 255);
-  EXPECT_EQ(KY_ERROR_MODEL, descriptor.Describe(white.data(), numbers.data()));
+  EXPECT_EQ(KY_ERROR_MODEL, descriptor.describe(white.data(), numbers.data()));
 }
 
 TEST_F(ModelFileTest, FingerprintsTellModelsApart) {

@@ -14,8 +14,8 @@ namespace {
 TEST(IdentitiesTest, CountFromOne) {
   Identities identities;
   const auto none = [](int32_t) { return false; };
-  EXPECT_EQ(1, identities.Next(none));
-  EXPECT_EQ(2, identities.Next(none));
+  EXPECT_EQ(1, identities.next(none));
+  EXPECT_EQ(2, identities.next(none));
 }
 
 TEST(IdentitiesTest, BeginAnewAfterTheLargest) {
@@ -23,9 +23,9 @@ TEST(IdentitiesTest, BeginAnewAfterTheLargest) {
   Identities identities(kLargest - 1);
   const std::set<int32_t> living = {1, 2, kLargest};
   const auto taken = [&](int32_t number) { return living.count(number) != 0; };
-  EXPECT_EQ(3, identities.Next(taken)) << "the largest, 1 and 2 have owners";
-  EXPECT_EQ(4, identities.Next(taken));
-  EXPECT_EQ(kLargest, Identities(kLargest - 1).Next([](int32_t) { return false; }));
+  EXPECT_EQ(3, identities.next(taken)) << "the largest, 1 and 2 have owners";
+  EXPECT_EQ(4, identities.next(taken));
+  EXPECT_EQ(kLargest, Identities(kLargest - 1).next([](int32_t) { return false; }));
 }
 
 }  // namespace

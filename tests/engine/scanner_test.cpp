@@ -83,7 +83,7 @@ TEST(GradientTest, EveryGradientOfBytes) {
     }
     std::vector<uint8_t> directions(3 * kCount);
     std::vector<float> lengths(3 * kCount);
-    FindGradients(rows.row(0), rows.row(1), rows.row(2), 1, 3 * kCount - 1, directions.data(),
+    findGradients(rows.row(0), rows.row(1), rows.row(2), 1, 3 * kCount - 1, directions.data(),
                   lengths.data());
     for (int i = 0; i < kCount; ++i) {
       const int dx = i - 255;
@@ -104,7 +104,7 @@ TEST(GradientTest, RowsOfEveryWidth) {
     kyface::test::GuardedImage<uint8_t> directions(1, width - 1, width - 1);
     kyface::test::GuardedImage<float> lengths(1, width - 1, width - 1);
     const uint8_t before = directions.row(0)[0];
-    FindGradients(rows.row(0), rows.row(1), rows.row(2), 1, width - 1, directions.data(), lengths.data());
+    findGradients(rows.row(0), rows.row(1), rows.row(2), 1, width - 1, directions.data(), lengths.data());
     EXPECT_EQ(before, directions.row(0)[0]) << "the border has no gradient";
     for (int x = 1; x < width - 1; ++x) {
       const int dx = rows.row(1)[x + 1] - rows.row(1)[x - 1];
@@ -123,8 +123,8 @@ void ExpectFeatures(const GrayImage& picture, int cell) {
   constexpr int kTapsAcross = 10;
   dlib::array<dlib::array2d<float>> expected;
   dlib::extract_fhog_features(picture, expected, cell, kTapsDown, kTapsAcross);
-  const int rows = FeatureMap::CellsOf(static_cast<int>(picture.nr()), cell);
-  const int columns = FeatureMap::CellsOf(static_cast<int>(picture.nc()), cell);
+  const int rows = FeatureMap::cellsOf(static_cast<int>(picture.nr()), cell);
+  const int columns = FeatureMap::cellsOf(static_cast<int>(picture.nc()), cell);
   if (expected.size() == 0 || expected[0].size() == 0) {
     EXPECT_TRUE(rows <= 0 || columns <= 0);
     return;
@@ -137,11 +137,11 @@ void ExpectFeatures(const GrayImage& picture, int cell) {
   FeatureMap map;
   for (const int band : {rows + kTapsDown - 1, 5}) {
     for (int first = 0; first < rows + kTapsDown - 1; first += band) {
-      map.Compute(picture, cell, first - kAbove, band, kBefore, kTapsAcross - 1 - kBefore);
+      map.compute(picture, cell, first - kAbove, band, kBefore, kTapsAcross - 1 - kBefore);
       for (int feature = 0; feature < kFeatures; ++feature) {
         for (int y = 0; y < band && first + y < rows + kTapsDown - 1; ++y) {
           for (int x = 0; x < columns + kTapsAcross - 1; ++x) {
-            ASSERT_NEAR(expected[static_cast<size_t>(feature)][first + y][x], map.Row(feature, y)[x], 2e-6)
+            ASSERT_NEAR(expected[static_cast<size_t>(feature)][first + y][x], map.row(feature, y)[x], 2e-6)
                 << picture.nc() << " x " << picture.nr() << ", cells of " << cell << ", feature " << feature
                 << " at " << x << ", " << first + y;
           }
@@ -186,7 +186,7 @@ TEST(ResizeTest, IsBilinear) {
                                                            {1, 7, 9, 3}}) {
     const GrayImage from = Noise(in_width, in_height, 3);
     GrayImage to(height, width);
-    Resizer().Resize(from, to);
+    Resizer().resize(from, to);
     for (int y = 0; y < height; ++y) {
       for (int x = 0; x < width; ++x) {
         const double at_x = width > 1 ? static_cast<double>(x) * (in_width - 1) / (width - 1) : 0;
@@ -206,7 +206,7 @@ TEST(ResizeTest, IsBilinear) {
 TEST(ResizeTest, HalvesByMeans) {
   const GrayImage from = Noise(13, 8, 4);
   GrayImage to;
-  Halve(from, to);
+  halve(from, to);
   ASSERT_EQ(4, to.nr());
   ASSERT_EQ(6, to.nc());
   for (int y = 0; y < 4; ++y) {
@@ -229,7 +229,7 @@ void ExpectDetections(dlib::frontal_face_detector& detector, const GrayImage& pi
   ASSERT_GE(expected.size(), at_least);
   Scanner scanner(std::make_shared<const Filters>(detector));
   GrayImage copy = Copy(picture);
-  const std::vector<dlib::rect_detection> found = scanner.Find(copy, least);
+  const std::vector<dlib::rect_detection> found = scanner.find(copy, least);
   // dlib adds up where a row's pixels are sampled, which drifts off the further the longer the row.
   constexpr double kRounding = 0.02;
   const auto expect_in = [&](const dlib::rect_detection& d, const std::vector<dlib::rect_detection>& others) {
@@ -272,7 +272,7 @@ TEST(ScannerTest, FindsNothingWhereThereIsNothing) {
   for (const int side : {1, 2, 7, 15, 23, 64, 79}) {
     Scanner scanner(std::make_shared<const Filters>(detector));
     GrayImage picture = Noise(side, 81 - side, 7);
-    EXPECT_TRUE(scanner.Find(picture, 0).empty()) << side;
+    EXPECT_TRUE(scanner.find(picture, 0).empty()) << side;
   }
 }
 

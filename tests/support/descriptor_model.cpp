@@ -143,8 +143,8 @@ Numbers Skip(const Numbers& from, bool halves) {
 std::vector<ModelConvolution> RandomModel(const DescriptorShape& shape, uint32_t seed) {
   Random random(seed);
   std::vector<ModelConvolution> model;
-  model.push_back(RandomConvolution(random, 7, 2, 3, shape.first_channels));
-  int channels = shape.first_channels;
+  model.push_back(RandomConvolution(random, 7, 2, 3, shape.firstChannels));
+  int channels = shape.firstChannels;
   for (const ResidualBlock& block : shape.blocks) {
     model.push_back(RandomConvolution(random, 3, block.halves ? 2 : 1, channels, block.channels));
     model.push_back(RandomConvolution(random, 3, 1, block.channels, block.channels));
