@@ -310,40 +310,14 @@ struct LabToBgr8Row {
 
  private:
   void group(const unsigned char* src, unsigned char* dst) const {
-#if defined(__ARM_NEON)
-    const uint8x8x3_t lab = vld3_u8(src);
-    const uint16x8_t l = vmovl_u8(lab.val[0]);
-    const int16x8_t a = vreinterpretq_s16_u16(vsubl_u8(lab.val[1], vdup_n_u8(128)));
-    const int16x8_t b = vreinterpretq_s16_u16(vsubl_u8(lab.val[2], vdup_n_u8(128)));
-    const auto whole = [](int16x4_t v) { return floatsOf(vmovl_s16(v)); };
-    const LabToLinear::Linear low =
-        linear(scaled(vmovl_u16(vget_low_u16(l))), whole(vget_low_s16(a)), whole(vget_low_s16(b)));
-    const LabToLinear::Linear high =
-        linear(scaled(vmovl_u16(vget_high_u16(l))), whole(vget_high_s16(a)), whole(vget_high_s16(b)));
-    uint8x8_t bgr[3];
-    for (int i = 0; i < 3; ++i) {
-      bgr[i] = vmovn_u16(vcombine_u16(vshrn_n_u32(compressed(low.c[i]), ByteTable::kShift),
-                                      vshrn_n_u32(compressed(high.c[i]), ByteTable::kShift)));
+    Floats lab[3][kGroupRegisters];
+    loadGroup(src, lab);
+    LabToLinear::Linear light[kGroupRegisters];
+    for (int r = 0; r < kGroupRegisters; ++r) {
+      light[r] = linear(lab[0][r] * splat<Floats>(0.39215687f), lab[1][r], lab[2][r]);
     }
-    if constexpr (nc == 4) {
-      const uint8x8x4_t all = {{bgr[0], bgr[1], bgr[2], vdup_n_u8(255)}};
-      vst4_u8(dst, all);
-    } else {
-      const uint8x8x3_t all = {{bgr[0], bgr[1], bgr[2]}};
-      vst3_u8(dst, all);
-    }
-#else
-    const Words lab = loadGroup(src);
-    const auto whole = [=](int channel) {
-      return floatsOf((lab >> (8 * channel)) & 0xff) - splat<Floats>(128.0f);
-    };
-    const LabToLinear::Linear light = linear(scaled(lab & 0xff), whole(1), whole(2));
-    const auto byte = [&](int i) { return compressed(light.c[i]) >> ByteTable::kShift; };
-    storeGroup<nc>(dst, byte(0) | byte(1) << 8 | byte(2) << 16 | 0xff000000u);
-#endif
+    storeGroup<nc>(dst, [&](int channel, int r) { return compressed(light[r].c[channel]); });
   }
-
-  static Floats scaled(Words l) { return floatsOf(l) * splat<Floats>(0.39215687f); }
 
   // The nearest byte to 255 times the curve, in bits 16 to 23: see ByteTable.
   static Words compressed(Floats v) {

@@ -549,4 +549,39 @@ class Factors {
   Floats all_;
 };
 
+// ---- groups of eight pixels
+
+/// Registers of floats that hold a channel of a group.
+inline constexpr int kGroupRegisters = 2;
+
+/// Loads a group of three bytes a pixel as floats; of the second and third channel less 128.
+inline void loadGroup(const unsigned char* p, Floats (&c)[3][kGroupRegisters]) {
+  const uint8x8x3_t v = vld3_u8(p);
+  const Halves first = vmovl_u8(v.val[0]);
+  const auto second = (SignedHalves)vsubl_u8(v.val[1], vdup_n_u8(128));
+  const auto third = (SignedHalves)vsubl_u8(v.val[2], vdup_n_u8(128));
+  c[0][0] = floatsOf(vmovl_u16(vget_low_u16(first)));
+  c[1][0] = floatsOf(vmovl_s16(vget_low_s16(second)));
+  c[2][0] = floatsOf(vmovl_s16(vget_low_s16(third)));
+  c[0][1] = floatsOf(vmovl_u16(vget_high_u16(first)));
+  c[1][1] = floatsOf(vmovl_s16(vget_high_s16(second)));
+  c[2][1] = floatsOf(vmovl_s16(vget_high_s16(third)));
+}
+/// Stores bits 16 to 23 of each lane of `words(channel, register)` as bytes, with an opaque fourth channel
+/// where `nc` is 4.
+template <int nc, typename Channels>
+inline void storeGroup(unsigned char* p, const Channels& words) {
+  uint8x8_t c[3];
+  for (int i = 0; i < 3; ++i) {
+    c[i] = vmovn_u16(vcombine_u16(vshrn_n_u32(words(i, 0), 16), vshrn_n_u32(words(i, 1), 16)));
+  }
+  if constexpr (nc == 4) {
+    const uint8x8x4_t all = {{c[0], c[1], c[2], vdup_n_u8(255)}};
+    vst4_u8(p, all);
+  } else {
+    const uint8x8x3_t all = {{c[0], c[1], c[2]}};
+    vst3_u8(p, all);
+  }
+}
+
 }  // namespace HPC::fastcv::arm

@@ -766,16 +766,28 @@ class Factors {
   float all_[4];
 };
 
-/// Eight pixels of three bytes, one to a lane of 32 bits, and back.
-inline Words loadGroup(const unsigned char* p) {
+// ---- groups of eight pixels
+
+/// Registers of floats that hold a channel of a group.
+inline constexpr int kGroupRegisters = 1;
+
+/// Loads a group of three bytes a pixel as floats; of the second and third channel less 128.
+inline void loadGroup(const unsigned char* p, Floats (&c)[3][kGroupRegisters]) {
   static constexpr x86::Table kOrder =
       x86::tableOf([](int i) { return i % 4 == 3 ? -1 : i / 4 * 3 + i % 4; });
   // The last 12 bytes are the end of what is loaded, so that nothing behind the group is read.
   const __m128i last = _mm_srli_si128(x86::loadHalf(p + 8), 4);
-  return x86::as<Words>(_mm256_shuffle_epi8(_mm256_set_m128i(last, x86::loadHalf(p)), kOrder.twice()));
+  const Words all =
+      x86::as<Words>(_mm256_shuffle_epi8(_mm256_set_m128i(last, x86::loadHalf(p)), kOrder.twice()));
+  for (int i = 0; i < 3; ++i) {
+    c[i][0] = floatsOf(all >> (8 * i) & 0xff) - splat<Floats>(i == 0 ? 0.0f : 128.0f);
+  }
 }
-template <int nc>
-inline void storeGroup(unsigned char* p, Words pixels) {
+/// Stores bits 16 to 23 of each lane of `words(channel, register)` as bytes, with an opaque fourth channel
+/// where `nc` is 4.
+template <int nc, typename Channels>
+inline void storeGroup(unsigned char* p, const Channels& words) {
+  const Words pixels = words(0, 0) >> 16 | words(1, 0) >> 16 << 8 | words(2, 0) >> 16 << 16 | 0xff000000u;
   if constexpr (nc == 4) {
     x86::storeWhole(p, x86::m(pixels));
   } else {
