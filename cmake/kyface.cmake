@@ -46,13 +46,12 @@ add_library(kyface_warnings INTERFACE)
 target_compile_options(kyface_warnings INTERFACE -Wall -Wextra -Wpedantic -Wshadow -Wcast-qual -Wvla
                                                  $<$<NOT:$<BOOL:${ANDROID}>>:${kyface_werror}>)
 
-# The arithmetic that everything here is compiled to, tests included. On x86-64 the NEON intrinsics compile through
-# SIMDe, and FMA keeps their fused multiply-adds fused. Contraction is off so that only the written fused multiply-adds
-# fuse.
+# The arithmetic that everything here is compiled to, tests included. On x86-64 FMA keeps the kernels' fused
+# multiply-adds fused. Contraction is off so that only the written fused multiply-adds fuse.
 add_library(kyface_arithmetic INTERFACE)
 target_compile_options(kyface_arithmetic INTERFACE -ffp-contract=off -fno-math-errno)
 if(CMAKE_SYSTEM_PROCESSOR MATCHES "x86_64|AMD64")
-  # With clang SIMDe takes MMX for 64-bit vectors, after which a caller's long double is NaN.
+  # With clang vectors of 8 bytes would take MMX, after which a caller's long double is NaN.
   target_compile_options(kyface_arithmetic INTERFACE -mavx2 -mfma $<$<CXX_COMPILER_ID:Clang>:-mno-mmx>)
 endif()
 

@@ -23,7 +23,6 @@ source "$(dirname "${BASH_SOURCE[0]}")/common.sh"
 
 packages_host=(
   cmake ninja-build g++        # the build
-  libsimde-dev                 # NEON intrinsics on x86-64
   libdlib-dev                  # the open engine
   libdlib-data                 # its landmark model, for the demo and the tests
   googletest                   # sources; the tests are built from them for both presets

@@ -4,7 +4,6 @@
 /// how it is loaded and stored.
 #pragma once
 
-#include "simd/neon.h"
 #include "simd/vector.h"
 
 namespace HPC::fastcv::arm {

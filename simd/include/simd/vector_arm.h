@@ -3,11 +3,12 @@
 /// The words of vector.h on Arm: one instruction each, or one for each of two registers.
 #pragma once
 
+#include <arm_neon.h>
+
 #include <bit>
 #include <cstddef>
 #include <cstdint>
 
-#include "simd/neon.h"
 #include "simd/registers.h"
 
 namespace HPC::fastcv::arm {
@@ -47,6 +48,43 @@ inline Bytes load(const unsigned char* p) { return vld1q_u8(p); }
 inline Floats load(const float* p) { return vld1q_f32(p); }
 inline SignedHalves load(const short* p) { return vld1q_s16(p); }
 inline Halves load(const unsigned short* p) { return vld1q_u16(p); }
+
+inline void load(const unsigned char* p, Bytes& v) { v = vld1q_u8(p); }
+inline void load(const float* p, Floats& v) { v = vld1q_f32(p); }
+inline void store(unsigned char* p, Bytes v) { vst1q_u8(p, v); }
+inline void store(float* p, Floats v) { vst1q_f32(p, v); }
+inline void loadChannels(const unsigned char* p, Bytes (&c)[3]) {
+  const uint8x16x3_t v = vld3q_u8(p);
+  c[0] = v.val[0], c[1] = v.val[1], c[2] = v.val[2];
+}
+inline void loadChannels(const unsigned char* p, Bytes (&c)[4]) {
+  const uint8x16x4_t v = vld4q_u8(p);
+  c[0] = v.val[0], c[1] = v.val[1], c[2] = v.val[2], c[3] = v.val[3];
+}
+inline void loadChannels(const float* p, Floats (&c)[3]) {
+  const float32x4x3_t v = vld3q_f32(p);
+  c[0] = v.val[0], c[1] = v.val[1], c[2] = v.val[2];
+}
+inline void loadChannels(const float* p, Floats (&c)[4]) {
+  const float32x4x4_t v = vld4q_f32(p);
+  c[0] = v.val[0], c[1] = v.val[1], c[2] = v.val[2], c[3] = v.val[3];
+}
+inline void storeChannels(unsigned char* p, const Bytes (&c)[3]) {
+  const uint8x16x3_t v = {{c[0], c[1], c[2]}};
+  vst3q_u8(p, v);
+}
+inline void storeChannels(unsigned char* p, const Bytes (&c)[4]) {
+  const uint8x16x4_t v = {{c[0], c[1], c[2], c[3]}};
+  vst4q_u8(p, v);
+}
+inline void storeChannels(float* p, const Floats (&c)[3]) {
+  const float32x4x3_t v = {{c[0], c[1], c[2]}};
+  vst3q_f32(p, v);
+}
+inline void storeChannels(float* p, const Floats (&c)[4]) {
+  const float32x4x4_t v = {{c[0], c[1], c[2], c[3]}};
+  vst4q_f32(p, v);
+}
 
 /// Four registers as they lie in memory.
 inline void loadRow(const unsigned char* p, Bytes (&v)[4]) {
