@@ -30,10 +30,14 @@ typedef uint8_t Part __attribute__((vector_size(16)));
 
 namespace x86 {
 
-// A vector as a register, and back.
+// A vector as a register, and back; floats are such of their own.
+template <typename V>
+inline __m256i raw(V v) {
+  return std::bit_cast<__m256i>(v);
+}
 template <typename V>
 inline __m256i m(V v) {
-  return std::bit_cast<__m256i>(v);
+  return raw(v);
 }
 template <typename V>
 inline V as(__m256i v) {
@@ -127,36 +131,35 @@ inline void storeThree(void* p, const V (&c)[3]) {
 }
 
 // 4 by 4 lanes of 4 bytes, transposed in each half.
-inline void transpose(__m256i (&v)[4]) {
-  const __m256i low01 = _mm256_unpacklo_epi32(v[0], v[1]);
-  const __m256i low23 = _mm256_unpacklo_epi32(v[2], v[3]);
-  const __m256i high01 = _mm256_unpackhi_epi32(v[0], v[1]);
-  const __m256i high23 = _mm256_unpackhi_epi32(v[2], v[3]);
-  v[0] = _mm256_unpacklo_epi64(low01, low23);
-  v[1] = _mm256_unpackhi_epi64(low01, low23);
-  v[2] = _mm256_unpacklo_epi64(high01, high23);
-  v[3] = _mm256_unpackhi_epi64(high01, high23);
+template <typename V>
+inline void transpose(V (&v)[4]) {
+  const __m256i low01 = _mm256_unpacklo_epi32(raw(v[0]), raw(v[1]));
+  const __m256i low23 = _mm256_unpacklo_epi32(raw(v[2]), raw(v[3]));
+  const __m256i high01 = _mm256_unpackhi_epi32(raw(v[0]), raw(v[1]));
+  const __m256i high23 = _mm256_unpackhi_epi32(raw(v[2]), raw(v[3]));
+  v[0] = as<V>(_mm256_unpacklo_epi64(low01, low23));
+  v[1] = as<V>(_mm256_unpackhi_epi64(low01, low23));
+  v[2] = as<V>(_mm256_unpacklo_epi64(high01, high23));
+  v[3] = as<V>(_mm256_unpackhi_epi64(high01, high23));
 }
 
 // Four registers of which one half block lies `apart` behind the other.
-inline void loadFour(const void* p, __m256i (&v)[4], ptrdiff_t apart = 64) {
+template <typename V>
+inline void loadFour(const void* p, V (&v)[4], ptrdiff_t apart = 64) {
   const auto* bytes = static_cast<const uint8_t*>(p);
   for (int i = 0; i < 4; ++i) {
-    v[i] = loadHalves(bytes + 16 * i, bytes + apart + 16 * i);
+    v[i] = as<V>(loadHalves(bytes + 16 * i, bytes + apart + 16 * i));
   }
 }
-inline void storeFour(void* p, const __m256i (&v)[4]) {
+template <typename V>
+inline void storeFour(void* p, const V (&v)[4]) {
   auto* bytes = static_cast<uint8_t*>(p);
-  storeWhole(bytes, _mm256_permute2x128_si256(v[0], v[1], 0x20));
-  storeWhole(bytes + 32, _mm256_permute2x128_si256(v[2], v[3], 0x20));
-  storeWhole(bytes + 64, _mm256_permute2x128_si256(v[0], v[1], 0x31));
-  storeWhole(bytes + 96, _mm256_permute2x128_si256(v[2], v[3], 0x31));
+  storeWhole(bytes, _mm256_permute2x128_si256(raw(v[0]), raw(v[1]), 0x20));
+  storeWhole(bytes + 32, _mm256_permute2x128_si256(raw(v[2]), raw(v[3]), 0x20));
+  storeWhole(bytes + 64, _mm256_permute2x128_si256(raw(v[0]), raw(v[1]), 0x31));
+  storeWhole(bytes + 96, _mm256_permute2x128_si256(raw(v[2]), raw(v[3]), 0x31));
 }
 
-// Products of 16-bit lanes, their lower halves.
-inline __m256i product(__m256i a, int weight) {
-  return _mm256_mullo_epi16(a, kept(_mm256_set1_epi16(static_cast<int16_t>(weight))));
-}
 inline __m256i zero() { return _mm256_setzero_si256(); }
 
 }  // namespace x86
@@ -186,23 +189,15 @@ inline void loadChannels(const unsigned char* p, Bytes (&c)[3]) { x86::loadThree
 inline void loadChannels(const float* p, Floats (&c)[3]) { x86::loadThree<4>(p, c); }
 inline void loadChannels(const unsigned char* p, Bytes (&c)[4]) {
   static constexpr x86::Table kSorted = x86::tableOf([](int i) { return i % 4 * 4 + i / 4; });
-  __m256i v[4];
-  x86::loadFour(p, v);
-  for (__m256i& each : v) {
-    each = _mm256_shuffle_epi8(each, kSorted.twice());
+  x86::loadFour(p, c);
+  for (Bytes& each : c) {
+    each = x86::as<Bytes>(_mm256_shuffle_epi8(x86::m(each), kSorted.twice()));
   }
-  x86::transpose(v);
-  for (int i = 0; i < 4; ++i) {
-    c[i] = x86::as<Bytes>(v[i]);
-  }
+  x86::transpose(c);
 }
 inline void loadChannels(const float* p, Floats (&c)[4]) {
-  __m256i v[4];
-  x86::loadFour(p, v);
-  x86::transpose(v);
-  for (int i = 0; i < 4; ++i) {
-    c[i] = x86::as<Floats>(v[i]);
-  }
+  x86::loadFour(p, c);
+  x86::transpose(c);
 }
 inline void storeChannels(unsigned char* p, const Bytes (&c)[3]) { x86::storeThree<1>(p, c); }
 inline void storeChannels(float* p, const Floats (&c)[3]) { x86::storeThree<4>(p, c); }
@@ -216,10 +211,7 @@ inline void storeChannels(unsigned char* p, const Bytes (&c)[4]) {
                      _mm256_unpacklo_epi16(high01, high23), _mm256_unpackhi_epi16(high01, high23)});
 }
 inline void storeChannels(float* p, const Floats (&c)[4]) {
-  __m256i v[4];
-  for (int i = 0; i < 4; ++i) {
-    v[i] = std::bit_cast<__m256i>(c[i]);
-  }
+  Floats v[4] = {c[0], c[1], c[2], c[3]};
   x86::transpose(v);
   x86::storeFour(p, v);
 }
@@ -301,59 +293,50 @@ inline V reversed(V v) {
 
 // ---- widening
 
-inline Two<Halves> widen(Bytes a) {
-  return {x86::as<Halves>(_mm256_unpacklo_epi8(x86::m(a), x86::zero())),
-          x86::as<Halves>(_mm256_unpackhi_epi8(x86::m(a), x86::zero()))};
+namespace x86 {
+// What a lane of bytes becomes.
+template <typename B>
+using Wide = std::conditional_t<std::is_same_v<B, Bytes>, Halves, SignedHalves>;
+// Bytes of both in turn, as wider lanes or as they are.
+template <typename V, typename B>
+inline Two<V> inTurn(B a, B b) {
+  return {as<V>(_mm256_unpacklo_epi8(m(a), m(b))), as<V>(_mm256_unpackhi_epi8(m(a), m(b)))};
 }
-inline Two<SignedHalves> widen(SignedBytes a) {
-  return {x86::as<SignedHalves>(_mm256_unpacklo_epi8(x86::m(a), x86::m(a))) >> 8,
-          x86::as<SignedHalves>(_mm256_unpackhi_epi8(x86::m(a), x86::m(a))) >> 8};
-}
-template <int n>
-inline Two<Halves> widenShifted(Bytes a) {
-  const Two<Halves> wide = widen(a);
-  return {wide.low << n, wide.high << n};
-}
-template <int n>
-inline Two<SignedHalves> widenShifted(SignedBytes a) {
+}  // namespace x86
+
+inline Two<Halves> widen(Bytes a) { return x86::inTurn<Halves>(a, Bytes{}); }
+template <int n, typename B>
+inline Two<x86::Wide<B>> widenShifted(B a) {
   // As the upper bytes, they bring their signs along.
-  return {x86::as<SignedHalves>(_mm256_unpacklo_epi8(x86::zero(), x86::m(a))) >> (8 - n),
-          x86::as<SignedHalves>(_mm256_unpackhi_epi8(x86::zero(), x86::m(a))) >> (8 - n)};
+  const auto upper = x86::inTurn<x86::Wide<B>>(B{}, a);
+  return {upper.low >> (8 - n), upper.high >> (8 - n)};
 }
+inline Two<SignedHalves> widen(SignedBytes a) { return widenShifted<0>(a); }
 inline Two<SignedHalves> asSigned(const Two<Halves>& a) {
-  return {std::bit_cast<SignedHalves>(a.low), std::bit_cast<SignedHalves>(a.high)};
+  return {(SignedHalves)a.low, (SignedHalves)a.high};
 }
 inline Two<SignedHalves> difference(Bytes a, Bytes b) {
   // Products of neighbours with 1 and -1.
-  const __m256i weights = kept(_mm256_set1_epi16(static_cast<int16_t>(0xff01)));
-  return {x86::as<SignedHalves>(_mm256_maddubs_epi16(_mm256_unpacklo_epi8(x86::m(a), x86::m(b)), weights)),
-          x86::as<SignedHalves>(_mm256_maddubs_epi16(_mm256_unpackhi_epi8(x86::m(a), x86::m(b)), weights))};
+  const auto weights = x86::m(kept(splat<Halves>(0xff01)));
+  const auto pairs = x86::inTurn<Bytes>(a, b);
+  return {x86::as<SignedHalves>(_mm256_maddubs_epi16(x86::m(pairs.low), weights)),
+          x86::as<SignedHalves>(_mm256_maddubs_epi16(x86::m(pairs.high), weights))};
 }
-inline Two<Halves> add(const Two<Halves>& a, Bytes b) {
+template <typename V>
+inline Two<V> add(const Two<V>& a, Bytes b) {
   const Two<Halves> wide = widen(b);
-  return {a.low + wide.low, a.high + wide.high};
-}
-inline Two<SignedHalves> add(const Two<SignedHalves>& a, Bytes b) {
-  const Two<SignedHalves> wide = asSigned(widen(b));
-  return {a.low + wide.low, a.high + wide.high};
+  return {a.low + (V)wide.low, a.high + (V)wide.high};
 }
 
-inline Two<Halves> multiply(Bytes a, unsigned char weight) {
-  const Two<Halves> wide = widen(a);
-  return {x86::as<Halves>(x86::product(x86::m(wide.low), weight)),
-          x86::as<Halves>(x86::product(x86::m(wide.high), weight))};
+template <typename B>
+inline Two<x86::Wide<B>> multiply(B a, ElementOf<B> weight) {
+  const auto wide = widen(a);
+  const auto weights = kept(splat<x86::Wide<B>>(weight));
+  return {wide.low * weights, wide.high * weights};
 }
-inline Two<Halves> multiplyAdd(const Two<Halves>& sum, Bytes a, unsigned char weight) {
-  const Two<Halves> products = multiply(a, weight);
-  return {sum.low + products.low, sum.high + products.high};
-}
-inline Two<SignedHalves> multiply(SignedBytes a, signed char weight) {
-  const Two<SignedHalves> wide = widen(a);
-  return {x86::as<SignedHalves>(x86::product(x86::m(wide.low), weight)),
-          x86::as<SignedHalves>(x86::product(x86::m(wide.high), weight))};
-}
-inline Two<SignedHalves> multiplyAdd(const Two<SignedHalves>& sum, SignedBytes a, signed char weight) {
-  const Two<SignedHalves> products = multiply(a, weight);
+template <typename B>
+inline Two<x86::Wide<B>> multiplyAdd(const Two<x86::Wide<B>>& sum, B a, ElementOf<B> weight) {
+  const auto products = multiply(a, weight);
   return {sum.low + products.low, sum.high + products.high};
 }
 
@@ -562,9 +545,7 @@ inline Bytes loadParts(const unsigned char* p, ptrdiff_t step, int /*part*/) {
   return x86::as<Bytes>(x86::loadHalves(p, p + step));
 }
 
-inline Halves multiply(Samples a, unsigned char weight) {
-  return x86::as<Halves>(x86::product(x86::m(a), weight));
-}
+inline Halves multiply(Samples a, unsigned char weight) { return a * kept(splat<Halves>(weight)); }
 inline Halves multiplyAdd(Halves sum, Samples a, unsigned char weight) { return sum + multiply(a, weight); }
 inline SignedHalves asSigned(Halves a) { return std::bit_cast<SignedHalves>(a); }
 
@@ -742,14 +723,10 @@ inline bool anySet(Words mask) { return _mm256_testz_si256(x86::m(mask), x86::m(
 
 /// Of a table of rows of four, those that `index` names, by columns.
 inline void lookUpRows(const float (*rows)[4], Words index, Floats (&columns)[4]) {
-  __m256i v[4];
   for (int i = 0; i < 4; ++i) {
-    v[i] = x86::loadHalves(rows[index[i]], rows[index[i + 4]]);
+    columns[i] = x86::as<Floats>(x86::loadHalves(rows[index[i]], rows[index[i + 4]]));
   }
-  x86::transpose(v);
-  for (int i = 0; i < 4; ++i) {
-    columns[i] = x86::as<Floats>(v[i]);
-  }
+  x86::transpose(columns);
 }
 
 /// Four constants.
