@@ -22,6 +22,12 @@ namespace HPC::fastcv::arm {
 template <typename V>
 using ElementOf = std::remove_cvref_t<decltype(std::declval<V&>()[0])>;
 
+/// All lanes alike.
+template <typename V>
+inline V splat(ElementOf<V> value) {
+  return value - V{};  // which 0 + value is not, of -0
+}
+
 /// Two registers: what a block of bytes is widened to.
 template <typename V>
 struct Two {
@@ -60,6 +66,24 @@ inline ElementOf<V> total(V v) {
     sum += v[i];
   }
   return sum;
+}
+
+/// a + (b >> n)
+template <int n, typename V>
+inline Two<V> addShifted(const Two<V>& a, const Two<V>& b) {
+  return {a.low + (b.low >> n), a.high + (b.high >> n)};
+}
+
+/// `a` where the mask is set, 0 elsewhere.
+template <typename Mask, typename V>
+  requires(sizeof(Mask) == sizeof(V))
+inline V masked(Mask mask, V a) {
+  return (V)(mask & (Mask)a);
+}
+/// The bits of `a` where the mask's are set, those of `b` elsewhere.
+template <typename Mask, typename V>
+inline V mixedBits(Mask mask, V a, V b) {
+  return (V)(((Mask)a & mask) | ((Mask)b & ~mask));
 }
 
 /// Factors of the first three channels of a pixel.

@@ -25,25 +25,6 @@ using Part = Bytes;
 
 // ---- made, loaded and stored
 
-template <typename V>
-inline V splat(ElementOf<V> value) {
-  if constexpr (std::is_same_v<V, Bytes>) {
-    return vdupq_n_u8(value);
-  } else if constexpr (std::is_same_v<V, SignedBytes>) {
-    return vdupq_n_s8(value);
-  } else if constexpr (std::is_same_v<V, Halves>) {
-    return vdupq_n_u16(value);
-  } else if constexpr (std::is_same_v<V, SignedHalves>) {
-    return vdupq_n_s16(value);
-  } else if constexpr (std::is_same_v<V, Words>) {
-    return vdupq_n_u32(value);
-  } else if constexpr (std::is_same_v<V, SignedWords>) {
-    return vdupq_n_s32(value);
-  } else {
-    return vdupq_n_f32(value);
-  }
-}
-
 inline Bytes load(const unsigned char* p) { return vld1q_u8(p); }
 inline Floats load(const float* p) { return vld1q_f32(p); }
 inline SignedHalves load(const short* p) { return vld1q_s16(p); }
@@ -148,11 +129,6 @@ template <typename Mask>
 inline Floats select(Mask mask, Floats a, Floats b) {
   return vbslq_f32((Words)mask, a, b);
 }
-/// `a` where the mask is set, 0 elsewhere.
-template <typename Mask>
-inline Floats masked(Mask mask, Floats a) {
-  return (Floats)((Words)mask & (Words)a);
-}
 
 inline Bytes addSaturated(Bytes a, Bytes b) { return vqaddq_u8(a, b); }
 inline Bytes subtractSaturated(Bytes a, Bytes b) { return vqsubq_u8(a, b); }
@@ -229,15 +205,6 @@ inline Two<SignedHalves> multiplyAdd(const Two<SignedHalves>& sum, SignedBytes a
 
 inline Two<SignedHalves> asSigned(const Two<Halves>& a) {
   return {vreinterpretq_s16_u16(a.low), vreinterpretq_s16_u16(a.high)};
-}
-/// a + (b >> n)
-template <int n>
-inline Two<Halves> addShifted(const Two<Halves>& a, const Two<Halves>& b) {
-  return {vsraq_n_u16(a.low, b.low, n), vsraq_n_u16(a.high, b.high, n)};
-}
-template <int n>
-inline Two<SignedHalves> addShifted(const Two<SignedHalves>& a, const Two<SignedHalves>& b) {
-  return {vsraq_n_s16(a.low, b.low, n), vsraq_n_s16(a.high, b.high, n)};
 }
 /// (2 a weight + 2^15) >> 16
 inline Two<SignedHalves> multiplyRounded(const Two<SignedHalves>& a, int16_t weight) {
@@ -506,8 +473,6 @@ inline Words min(Words a, Words b) { return vminq_u32(a, b); }
 inline Floats multiplySubtract(Floats c, Floats a, Floats b) { return vfmsq_f32(c, a, b); }
 /// Whether |a| > |b|.
 inline Words exceeds(Floats a, Floats b) { return vcagtq_f32(a, b); }
-/// The bits of `a` where the mask's are set, those of `b` elsewhere.
-inline Floats mixedBits(Words mask, Floats a, Floats b) { return vbslq_f32(mask, a, b); }
 /// (2 a factor) >> 32
 inline SignedWords doubledHigh(SignedWords a, int32_t factor) { return vqdmulhq_n_s32(a, factor); }
 

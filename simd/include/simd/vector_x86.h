@@ -166,11 +166,6 @@ inline __m256i zero() { return _mm256_setzero_si256(); }
 
 // ---- made, loaded and stored
 
-template <typename V>
-inline V splat(ElementOf<V> value) {
-  return value - V{};  // which 0 + value is not, of -0
-}
-
 inline Bytes load(const unsigned char* p) {
   return x86::as<Bytes>(_mm256_loadu_si256(reinterpret_cast<const __m256i*>(p)));
 }
@@ -259,11 +254,6 @@ template <typename Mask, typename V>
 inline V select(Mask mask, V a, V b) {
   return mask ? a : b;
 }
-/// `a` where the mask is set, 0 elsewhere.
-template <typename Mask>
-inline Floats masked(Mask mask, Floats a) {
-  return std::bit_cast<Floats>(std::bit_cast<Words>(mask) & std::bit_cast<Words>(a));
-}
 
 inline Bytes addSaturated(Bytes a, Bytes b) { return x86::as<Bytes>(_mm256_adds_epu8(x86::m(a), x86::m(b))); }
 inline Bytes subtractSaturated(Bytes a, Bytes b) {
@@ -342,11 +332,6 @@ inline Two<x86::Wide<B>> multiplyAdd(const Two<x86::Wide<B>>& sum, B a, ElementO
 
 // ---- in 16 bits
 
-/// a + (b >> n)
-template <int n, typename V>
-inline Two<V> addShifted(const Two<V>& a, const Two<V>& b) {
-  return {a.low + (b.low >> n), a.high + (b.high >> n)};
-}
 /// (2 a weight + 2^15) >> 16
 inline Two<SignedHalves> multiplyRounded(const Two<SignedHalves>& a, int16_t weight) {
   const __m256i w = kept(_mm256_set1_epi16(weight));
@@ -690,10 +675,6 @@ inline Floats multiplySubtract(Floats c, Floats a, Floats b) {
 /// Whether |a| > |b|.
 inline Words exceeds(Floats a, Floats b) {
   return std::bit_cast<Words>(distance(a, Floats{}) > distance(b, Floats{}));
-}
-/// The bits of `a` where the mask's are set, those of `b` elsewhere.
-inline Floats mixedBits(Words mask, Floats a, Floats b) {
-  return std::bit_cast<Floats>((std::bit_cast<Words>(a) & mask) | (std::bit_cast<Words>(b) & ~mask));
 }
 /// (2 a factor) >> 32
 inline SignedWords doubledHigh(SignedWords a, int32_t factor) {
