@@ -165,6 +165,7 @@ struct BgrToLabF32 {
   using Dst = float;
   static constexpr int kSrcChannels = nc;
   static constexpr int kDstChannels = 3;
+  static constexpr bool kInlined = true;
   static constexpr int kInFlight = 1;
   static constexpr bool kUniform = true;
 

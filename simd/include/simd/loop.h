@@ -133,9 +133,23 @@ class PixelRow {
   using Src = typename Op::Src;
   using Dst = typename Op::Dst;
 
-  /// Converts `length` pixels. Not inlined: the compiler would make a copy of the loops for each kind of
-  /// tail.
-  [[gnu::noinline]] static void convert(const Op& op, ptrdiff_t length, Tail tail, const Src* src, Dst* dst) {
+  /// Converts `length` pixels, in a function of its own unless `Op` is better off without: the compiler makes
+  /// a copy of the loops for each kind of tail.
+  static void convert(const Op& op, ptrdiff_t length, Tail tail, const Src* src, Dst* dst) {
+    if constexpr (requires { Op::kInlined; }) {
+      convertHere(op, length, tail, src, dst);
+    } else {
+      convertApart(op, length, tail, src, dst);
+    }
+  }
+
+ private:
+  [[gnu::noinline]] static void convertApart(const Op& op, ptrdiff_t length, Tail tail, const Src* src,
+                                             Dst* dst) {
+    convertHere(op, length, tail, src, dst);
+  }
+
+  static void convertHere(const Op& op, ptrdiff_t length, Tail tail, const Src* src, Dst* dst) {
     const ptrdiff_t turns = length / kTurn;
     convertTurns(op, turns, src, dst);
     if constexpr (kWide) {
@@ -153,7 +167,6 @@ class PixelRow {
     }
   }
 
- private:
   static constexpr int kSrc = Op::kSrcChannels;
   static constexpr int kDst = Op::kDstChannels;
   using SrcBlock = BlockOf<Src>;
@@ -272,6 +285,9 @@ class PixelRow {
 /// - `kWeighs`, if `vector` takes Colours;
 /// - `kSwaps` instead of `vector`, if all that happens to a pixel is that its first and third channel change
 ///   places, where it is true, and that a fourth one comes, opaque, or goes;
+/// - `kInlined`, if the rows' loop is to be where the constants of `vector` are made: it has more of them
+/// than
+///   registers;
 /// - `kPacked`, if `vector` takes and gives blocks of 4-channel pixels as they lie in memory, not a channel a
 ///   register.
 /// Strides count elements. Rows are worked on from their starts, each block read before it is written, so
