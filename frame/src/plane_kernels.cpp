@@ -166,11 +166,9 @@ inline void decodeBlock(const Scratch& scratch, ptrdiff_t rows, bool firstIsV, c
       chroma = {loadSamples(chromaAt), loadSamples(chromaAt + 16)};
     }
     chromaAt += kBlock;
-    forget(chromaAt);
     decoder.decode([=](int row, int part) TILE_LAMBDA { return loadParts(lumaAt + 16 * row, 32, part); },
                    chroma, out, step);
     lumaAt += 64;
-    forget(lumaAt);
   }
 }
 

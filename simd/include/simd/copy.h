@@ -7,7 +7,6 @@
 #include <cstring>
 
 #include "simd/overlap.h"
-#include "simd/registers.h"
 #include "simd/shuffle.h"
 #include "simd/vector.h"
 
@@ -49,9 +48,7 @@ inline void copyRow(const unsigned char* src, unsigned char* dst, ptrdiff_t size
     copyBlock(src, dst);
     copyBlock(src + kCopyBlock, dst + kCopyBlock);
     src += kTurn;
-    forget(src);
     dst += kTurn;
-    forget(dst);
   }
   if (size % kTurn > kCopyBlock) {
     copyBlock(src, dst);

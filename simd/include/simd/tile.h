@@ -12,7 +12,6 @@
 #include <type_traits>
 #include <utility>
 
-#include "simd/registers.h"
 #include "simd/shuffle.h"
 #include "simd/vector.h"
 
@@ -222,13 +221,11 @@ TILE_INLINE void moveTiles(const unsigned char* src, const RowOffsets<kLargestTi
   detail::unrolled<tiles>([&](auto tile) TILE_LAMBDA {
     const auto current = detail::interleaved(in);
     src += 16;
-    forget(src);
     detail::storeColumns<kSide>(current, out, [&](auto r) TILE_LAMBDA {
       if constexpr (tile + 1 < tiles) {
         in.v[r] = loadBytes<16>(from.template of<r>(src));
       }
     });
-    forget(out.first);
   });
 }
 

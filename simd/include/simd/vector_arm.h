@@ -404,9 +404,7 @@ inline void lookUp(const WideTable& table, const Bytes (&bytes)[n], Two<Halves> 
 template <int n>
 class WeighedHalves {
  public:
-  WeighedHalves(uint16_t f0, uint16_t f1, uint16_t f2) : factors_{f0, f1, f2} {
-    forget(factors_);  // constants would be made one to a register
-  }
+  WeighedHalves(uint16_t f0, uint16_t f1, uint16_t f2) : factors_{f0, f1, f2} {}
 
   /// (f0 a + f1 b + f2 c + 2^(n-1)) >> n in 32 bits.
   Two<Words> operator()(Halves a, Halves b, Halves c) const {
