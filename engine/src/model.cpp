@@ -59,14 +59,14 @@ bool reads(Read read) {
 
 std::shared_ptr<const LandmarkModel> loadLandmarks(const char* path, ky_result_t misfit,
                                                    std::streamoff start) {
-  // A file that was replaced is another file.
-  using File = std::tuple<std::string, uintmax_t, std::filesystem::file_time_type>;
+  // A file that was replaced is another file, and what begins elsewhere in it is another model.
+  using File = std::tuple<std::string, std::streamoff, uintmax_t, std::filesystem::file_time_type>;
   static std::mutex mutex;
   static std::map<File, std::weak_ptr<const LandmarkModel>> loaded;
 
   std::ifstream in = open(path, KY_ERROR_MODEL_FILE);
   std::error_code ignored;
-  const File file(path, std::filesystem::file_size(path, ignored),
+  const File file(path, start, std::filesystem::file_size(path, ignored),
                   std::filesystem::last_write_time(path, ignored));
   const std::lock_guard lock(mutex);
   std::erase_if(loaded, [](const auto& entry) { return entry.second.expired(); });

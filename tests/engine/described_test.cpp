@@ -398,6 +398,14 @@ TEST_F(DescribedTest, DetectorsRefuseVerifiersModels) {
   ky_handle_t detector = nullptr;
   EXPECT_EQ(KY_ERROR_MODEL, ky_face_create_detector(&detector, path_->c_str(), KY_CONFIG_DEFAULT));
   EXPECT_EQ(nullptr, detector);
+
+  // Nor do they take the landmarks that follow, which the verifier has in use.
+  Files files;
+  const std::string both = files.Write(
+      "both", FileOf(*convolutions_, Following(Landmarks(FivePoints({0.3F, 0.3F}, {0.7F, 0.33F})))));
+  const Verifier verifier(both);
+  EXPECT_EQ(KY_ERROR_MODEL, ky_face_create_detector(&detector, both.c_str(), KY_CONFIG_DEFAULT));
+  ky_face_destroy_detector(detector);
 }
 
 }  // namespace
