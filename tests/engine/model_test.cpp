@@ -11,6 +11,7 @@
 
 #include <cmath>
 #include <cstdio>
+#include <filesystem>
 #include <fstream>
 #include <map>
 #include <sstream>
@@ -100,6 +101,25 @@ TEST_F(ModelTest, DetectorOfOneFilterIsAnother) {
   Detected faces;
   ASSERT_EQ(KY_SUCCESS, Detect(detector, TestFrame(AboutFace()), faces));
   EXPECT_EQ(0, faces.count);
+}
+
+TEST_F(ModelTest, DetectorsOfTheFirstVersionAreRead) {
+  // They have one filter, in front of the overlap tester.
+  const dlib::frontal_face_detector good = dlib::get_frontal_face_detector();
+  const auto write = [&](bool whole) {
+    std::ostringstream out;
+    dlib::serialize(1, out);
+    dlib::scan_fhog_pyramid<dlib::pyramid_down<6>> scanner;
+    scanner.copy_configuration(good.get_scanner());
+    serialize(scanner, out);
+    dlib::serialize(good.get_w(0), out);
+    if (whole) {
+      serialize(good.get_overlap_tester(), out);
+    }
+    return Write("version1", out.str());
+  };
+  ExpectRect(FaceWith(nullptr).rect, FaceWith(write(true).c_str()).rect, 0);
+  EXPECT_EQ(KY_ERROR_MODEL, CreateDetector(write(false)));
 }
 
 TEST_F(ModelTest, FilesThatCannotBeOpened) {
@@ -371,6 +391,21 @@ TEST_F(ModelTest, ReplacedFilesAreReadAgain) {
   ASSERT_EQ(KY_SUCCESS, Detect(first, TestFrame(AboutFace()), faces));
   ASSERT_EQ(1, faces.count);
   EXPECT_EQ(3, faces[0].points_count);
+}
+
+TEST_F(ModelTest, LandmarksInUseAreShared) {
+  // What takes the place of a file unseen shows which models were read again.
+  const std::string path = Write("shared", Landmarks(std::vector<ky_pointf_t>(5, {0.25F, 0.5F})));
+  const auto written = std::filesystem::last_write_time(path);
+  const ky_face_t before = FaceWith(path.c_str());
+  const auto first_point = [&] { return FaceWith(path.c_str()).points_array[0].x; };
+  {
+    const Detector inUse(KY_CONFIG_LARGE_FACES, path.c_str());
+    Write("shared", Landmarks(std::vector<ky_pointf_t>(5, {0.75F, 0.5F})));
+    std::filesystem::last_write_time(path, written);
+    EXPECT_EQ(before.points_array[0].x, first_point());
+  }
+  EXPECT_LT(before.points_array[0].x + 10, first_point()) << "nobody uses the first any more";
 }
 
 TEST_F(ModelTest, PoseOfSixtyEightPoints) {

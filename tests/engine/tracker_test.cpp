@@ -6,8 +6,10 @@
 #include <unistd.h>
 
 #include <algorithm>
+#include <cmath>
 #include <limits>
 #include <set>
+#include <utility>
 
 #include "engine_calls.h"
 
@@ -333,6 +335,49 @@ TEST(TrackerTest, AlignmentThresholdDecidesWhatIsFollowed) {
           << "threshold " << c.threshold << (elsewhere_next ? ", elsewhere" : ", the face");
     }
   }
+}
+
+TEST(TrackerTest, FacesAreFollowedUntilHalfOfThemIsOut) {
+  // To each side, with a threshold that takes any agreement. Boxes are clipped to the frame.
+  for (const auto& [across, down] : {std::pair(1, 0), {-1, 0}, {0, 1}, {0, -1}}) {
+    const EveryNth tracker(100);
+    ASSERT_EQ(KY_SUCCESS, ky_face_track_set_alignment_threshold(tracker, 0, nullptr));
+    int shortest = kSide;
+    bool seen = true;
+    for (int i = 0; i < 24 && seen; ++i) {
+      const Picture view = View(Portrait(), 222 + across * 8 * i, 126 + down * 8 * i, 1, 0, kSide);
+      Tracked faces;
+      ASSERT_EQ(KY_SUCCESS, Track(tracker, TestFrame(view), faces));
+      seen = faces.count == 1;
+      if (seen) {
+        const ky_rect_t& rect = faces[0].rect;
+        shortest = std::min({shortest, rect.right - rect.left, rect.bottom - rect.top});
+      }
+    }
+    EXPECT_FALSE(seen) << across << ", " << down;
+    EXPECT_GE(shortest, 36) << across << ", " << down;
+    EXPECT_LE(shortest, 60) << across << ", " << down;
+  }
+}
+
+TEST(TrackerTest, FacesAreFollowedUntilTheyAreTooSmall) {
+  const EveryNth tracker(100);
+  ASSERT_EQ(KY_SUCCESS, ky_face_track_set_alignment_threshold(tracker, 0, nullptr));
+  int smallest = kSide;
+  bool seen = true;
+  for (int i = 0; i < 60 && seen; ++i) {
+    const Picture view = View(Portrait(), 222, 126, std::pow(0.95, i), 0, kSide);
+    Tracked faces;
+    ASSERT_EQ(KY_SUCCESS, Track(tracker, TestFrame(view), faces));
+    seen = faces.count == 1;
+    if (seen) {
+      const ky_rect_t& rect = faces[0].rect;
+      smallest = std::min({smallest, rect.right - rect.left, rect.bottom - rect.top});
+    }
+  }
+  EXPECT_FALSE(seen);
+  EXPECT_GE(smallest, 16);
+  EXPECT_LE(smallest, 20);
 }
 
 TEST(TrackerTest, PictureWithoutContrastIsNoAgreement) {

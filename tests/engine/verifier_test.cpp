@@ -289,6 +289,9 @@ TEST_F(VerifierTest, FeaturesOfOtherModelsAreRefused) {
   ++other_version[2];
   EXPECT_TRUE(IsRefused(Base64(other_version)));
   EXPECT_TRUE(IsRefused(Base64(std::vector<uint8_t>(KY_FEATURE_LENGTH, 0))));
+  for (const uint8_t version : {uint8_t{0}, uint8_t{KY_DESCRIPTOR_VERSION + 1}, uint8_t{255}}) {
+    EXPECT_TRUE(IsRefused(Base64({'K', 'Y', version}))) << "a mark alone, version " << version;
+  }
   for (const size_t length : {size_t{512}, size_t{KY_FEATURE_LENGTH - 3}, size_t{KY_FEATURE_LENGTH + 3}}) {
     std::vector<uint8_t> foreign = bytes;
     foreign.resize(length);
