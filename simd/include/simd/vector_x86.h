@@ -643,8 +643,8 @@ inline Floats reciprocal(Floats v) {
 }
 }  // namespace x86
 
-/// 1 / v, as exact as two steps make the estimate that Arm's processors have; and that of numbers that are
-/// above 0 and below 2, but not below 2^-100.
+/// 1 / v, as exact as two steps make the estimate that Arm's processors have, where infinities have 0 of
+/// either sign; and that of numbers that are above 0 and below 2, but not below 2^-100.
 inline Floats reciprocal(Floats v) { return x86::reciprocal<16>(v); }
 inline Floats reciprocalBelow2(Floats v) { return x86::reciprocal<1>(v); }
 /// Whether all of `a` and `b` are above 0 and below 2, where that makes a difference; `b` is not 0.
@@ -741,8 +741,8 @@ inline void loadGroup(const unsigned char* p, Floats (&c)[3][kGroupRegisters]) {
     c[i][0] = floatsOf(all >> (8 * i) & 0xff) - splat<Floats>(i == 0 ? 0.0f : 128.0f);
   }
 }
-/// Stores bits 16 to 23 of each lane of `words(channel, register)` as bytes, with an opaque fourth channel
-/// where `nc` is 4.
+/// Stores bits 16 to 23 of each lane of `words(channel, register)`, whose higher bits are 0, as bytes, with
+/// an opaque fourth channel where `nc` is 4.
 template <int nc, typename Channels>
 inline void storeGroup(unsigned char* p, const Channels& words) {
   const Words pixels = words(0, 0) >> 16 | words(1, 0) >> 16 << 8 | words(2, 0) >> 16 << 16 | 0xff000000u;
