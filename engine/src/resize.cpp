@@ -90,6 +90,7 @@ void between(const float* row, const int* columns, const float* ways, int count,
       },
       [=](ptrdiff_t x) {
         const float* const left = row + columns[x];
+        // NOLINTNEXTLINE(bugprone-incorrect-roundings): never negative, and as the blocks round
         result[x] = static_cast<uint8_t>(std::fma(left[1] - left[0], ways[x], left[0]) + 0.5F);
       });
 }
