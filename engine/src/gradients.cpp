@@ -329,7 +329,7 @@ void FeatureMap::describe(int firstRow, int rows, int left) {
   }
 }
 
-void FeatureMap::compute(const GrayImage& picture, int cell, int first, int rows, int left, int right) {
+void FeatureMap::computeCells(const GrayImage& picture, int cell, int first, int rows, int left, int right) {
   const int cellsDown = cellsOf(static_cast<int>(picture.nr()), cell);
   const int cellsAcross = std::max(cellsOf(static_cast<int>(picture.nc()), cell), 0);
   columns_ = cellsAcross + 2;

@@ -47,7 +47,7 @@ class FeatureMap {
 
   /// Computes the rows of cells from `first` to `first + rows - 1` of the picture. Rows outside of it are
   /// zero, as are `left` columns before and at least `right` columns behind its cells.
-  void compute(const GrayImage& picture, int cell, int first, int rows, int left, int right);
+  void computeCells(const GrayImage& picture, int cell, int first, int rows, int left, int right);
 
   /// A row of a feature's plane, from the margin on.
   const float* row(int feature, int row) const {

@@ -80,7 +80,7 @@ Neighbours loadNeighbours(const float* row, const int* columns) {
 }
 
 /// The same between neighbours of a row, rounded to bytes.
-void between(const float* row, const int* columns, const float* ways, int count, uint8_t* result) {
+void blendColumns(const float* row, const int* columns, const float* ways, int count, uint8_t* result) {
   inBlocks(
       count,
       [=](ptrdiff_t x) {
@@ -116,7 +116,7 @@ void Resizer::resize(const GrayImage& from, GrayImage& to) {
     const uint8_t* const upper = &from[place.first][0];
     const uint8_t* const lower = heightIn > 1 ? upper + widthIn : upper;
     blend(upper, lower, place.way, widthIn, blended_.data());
-    between(blended_.data(), columns_.data(), ways_.data(), width, &to[y][0]);
+    blendColumns(blended_.data(), columns_.data(), ways_.data(), width, &to[y][0]);
   }
 }
 

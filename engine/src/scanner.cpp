@@ -102,8 +102,8 @@ void Scanner::scanLevel(const GrayImage& picture, unsigned int level, double lea
   for (int top = 0; top < cellsDown; top += kTileRows) {
     const int rows = std::min(kTileRows, cellsDown - top);
     const int wholeRows = (rows + kRowsTogether - 1) / kRowsTogether * kRowsTogether;
-    map_.compute(picture, f.cell, top - above, wholeRows + f.tapsDown - 1, before,
-                 across - cellsAcross + f.tapsAcross - 1 - before);
+    map_.computeCells(picture, f.cell, top - above, wholeRows + f.tapsDown - 1, before,
+                      across - cellsAcross + f.tapsAcross - 1 - before);
     for (int left = 0; left < across; left += kTileColumns) {
       scanTile(wholeRows, left);
       const int columns = std::min(kTileColumns, cellsAcross - left);

@@ -137,7 +137,7 @@ void ExpectFeatures(const GrayImage& picture, int cell) {
   FeatureMap map;
   for (const int band : {rows + kTapsDown - 1, 5}) {
     for (int first = 0; first < rows + kTapsDown - 1; first += band) {
-      map.compute(picture, cell, first - kAbove, band, kBefore, kTapsAcross - 1 - kBefore);
+      map.computeCells(picture, cell, first - kAbove, band, kBefore, kTapsAcross - 1 - kBefore);
       for (int feature = 0; feature < kFeatures; ++feature) {
         for (int y = 0; y < band && first + y < rows + kTapsDown - 1; ++y) {
           for (int x = 0; x < columns + kTapsAcross - 1; ++x) {
