@@ -3,6 +3,11 @@
 /// The arithmetic of I420 on x86-64: 32-bit sums of neighbouring products of 16 bits.
 #pragma once
 
+#include <immintrin.h>
+
+#include <cstdint>
+#include <cstring>
+
 #include "i420_weights.h"
 #include "simd/pixel.h"
 
@@ -128,7 +133,8 @@ class Encoder {
  private:
   static void storeBoth(unsigned char* u, unsigned char* v, __m128i both) {
     _mm_storel_epi64(reinterpret_cast<__m128i*>(u), both);
-    _mm_storeh_pd(reinterpret_cast<double*>(v), _mm_castsi128_pd(both));
+    const int64_t high = _mm_extract_epi64(both, 1);
+    memcpy(v, &high, sizeof(high));
   }
 
   // Chroma's weights are sums of two products, of which the colours' factors are bytes.
