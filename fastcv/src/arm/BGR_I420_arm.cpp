@@ -57,7 +57,7 @@ struct DecodePair {
   unsigned char* out1;
 
   void block(ptrdiff_t x, Blocks<1>) const {
-    decoder.chroma(u + x / 2, v + x / 2, [=, this](int part, const Decoder::Terms& terms) {
+    decoder.chroma(u + x / 2, v + x / 2, [=, this](int part, const Terms& terms) {
       const ptrdiff_t at = x + part * Decoder::kColumns;
       row(luma0 + at, terms, out0 + at * dcn);
       row(luma1 + at, terms, out1 + at * dcn);
@@ -79,7 +79,7 @@ struct DecodePair {
  private:
   // (luma + chroma + 2^19) >> 20 is (((luma + chroma) >> 16) + 8) >> 4: the sum is narrowed to its upper
   // half, which lies between -258 * 16 and 535 * 16, then rounded, shifted and saturated.
-  void row(const unsigned char* luma, const Decoder::Terms& terms, unsigned char* out) const {
+  void row(const unsigned char* luma, const Terms& terms, unsigned char* out) const {
     const EvenOdd y = decoder.luma(load(luma));
     const Bytes blue = addNarrowed(y, terms.b);
     const Bytes green = subtractNarrowed(y, terms.minusG);

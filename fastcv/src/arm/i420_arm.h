@@ -8,15 +8,7 @@
 
 namespace HPC::fastcv::i420 {
 
-using namespace arm;
-
 // ---- I420 to BGR
-
-/// Of the even and of the odd columns of a block.
-struct EvenOdd {
-  Two<SignedWords> even;
-  Two<SignedWords> odd;
-};
 
 namespace detail {
 // Of two results, that of sum s in 32 bits being ((s >> 16) + 8) >> 4, limited to a byte.
@@ -80,10 +72,6 @@ class Decoder {
     use(1, terms({vmovl_high_s8(u8), vmovl_high_s8(v8), vmull_high_s8(u8, smallU_),
                   vmull_high_s8(v8, smallV_)}));
   }
-
-  struct Terms {
-    Two<SignedWords> b, minusG, r;
-  };
 
   EvenOdd luma(Bytes stored) const {
     const Bytes y = subtractSaturated(stored, yZero_);

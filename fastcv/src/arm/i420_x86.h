@@ -13,15 +13,7 @@
 
 namespace HPC::fastcv::i420 {
 
-using namespace arm;
-
 // ---- I420 to BGR
-
-/// Of the even and of the odd columns of a block.
-struct EvenOdd {
-  Two<SignedWords> even;
-  Two<SignedWords> odd;
-};
 
 namespace detail {
 // Limited sums of the even and of the odd columns, in turn.
@@ -49,10 +41,6 @@ inline Bytes subtractNarrowed(const EvenOdd& luma, const Two<SignedWords>& chrom
 class Decoder {
  public:
   static constexpr int kColumns = 32;  // of a block
-
-  struct Terms {
-    Two<SignedWords> b, minusG, r;
-  };
 
   /// `use(part, terms)` is given the terms of the only block.
   template <typename Use>
