@@ -38,7 +38,8 @@ constexpr uint64_t kMostCells = 128;
 class Reader {
  public:
   explicit Reader(std::istream& in) : in_(in), start_(in.tellg()) {
-    expect(start_ != std::streampos(-1) && in.seekg(0, std::ios::end));
+    // Where the stream says no place it does not move either.
+    expect(static_cast<bool>(in.seekg(0, std::ios::end)));
     const std::streamoff length = in.tellg() - start_;
     expect(length >= 0 && in.seekg(start_));
     left_ = static_cast<uint64_t>(length);

@@ -250,6 +250,28 @@ TEST_F(ModelTest, PyramidsEndWithTheirLastPixel) {
   EXPECT_EQ(1, faces.count);
 }
 
+TEST_F(ModelTest, WindowsNeedNotBeSquare) {
+  // A filter that everything answers to: faces are wherever there is room for one.
+  const dlib::frontal_face_detector good = dlib::get_frontal_face_detector();
+  dlib::scan_fhog_pyramid<dlib::pyramid_down<6>> scanner;
+  scanner.copy_configuration(good.get_scanner());
+  scanner.set_detection_window_size(48, 96);
+  dlib::matrix<double, 0, 1> weights(scanner.get_num_dimensions() + 1);
+  weights = 0;
+  weights(weights.size() - 1) = -1;
+  const dlib::frontal_face_detector any(scanner, good.get_overlap_tester(), weights);
+  const Detector detector(KY_CONFIG_LARGE_FACES, Write("upright", Bytes(any)).c_str());
+  const Picture narrow = Part(Portrait(), 160, 60, 56, 104);
+  for (const int orientation : {KY_ORIENTATION_0, KY_ORIENTATION_90}) {
+    Detected faces;
+    ASSERT_EQ(KY_SUCCESS, Detect(detector, TestFrame(narrow, KY_PIXEL_GRAY, orientation), faces));
+    EXPECT_GT(faces.count, 0);
+  }
+  Detected none;
+  ASSERT_EQ(KY_SUCCESS, Detect(detector, TestFrame(Part(Portrait(), 160, 60, 104, 56)), none));
+  EXPECT_EQ(0, none.count);
+}
+
 // ---- landmarks
 // -----------------------------------------------------------------------------------------------
 

@@ -164,7 +164,12 @@ TEST(Mat, MovesItsPixels) {
   {
     Image<unsigned char, 1> second = std::move(first);
     EXPECT_EQ(second.data, data);
+    EXPECT_EQ(second.dims, 2);
     EXPECT_EQ(second.width, 16);
+    EXPECT_EQ(second.height, 4);
+    EXPECT_EQ(second.step, 16);
+    EXPECT_EQ(second.total, 64);
+    EXPECT_EQ(second.byteSize, 64);
     EXPECT_TRUE(second.ownsData);
     EXPECT_EQ(first.data, nullptr);  // NOLINT(bugprone-use-after-move): an empty matrix is left behind
     EXPECT_EQ(first.dims, 0);

@@ -117,6 +117,8 @@ class CameraPicture {
   }
 
   const PlanarPicture& planes() const { return picture_; }
+  /// To be read in another way.
+  PlanarPicture& planes() { return picture_; }
 
   /// The bytes of a view, row by row without padding: the planes cut, turned and mirrored one by one, then
   /// converted by the formulas. `part` has even edges.

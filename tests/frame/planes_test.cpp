@@ -170,6 +170,24 @@ TEST(Planes, EveryColour) {
   }
 }
 
+TEST(Planes, WhatLooksLikePairsIsReadAsItIs) {
+  // Planes one byte apart, whose samples or rows are not equally far apart.
+  for (const Chroma chroma : {Chroma::kPairsVu, Chroma::kPairsUv}) {
+    for (Plane PlanarPicture::* plane : {&PlanarPicture::u, &PlanarPicture::v}) {
+      for (const bool samples : {true, false}) {
+        CameraPicture picture(36, 8, chroma, 4, 9);
+        Plane& other = picture.planes().*plane;
+        (samples ? other.pixelStride = 1 : other.rowStride -= 1);
+        for (const PixelLayout layout : kLayouts) {
+          for (const Orientation& orientation : kOrientations) {
+            EXPECT_EQ(difference(picture, all_of(picture.planes()), orientation, layout, 0), "");
+          }
+        }
+      }
+    }
+  }
+}
+
 TEST(Planes, PairsAreMadeWhole) {
   for (int left = 0; left < 4; ++left) {
     for (int width = 1; width < 6; ++width) {
@@ -334,10 +352,11 @@ TEST(Planes, ATargetOverAPlaneIsRefused) {
     const int rows = plane == &PlanarPicture::y ? 6 : 3;
     Bytes memory(400, 7);
     const std::int64_t in_plane = (rows - 1) * 10 + (rows == 6 ? 8 : 4);
-    for (const int from : {100, 101, 100 + 6 * 8 - 1}) {
+    // The target is bytes 100 to 147; what lies beside it is no overlap.
+    for (const std::int64_t from :
+         {100 - in_plane + 1, std::int64_t{100}, std::int64_t{101}, std::int64_t{147}}) {
       PlanarPicture picture = camera.planes();
       (picture.*plane) = {memory.data() + from, 400 - from, 10, 1};
-      // The target is bytes 100 to 147; what lies beside it is no overlap.
       const Target target = {memory.data() + 100, 48, 8, PixelLayout::kGray};
       EXPECT_EQ(convertPlanes(picture, {0, 0, 8, 6}, {}, target), PlanesStatus::kOverlap) << from;
       EXPECT_EQ(memory, Bytes(400, 7));

@@ -168,6 +168,7 @@ TEST_F(AverageBrightnessTest, ClipsTheRectangle) {
 TEST_F(AverageBrightnessTest, ClipsTheHeightByTheLeftEdge) {
   const Bytes gray = ramp(100, 60);
   EXPECT_EQ(average(gray, 100, 50, 60, 0, 10, 50), mean(gray, 100, 60, 0, 10, 50));
+  EXPECT_EQ(average(gray, 100, 50, 30, 10, 10, 20), mean(gray, 100, 30, 10, 10, 20));  // 30 + 20 = 50
   EXPECT_EQ(average(gray, 100, 50, 60, 10, 10, 20), mean(gray, 100, 60, 10, 10, 40));  // 60 + 20 > 50
   EXPECT_EQ(average(gray, 100, 50, 0, 40, 10, 20), mean(gray, 100, 0, 40, 10, 20));    // past the last row
 }

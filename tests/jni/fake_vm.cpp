@@ -463,6 +463,8 @@ jobject Vm::object(const std::string& name, const std::string& class_name) {
   return refer(make(class_name, name), Scope::kArgument);
 }
 
+jobject Vm::another(jobject reference) { return refer(resolve(reference, "another"), Scope::kArgument); }
+
 jobjectArray Vm::object_array(const std::string& name, const std::string& element_class,
                               const std::vector<Object*>& elements) {
   Object* array = make("[L" + element_class + ";", name);

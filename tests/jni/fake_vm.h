@@ -44,6 +44,8 @@ class Vm {
   /// A direct buffer of bytes.
   jobject buffer(const std::string& name, const std::vector<unsigned char>& bytes);
   jobject object(const std::string& name, const std::string& class_name);
+  /// Another reference to the same object, as each argument of a native method is.
+  jobject another(jobject reference);
   jobjectArray object_array(const std::string& name, const std::string& element_class,
                             const std::vector<Object*>& elements);
 

@@ -54,6 +54,24 @@ TEST_F(PlaneConversionTest, ArraysAreBorrowedOnceAndSourcesNotCopiedBack) {
   EXPECT_EQ(vm.calls("GetPrimitiveArrayCritical"), 2);
 }
 
+TEST_F(PlaneConversionTest, AnArrayOfAllPlanesIsBorrowedOnce) {
+  y = vm.byte_array("frame", {100, 100, 100, 100, 128, 128});
+  u = static_cast<jbyteArray>(vm.another(y));
+  numbers = vm.int_array("numbers", {kSide, kSide, 0, 4, 2, 1, 4, 5, 1, 1, 5, 6, 1, 1, 0});
+  EXPECT_EQ(to_bytes(u), 0);
+  EXPECT_EQ(vm.bytes(out), kGrayPixels);
+  EXPECT_EQ(vm.calls("GetPrimitiveArrayCritical"), 2);
+}
+
+TEST_F(PlaneConversionTest, APlaneOfNoBytesIsThereButTooShort) {
+  constexpr jint kLuma = 2, kMemory = 16;
+  numbers = vm.int_array("numbers", {kSide, kSide, 4, 4, 2, 1, 0, 1, 1, 1, 0, 1, 1, 1, 1});
+  EXPECT_EQ(to_bytes(v), kLuma);
+  numbers = vm.int_array("numbers", {kSide, kSide, 4, 3, 2, 1, 0, 1, 1, 1, 0, 1, 1, 1, 1});
+  EXPECT_EQ(to_bytes(v), kMemory);
+  EXPECT_EQ(vm.bytes(out), std::vector<unsigned char>(16, 7));
+}
+
 TEST_F(PlaneConversionTest, ARefusedBorrowGivesBackTheOthersAndWritesNothing) {
   for (int refused = 1; refused <= 3; ++refused) {
     begin();

@@ -59,9 +59,13 @@ def blanked(text):
 ARM = re.compile(r"defined\(__(?:ARM_NEON|aarch64__|x86_64__)\)")
 
 
-def only_for(arm, text):
-    """For each line whether it is compiled: True in a branch of the processor's own, False in the other's, else None."""
-    lines, branches = [], []
+def only_for(arm, path, text):
+    """For each line whether it is compiled: True in a branch of the processor's own, False in the other's, else None.
+
+    A header that is named after a processor is one branch.
+    """
+    named = re.search(r"_(arm|x86)\.h$", path)
+    lines, branches = [], [(named.group(1) == "arm") == arm if named else None]
     for line in text.split("\n"):
         directive = re.match(r"\s*#\s*(if|ifdef|ifndef|else|elif|endif)\b(.*)", line)
         kind = directive.group(1) if directive else ""
@@ -153,7 +157,8 @@ def _swapped_operands(code):
             yield "operands", match.start(), match.group(), f"{right} {operator} {left}"
     for match in re.finditer(rf"(?<=[a-z0-9_])\(({SIMPLE}), ({SIMPLE})\)(?! \{{| const|:| noexcept)", code):
         left, right = match.groups()
-        if left != right:
+        # Which comes first makes no difference to these.
+        if left != right and not re.search(r"\b(?:max|min|swap)$", code[: match.start()]):
             yield "operands", match.start(), match.group(), f"({right}, {left})"
 
 

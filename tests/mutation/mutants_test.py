@@ -46,15 +46,22 @@ class Mutants(unittest.TestCase):
             '  asm("" : "+w"(v[1]));',
             '  asm volatile("" ::: "memory");',
             "std::vector<int> v;",
+            "std::swap(a, b);",
+            "c = std::max(a, b);",
         ):
             self.assertEqual(changes(text), set(), text)
 
     def test_branches(self):
         text = "a\n#if defined(__ARM_NEON)\nb\n#  ifdef X\nc\n#  endif\n#else\nd\n#endif\n#if !defined(__ARM_NEON)\ne\n#endif\nf"
         for arm, own in ((True, "bc"), (False, "de")):
-            lines = dict(zip(text.split("\n"), only_for(arm, text)))
+            lines = dict(zip(text.split("\n"), only_for(arm, "f.cpp", text)))
             for name in "abcdef":
                 self.assertEqual(lines[name], None if name in "af" else name in own, name)
+
+        for arm in (True, False):
+            for own in (True, False):
+                name = "f_arm.h" if arm == own else "f_x86.h"
+                self.assertEqual(only_for(arm, name, "a\n#if X\nb\n#endif"), [own] * 4)
 
     def test_applies_at_its_place(self):
         text = "f(1);\nint a = 1;  // 1\n"

@@ -276,7 +276,7 @@ class Campaign:
                 if file.suffix in SOURCES:
                     name = str(file.relative_to(self.root))
                     text = file.read_text()
-                    lines = only_for(self.arguments.preset == "aarch64", text)
+                    lines = only_for(self.arguments.preset == "aarch64", name, text)
                     by_area[area_of(name)] += [
                         mutant
                         for mutant in mutants(name, text)

@@ -196,6 +196,29 @@ public final class FaceCutterTest {
         assertEquals(expected, Images.face(frame, six, 16, null).getPixel(14, 14));
     }
 
+    /** What lies around the square is a quarter of the outermost pixels, which are half as large as the frame's. */
+    @Test
+    public void outermostPixelsAreInterpolated() {
+        int first = 35;
+        int last = first + 49;
+        byte[] nv21 = new byte[WIDTH * HEIGHT * 3 / 2];
+        java.util.Arrays.fill(nv21, (byte) 128);
+        for (int y = 0; y < HEIGHT; y++) {
+            for (int x = 0; x < WIDTH; x++) {
+                boolean inside = x >= first && x <= last && y >= first && y <= last;
+                nv21[y * WIDTH + x] = (byte) (inside ? 20 : 220);
+            }
+        }
+        CameraFrame frame = CameraFrame.of(nv21, PixelFormat.NV21, WIDTH, HEIGHT, 0);
+        Bitmap out = Images.face(frame, face(new Rect(40, 40, 80, 80)), 100, null);
+        for (int i = 1; i < 99; i++) {
+            for (int[] at : new int[][] {{0, i}, {99, i}, {i, 0}, {i, 99}}) {
+                assertEquals(at[0] + ", " + at[1], 20 + 200 / 4, out.getPixel(at[0], at[1]) & 0xFF, 1);
+            }
+            assertEquals(20, out.getPixel(i, i) & 0xFF, 1);
+        }
+    }
+
     @Test
     public void whatLiesBeyondThePictureIsBlack() {
         Bitmap out = Images.face(frame(0), face(new Rect(1000, 1000, 1100, 1100)), 12, null);

@@ -24,6 +24,10 @@ public final class YuvPlanesTest {
         assertEquals(message, assertThrows(IllegalArgumentException.class, call).getMessage());
     }
 
+    private static void isNull(String name, ThrowingRunnable call) {
+        assertEquals(name + " is null", assertThrows(NullPointerException.class, call).getMessage());
+    }
+
     /** An image as a camera's reader hands it out. */
     static final class CameraImage extends Image {
         private final int format;
@@ -174,9 +178,13 @@ public final class YuvPlanesTest {
                 () -> YuvPlanes.of(6, 4, y, new Plane(ByteBuffer.allocate(6).asReadOnlyBuffer(), 3, 1), v));
         YuvPlanes.of(6, 4, y, new Plane(bytes(6).asReadOnlyBuffer(), 3, 1), v);
         assertThrows(NullPointerException.class, () -> new Plane(null, 3, 1));
-        assertThrows(NullPointerException.class, () -> YuvPlanes.of(6, 4, null, u, v));
-        assertThrows(NullPointerException.class, () -> YuvPlanes.of(6, 4, y, null, v));
-        assertThrows(NullPointerException.class, () -> YuvPlanes.of(6, 4, y, u, null));
+        isNull("y", () -> YuvPlanes.of(6, 4, null, u, v));
+        isNull("u", () -> YuvPlanes.of(6, 4, y, null, v));
+        isNull("v", () -> YuvPlanes.of(6, 4, y, u, null));
+        ByteBuffer whole = bytes(99);
+        isNull("y", () -> new YuvPlanes().set(6, 4, null, 6, 1, whole, 3, 1, whole, 3, 1));
+        isNull("u", () -> new YuvPlanes().set(6, 4, whole, 6, 1, null, 3, 1, whole, 3, 1));
+        isNull("v", () -> new YuvPlanes().set(6, 4, whole, 6, 1, whole, 3, 1, null, 3, 1));
     }
 
     /** The bytes that a large picture needs are counted without overflow. */
