@@ -19,6 +19,8 @@ from pathlib import Path
 
 ROOT = Path(sys.argv.pop(1)).resolve()
 NOBODY = 65534
+# One that everybody may run, for the scripts that are in Python: the tool of this name only pretends.
+PYTHON = shutil.which("python3", path="/usr/bin") or sys.executable
 
 TOOLS = {
     # Builds by noting when it was at it, and puts down the libraries and archives that scripts look for.
@@ -77,7 +79,7 @@ class Scripts(unittest.TestCase):
         self.addCleanup(shutil.rmtree, self.folder)
         self.folder.chmod(0o755)
         self.clone = self.folder / "clone"
-        for name in ("scripts", "cmake", "android", "fuzz/java", "java", "fastcv/include"):
+        for name in ("scripts", "cmake", "android", "bench/tool", "fuzz/java", "java", "fastcv/include", "tests/mutation"):
             shutil.copytree(ROOT / name, self.clone / name)
         (self.clone / "demo").mkdir()
         for name in ("CMakeLists.txt", "LICENSE", "demo/portrait.png"):
@@ -122,7 +124,8 @@ class Scripts(unittest.TestCase):
 
     WRITERS = (
         ("scripts/demo",), ("scripts/package",), ("scripts/soak", "10"), ("scripts/fuzz", "1"), ("scripts/coverage",),
-        ("scripts/test", "--preset", "host"), ("scripts/accuracy",),
+        ("scripts/test", "--preset", "host"), ("scripts/accuracy",), ("scripts/lint",),
+        (PYTHON, "scripts/bench"), (PYTHON, "scripts/bench", "--update"), (PYTHON, "scripts/mutate"),
     )  # fmt: skip
 
     def assert_refused(self, command, status, out, err):
@@ -175,6 +178,25 @@ class Scripts(unittest.TestCase):
         self.assertEqual(len(log), 8)
         self.assertEqual([line.split()[0] for line in log], ["begin", "end"] * 4, "one after the other")
         self.assertEqual(sum("waiting for another script that works on build/host" in error for error in errors), 1)
+
+    def test_benchmarks_wait_for_builds(self):
+        build = self.start(self.trial("build aarch64 something"), BUILD_SECONDS="1")
+        while not self.log():
+            time.sleep(0.02)
+        # It has nothing to measure once it has built.
+        _, _, err = self.run_script(PYTHON, "scripts/bench", "--count")
+        self.assertEqual(build.wait(60), 0, build.communicate())
+        self.assertEqual([line.split()[0] for line in self.log()], ["begin", "end"] * 4, "one after the other")
+        self.assertIn("bench: waiting for another script that works on build/aarch64\n", err)
+
+    def test_records_are_whole(self):
+        page = self.clone / "page"
+        replace = "import clone, pathlib, sys; clone.replace(pathlib.Path(sys.argv[1]), sys.argv[2])"
+        write = (PYTHON, "-c", f"import sys; sys.path.insert(0, 'scripts'); {replace}", str(page))
+        self.assertEqual(self.run_script(*write, "before")[0], 0)
+        self.assertNotEqual(self.run_script(*write, "x" * 5000, limit="trap '' XFSZ; ulimit -f 1;")[0], 0)
+        self.assertEqual(page.read_text(), "before")
+        self.assertEqual([path.name for path in self.clone.glob(".page*")], [])
 
     def test_builds_of_two_presets_do_not_wait(self):
         first = self.start(self.trial('build "$1"'), "host", BUILD_SECONDS="5")
