@@ -38,6 +38,7 @@ TOOLS = {
         """,
     "java": """\
         echo half >out/faces.png
+        printf "${JAVA_SAYS:-}"
         exit "${JAVA_STATUS:-0}"
         """,
     "mvn": """\
@@ -67,6 +68,7 @@ TOOLS = {
         """,
     "javadoc": 'while [ "$1" != -d ]; do shift; done; mkdir -p "$2"; touch "$2/index.html"\n',
     "llvm-strip-19": 'while [ "$1" != -o ]; do shift; done; cp "$3" "$2"\n',
+    "clang-19": "exit 0\n",
     "python3": "exit 0\n",
     "apt-get": "exit 0\n",
     "ctest": "echo '100% tests passed, 0 tests failed out of 0'\n",
@@ -280,6 +282,17 @@ class Scripts(unittest.TestCase):
             status, _, err = self.run_script("scripts/demo", JAVA_STATUS=java_status)
             self.assertEqual(status, int(java_status), err)
             self.assertEqual((self.clone / "out/faces.png").exists(), left, java_status)
+
+    # ---- what is found
+
+    def test_complaints_of_the_virtual_machine(self):
+        self.fetching()
+        said = "WARNING: JNI local refs: 99, exceeds capacity: 32\\n\\tat sun.Some.thing(Native Method)\\n\\tat com.{}.call\\n"
+        status, _, err = self.run_script("scripts/fuzz", "1", "--java", JAVA_SAYS=said.format("another"))
+        self.assertEqual(status, 0, err)
+        status, _, err = self.run_script("scripts/fuzz", "1", "--java", JAVA_SAYS=said.format("vantrel"))
+        self.assertEqual(status, 1)
+        self.assertIn("fuzz: the virtual machine complained\n", err)
 
 
 if __name__ == "__main__":
