@@ -338,6 +338,31 @@ TEST(Memory, Thrice) {
   thrice<Floats>();
 }
 
+// Where a group may be half a block.
+template <size_t nc>
+void halfChannels() {
+  if constexpr (requires(const u8* p, Bytes(&c)[nc]) { loadHalfChannels(p, c); }) {
+    constexpr size_t kHalf = kBlock / 2;
+    for (const bool flush : {false, true}) {
+      Stretch<u8> in(kHalf * nc, flush), out(kHalf * nc, flush);
+      for (int time = 0; time < kTimes; ++time) {
+        in.fill();
+        Bytes c[nc];
+        loadHalfChannels(in.data(), c);
+        for (size_t channel = 0; channel < nc; ++channel) {
+          ASSERT_TRUE(are(c[channel], [&](size_t i) { return in.data()[i % kHalf * nc + channel]; }));
+        }
+        storeHalfChannels(out.data(), c);
+        ASSERT_TRUE(out.holds([&](size_t i) { return in.data()[i]; }));
+      }
+    }
+  }
+}
+TEST(Memory, HalfChannels) {
+  halfChannels<3>();
+  halfChannels<4>();
+}
+
 // Where a block has halves they may belong apart.
 TEST(Memory, Parts) {
   for (const size_t apart : {16, 23, 64}) {
