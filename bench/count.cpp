@@ -5,10 +5,8 @@
 //
 //   bench_count own|all REPEATS PATTERN SIZE...
 //
-// Every operation that matches is called once to warm up, and then, between markers, REPEATS times and three
-// times as often. What is prepared once or decided at the first call cancels out of the difference. Prints a
-// line for each, in the order of their laps: name, library, size, traffic, and the pixels of the calls in the
-// difference.
+// Every operation that matches is called once to warm up, and REPEATS times between markers. Prints a line
+// for each, in the order of their laps: name, library, size, traffic, and the pixels of these calls.
 
 #include <cstdio>
 #include <cstdlib>
@@ -31,7 +29,7 @@ int main(int argc, char** argv) {
     for (const bench::Operation& operation : operations) {
       bench::measure(operation.prepare(size), repeats);
       std::printf("%s\t%s\t%s\t%g\t%zu\n", operation.name.c_str(), operation.library.c_str(), argv[i],
-                  operation.traffic, 2 * static_cast<size_t>(repeats) * size.pixels());
+                  operation.traffic, static_cast<size_t>(repeats) * size.pixels());
     }
   }
   return 0;

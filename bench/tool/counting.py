@@ -31,7 +31,7 @@ class Key:
 
 @dataclasses.dataclass
 class Count:
-    """What an operation needs: the difference of a long and a short run."""
+    """What an operation needs, the preparation left out."""
 
     traffic: float  # bytes per pixel
     pixels: int
@@ -85,7 +85,7 @@ def count(build, root, own, pattern, sizes, repeats=1):
     return Counts(counts, blocks)
 
 
-def count_bridge(build, root, repeats=10):
+def count_bridge(build, root, repeats=20):
     """Runs bench_bridge of the folder `build` and returns {call: CallCount}."""
     lines, laps, blocks = _run(build, root, ["bench_bridge", str(repeats)])
     begin, end = (int(address, 16) for address in lines[0].split("\t"))
@@ -130,11 +130,11 @@ def _run(build, root, arguments):
 
 def _difference(laps, index):
     """Instructions and executions by block of what was measured as the `index`th. It has three laps: what went before,
-    the short run, the long one."""
-    short, long = laps[3 * index + 1], laps[3 * index + 2]
-    executions = collections.Counter(long[1])
-    executions.subtract(short[1])
-    return long[0] - short[0], {block: number for block, number in executions.items() if number > 0}
+    one without a call, and one with all calls."""
+    empty, full = laps[3 * index + 1], laps[3 * index + 2]
+    executions = collections.Counter(full[1])
+    executions.subtract(empty[1])
+    return full[0] - empty[0], {block: number for block, number in executions.items() if number > 0}
 
 
 def _read_laps(path):
