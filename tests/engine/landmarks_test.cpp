@@ -3,6 +3,7 @@
 
 // Landmarks of dlib's model of 68 points, on the portrait and in frames that are tracked.
 #include <cmath>
+#include <optional>
 #include <vector>
 
 #include "engine_calls.h"
@@ -40,7 +41,16 @@ double WorstError(const ky_face_t& face, const std::vector<ky_pointf_t>& seen, d
   return worst / eye_distance;
 }
 
-TEST(LandmarksTest, AreWhereTheyAreSeenInThePortrait) {
+/// Emulated, the model takes ten seconds to read; handles to it share what is read while there is one.
+class LandmarksTest : public ::testing::Test {
+ protected:
+  static void SetUpTestSuite() { kept_.emplace(KY_CONFIG_DEFAULT, KY_LANDMARKS); }
+  static void TearDownTestSuite() { kept_.reset(); }
+
+  static inline std::optional<Detector> kept_;
+};
+
+TEST_F(LandmarksTest, AreWhereTheyAreSeenInThePortrait) {
   const Detector detector(KY_CONFIG_DEFAULT, KY_LANDMARKS);
   Detected faces;
   ASSERT_EQ(KY_SUCCESS, Detect(detector, TestFrame(Portrait(), KY_PIXEL_RGB), faces));
@@ -58,7 +68,7 @@ TEST(LandmarksTest, AreWhereTheyAreSeenInThePortrait) {
   EXPECT_NEAR(0, face.pitch, 25) << "a smile reads as a nod";
 }
 
-TEST(LandmarksTest, ATrackerCarriesThemBetweenDetections) {
+TEST_F(LandmarksTest, ATrackerCarriesThemBetweenDetections) {
   constexpr int kSide = 152;
   const Tracker tracker(KY_CONFIG_LARGE_FACES, KY_LANDMARKS);
   ASSERT_EQ(KY_SUCCESS, ky_face_track_set_detect_interval(tracker, KY_MAX_DETECT_INTERVAL, nullptr));

@@ -15,7 +15,9 @@ import java.io.File;
 import java.io.IOException;
 import java.nio.charset.StandardCharsets;
 import java.nio.file.Files;
+import java.util.ArrayList;
 import java.util.Arrays;
+import java.util.List;
 import java.util.regex.Matcher;
 import java.util.regex.Pattern;
 import javax.imageio.ImageIO;
@@ -32,9 +34,12 @@ public class DemoTest {
 
     @Rule public final TemporaryFolder folder = new TemporaryFolder();
 
-    private Child demo(File picture) throws IOException, InterruptedException {
-        Child child = Child.run(Demo.class, picture.getPath(), new File(folder.getRoot(), "out").getPath(),
-                System.getProperty("kyface.landmarks"));
+    private Child demo(File picture, String... model) throws IOException, InterruptedException {
+        List<String> arguments = new ArrayList<>();
+        arguments.add(picture.getPath());
+        arguments.add(new File(folder.getRoot(), "out").getPath());
+        arguments.addAll(Arrays.asList(model));
+        Child child = Child.run(Demo.class, arguments.toArray(new String[0]));
         assertFalse(child.output, child.output.contains("in native method"));
         return child;
     }
@@ -47,7 +52,8 @@ public class DemoTest {
 
     @Test
     public void thePortrait() throws IOException, InterruptedException {
-        Child child = demo(new File(System.getProperty("kyface.source"), "demo/portrait.png"));
+        Child child = demo(new File(System.getProperty("kyface.source"), "demo/portrait.png"),
+                System.getProperty("kyface.landmarks"));
         assertEquals(child.errors.toString(), 0, child.exitStatus);
         assertEquals(FRAME, find(child.output, "frame sha-256 (\\w+)").group(1));
         String box = "\\((\\d+), (\\d+)\\)-\\((\\d+), (\\d+)\\)";
@@ -91,7 +97,7 @@ public class DemoTest {
         assertEquals(Arrays.asList(sentence), child.errors);
     }
 
-    /** Two faces of 87 pixels in a frame that has the picture's size. */
+    /** Two faces of 87 pixels in a frame that has the picture's size, and no landmark model. */
     @Test
     public void twoPortraitsSideBySide() throws IOException, InterruptedException {
         BufferedImage portrait = ImageIO.read(new File(System.getProperty("kyface.source"), "demo/portrait.png"));
@@ -104,6 +110,7 @@ public class DemoTest {
         assertEquals(child.errors.toString(), 0, child.exitStatus);
         find(child.output, "1024 x 512, as an NV21 frame of 1024 x 512\n");
         find(child.output, "status 0, 2 faces, drawn in ");
+        find(child.output, "\n2 .*\\) +[\\d.]+ +0 +0.0 +0.0 +0.0 +0.0\n");
         String row = " +\\d+ +\\d+ +\\d+ +([\\d.]+)\n";
         Matcher luma = find(child.output, "\nface 1" + row + "face 2" + row);
         assertEquals("luma", Float.parseFloat(luma.group(1)), Float.parseFloat(luma.group(2)), 0.02);

@@ -30,7 +30,7 @@ public final class EightThreadsTest {
     /** These count or time what other threads would disturb, or take long without saying more here. */
     private static final List<String> ALONE = Arrays.asList("forgottenObjectsAreReclaimed",
             "closingWaitsForCallsOfOtherThreads", "everyPixelLandsWhereItsPointIsMappedTo",
-            "framesThatTurnOneAnotherDoNotBlock");
+            "framesThatTurnOneAnotherDoNotBlock", "lightnessOfManyPixels", "brightnessOfManyPixels");
 
     private static List<Request> requests() {
         List<Request> requests = new ArrayList<>();

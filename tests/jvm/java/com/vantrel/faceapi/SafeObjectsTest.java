@@ -202,7 +202,7 @@ public final class SafeObjectsTest {
             Future<?> holder = threads.submit(() -> {
                 synchronized (frame) {
                     held.countDown();
-                    for (int i = 0; i < 25; i++) {
+                    for (int i = 0; i < 8; i++) {
                         detector.detect(frame);
                         Images.brightness(frame, 0, 0, 96, 64);
                     }
@@ -210,7 +210,7 @@ public final class SafeObjectsTest {
             });
             Future<?> other = threads.submit(() -> {
                 held.await();
-                for (int i = 0; i < 25; i++) {
+                for (int i = 0; i < 8; i++) {
                     detector.detect(frame);
                     frame.data();
                     try {
