@@ -29,7 +29,7 @@ final class Drawing {
             for (int x = 0; x < width; x++, at += 4) {
                 row[x] = (rgba[at] & 0xFF) << 16 | (rgba[at + 1] & 0xFF) << 8 | (rgba[at + 2] & 0xFF);
             }
-            image.setRGB(0, y, width, 1, row, 0, width);
+            image.getRaster().setDataElements(0, y, width, 1, row);
         }
         return image;
     }
@@ -41,7 +41,7 @@ final class Drawing {
         int[] colors = new int[width * height];
         bitmap.getPixels(colors, 0, width, 0, 0, width, height);
         BufferedImage image = new BufferedImage(width, height, BufferedImage.TYPE_INT_RGB);
-        image.setRGB(0, 0, width, height, colors, 0, width);
+        image.getRaster().setDataElements(0, 0, width, height, colors);
         return image;
     }
 
