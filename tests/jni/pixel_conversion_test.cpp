@@ -278,7 +278,7 @@ TEST_F(PixelConversionTest, SumsBeyondTheImageAreRefused) {
       {src, kStride, 0, 1, 1, kHeight},
       {src, kStride, kStride, 3, 1, 1},
       {src, kStride, 1, 0, kStride, kHeight},
-      {src, kStride, 0, 1, 1, INT_MAX},
+      {src, kStride, 0, 2, 1, INT_MAX},
       {src, kStride, 1, 0, INT_MAX, 1},
       {src, INT_MAX, 0, INT_MAX - 1, 1, 1},
   };
